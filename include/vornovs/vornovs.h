@@ -200,7 +200,7 @@ public:
     /** @return 1 registered, -1 not registered. */
     int IsRegister(const std::string& name);
 
-    /** Adds the names to a set. @return the set's size afterwards. */
+    /** Adds the names to a set. @return the set's size afterwards; -1 memory ran out. */
     int GetRegNames(std::set<std::string>& out);
 
     /** Makes the state folder. @return 0 it exists, -1 it could not be made. */

@@ -46,7 +46,8 @@ int VLIBCPclose(FILE* stream);
 /** Copies a value, without enclosing double quotes. @return negative: no file or no such key. */
 int VLIBCFileGetKeyValue(const char* path, const char* key, char* value, int size, int flags);
 
-/** Replaces the key's line or appends one; makes the file when missing. @return negative: failed. */
+/** Replaces the key's line or appends one; makes the file when missing. @return negative: failed.
+ */
 int VLIBCFileSetKeyValue(const char* path, const char* key, const char* value, int flags);
 
 struct VLIBCSzHash;
@@ -85,7 +86,8 @@ int VLIBCFileLockTimeByFile(const char* path, int mode, int seconds, int* handle
 /** Releases the lock. @return negative: failed. */
 int VLIBCFileUnlockByFile(int handle);
 
-/** Takes the platform's file lock of that word, waiting up to the seconds. @return -1: not taken. */
+/** Takes the platform's file lock of that word, waiting up to the seconds. @return -1: not taken.
+ */
 int VLIBCFileLock(int lockWord, int seconds);
 
 /** Releases what VLIBCFileLock() took. @return -1: failed. */

@@ -27,8 +27,8 @@ enum VORN_LINK_AGGR_MODE : int {
 struct VORNLINKAGGROPT {
     char szMaster[VORN_NAME_SIZE]; /**< bond interface name, NUL-terminated, such as "bond0" */
     VORN_LINK_AGGR_MODE mode;
-    int reserved;                                         /**< the platform's own */
-    int nSlave;                                           /**< number of valid entries in rgszSlave */
+    int reserved; /**< the platform's own */
+    int nSlave;   /**< number of valid entries in rgszSlave */
     char rgszSlave[VORN_LINK_AGGR_SLAVES][VORN_NAME_SIZE]; /**< slave interface names */
 };
 

@@ -1,0 +1,29 @@
+# shellcheck shell=bash
+# shellcheck disable=SC2034 # read by the scripts that source this
+# Debian packages that building and checking the repository needs.
+
+build_packages=(
+    cmake
+    g++
+    libcli11-dev
+    libgmock-dev
+    libgtest-dev
+    libnl-3-dev
+    libnl-route-3-dev
+    ninja-build
+    nlohmann-json3-dev
+    pkg-config
+)
+
+test_packages=(
+    binutils
+    clang
+    iproute2
+)
+
+lint_packages=(
+    clang-format
+    clang-tidy
+    cppcheck
+    shellcheck
+)

@@ -1,0 +1,196 @@
+#include <vornovs/vornovs.h>
+
+#include "api/configlock.h"
+#include "state/statefiles.h"
+#include "system/log.h"
+
+#include <vornplatform/core.h>
+
+#include <unistd.h>
+
+#include <algorithm>
+#include <exception>
+
+namespace VORN::OVS {
+namespace {
+
+constexpr char kLogFile[] = "libvornovs.cpp";
+
+constexpr char kLockPath[] = "/tmp/ovs_config.lock";
+constexpr int kLockExclusive = 1;
+constexpr int kLockSeconds = 5;
+
+/** @return number of registered names; negative: memory ran out. */
+int CountNames(OVSRegConf& registry)
+{
+    std::set<std::string> names;
+    return registry.GetRegNames(names);
+}
+
+void PrimeBondModes(OVSManager& manager, const std::map<std::string, std::string>& bondModes)
+{
+    for (const auto& [bond, mode] : bondModes) {
+        (void)manager.InitBondOpt(bond, mode);
+    }
+}
+
+} // namespace
+
+ConfigLock::ConfigLock()
+    : m_taken(VLIBCFileLockTimeByFile(kLockPath, kLockExclusive, kLockSeconds, &m_handle) >= 0)
+{
+    if (!m_taken) {
+        OVS_ERR("Failed to lock%s", kLockPath);
+        OVS_ERR("Failed to lock the file");
+    }
+}
+
+ConfigLock::~ConfigLock()
+{
+    // By the handle alone: a failed attempt that left one behind is given back, too.
+    if (m_handle != -1 && VLIBCFileUnlockByFile(m_handle) < 0) {
+        OVS_ERR("Failed to unlock%s", kLockPath);
+        OVS_ERR("Failed to unlock the file");
+    }
+}
+
+int IsRegister(const std::string& name)
+try {
+    OVSRegConf registry;
+    if (registry.LoadFromConfig() < 0) {
+        OVS_ERR("Failed to load the ovs config");
+        return -1;
+    }
+    return registry.IsRegister(name) > 0 ? 0 : -1;
+} catch (const std::exception&) {
+    return -1;
+}
+
+int GetAllRegister(std::set<std::string>& names)
+try {
+    OVSRegConf registry;
+    if (registry.LoadFromConfig() < 0) {
+        OVS_ERR("Failed to load the ovs config");
+        return 0;
+    }
+    return std::max(registry.GetRegNames(names), 0);
+} catch (const std::exception&) {
+    return 0;
+}
+
+bool IsOVSRunning()
+try {
+    std::set<std::string> names;
+    return GetAllRegister(names) > 0;
+} catch (const std::exception&) {
+    return false;
+}
+
+int IsOVSSupport()
+{
+    return std::max(NotSupportOVS(), 0);
+}
+
+int Register(const std::string& name, const std::map<std::string, std::string>& bondModes)
+try {
+    OVSRegConf registry;
+    OVSManager manager;
+    const int reason = NotSupportOVS();
+    if (reason > 0) {
+        OVS_INFO("Current environment doesn't support OVS for reason %d", reason);
+        return reason;
+    }
+
+    const ConfigLock lock;
+    if (!lock) {
+        return reason;
+    }
+    if (registry.LoadFromConfig() < 0) {
+        OVS_ERR("Failed to load the ovs config");
+        return reason;
+    }
+
+    const int countBefore = CountNames(registry);
+    if (countBefore < 0) {
+        return -1;
+    }
+    const int registered = registry.Register(name);
+    if (registered == 1) {
+        return 1;
+    }
+    if (registered < 0) {
+        OVS_ERR("Failed to register the name %s", name.c_str());
+        return -1;
+    }
+    if (countBefore != 0) {
+        return 0;
+    }
+
+    PrimeBondModes(manager, bondModes);
+    if (!manager.CreateAll()) {
+        OVS_ERR("Failed to CreateAll");
+        (void)registry.UnRegister(name);
+    }
+    return 0;
+} catch (const std::exception&) {
+    return -1;
+}
+
+int UnRegister(const std::string& name, const std::map<std::string, std::string>& bondModes)
+try {
+    OVSRegConf registry;
+    OVSManager manager;
+    const ConfigLock lock;
+    if (!lock) {
+        return -1;
+    }
+    if (registry.LoadFromConfig() < 0) {
+        OVS_ERR("Failed to load the ovs config");
+        return -1;
+    }
+
+    // Counted before the change, while giving up is still possible.
+    const int countBefore = CountNames(registry);
+    if (countBefore < 0) {
+        return -1;
+    }
+    const int unregistered = registry.UnRegister(name);
+    if (unregistered == 2) {
+        return 1;
+    }
+    if (unregistered < 0) {
+        // The same text as on the way in: log readers know it so.
+        OVS_ERR("Failed to register the name %s", name.c_str());
+        return -1;
+    }
+    if (countBefore > 1) {
+        return 0;
+    }
+
+    PrimeBondModes(manager, bondModes);
+    if (!manager.DeleteAll()) {
+        OVS_ERR("Failed to delete all OVS interface");
+    }
+    return 0;
+} catch (const std::exception&) {
+    return -1;
+}
+
+void OVSSetDefault()
+try {
+    OVSChangeHook hook("delete");
+    const bool wasRunning = IsOVSRunning(); // asked before the answer is removed
+
+    (void)::unlink(kInterfaceListPath);
+    (void)::unlink(kIgnoreListPath);
+    (void)::unlink(kRegistrationPath);
+
+    if (wasRunning) {
+        (void)hook.ExecHook(SDK_PLUGIN_ACTION_BEGIN);
+    }
+} catch (const std::exception&) {
+    // Only building the hook can fail, so nothing has been removed; there is no result to say so.
+    OVS_ERR("Failed to set the default");
+}
+
+} // namespace VORN::OVS

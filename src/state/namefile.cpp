@@ -1,0 +1,194 @@
+#include "state/namefile.h"
+
+#include "system/handles.h"
+
+#include <vornplatform/core.h>
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <array>
+#include <cerrno>
+#include <cstdio>
+#include <string_view>
+
+namespace VORN::OVS {
+namespace {
+
+constexpr mode_t kNewFileMode = 0666; // the process's umask takes its part
+
+/** A file beside the target that takes its place, or is gone with this object. */
+class Replacement {
+public:
+    explicit Replacement(const std::string& target) : m_target(target), m_file(Open()) {}
+    ~Replacement()
+    {
+        if (m_file && !m_committed) {
+            (void)::unlink(m_path.c_str());
+        }
+    }
+    Replacement(const Replacement&) = delete;
+    Replacement& operator=(const Replacement&) = delete;
+
+    explicit operator bool() const { return static_cast<bool>(m_file); }
+    [[nodiscard]] int Get() const { return m_file.Get(); }
+
+    /** @return whether the target is this file now; errno says why not. */
+    bool Commit()
+    {
+        m_committed = ::rename(m_path.c_str(), m_target.c_str()) == 0;
+        return m_committed;
+    }
+
+private:
+    int Open()
+    {
+        int descriptor = -1;
+        int number = 0;
+        do {
+            m_path = m_target + "." + std::to_string(::gettid()) + "." + std::to_string(number++);
+            descriptor =
+                ::open(m_path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, kNewFileMode);
+        } while (descriptor < 0 && errno == EEXIST);
+        return descriptor;
+    }
+
+    const std::string& m_target;
+    std::string m_path;
+    File m_file;
+    bool m_committed = false;
+};
+
+bool WriteAll(int descriptor, std::string_view text)
+{
+    while (!text.empty()) {
+        const ssize_t written = ::write(descriptor, text.data(), text.size());
+        if (written < 0 && errno == EINTR) {
+            continue;
+        }
+        if (written <= 0) {
+            return false;
+        }
+        text.remove_prefix(static_cast<std::size_t>(written));
+    }
+    return true;
+}
+
+// Not blocking: a FIFO without a reader is refused, not waited for with the lock held.
+int OpenInPlace(const std::string& path)
+{
+    return ::open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NONBLOCK,
+                  kNewFileMode);
+}
+
+bool WriteInPlace(const std::string& path, std::string_view text)
+{
+    const File file(OpenInPlace(path));
+    if (!file) {
+        return false;
+    }
+    (void)WriteAll(file.Get(), text);
+    return true;
+}
+
+void SyncFolderOf(const std::string& path)
+{
+    const std::string folder = path.substr(0, path.find_last_of('/') + 1);
+    const File file(
+        ::open(folder.empty() ? "." : folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    if (file) {
+        (void)::fsync(file.Get());
+    }
+}
+
+/** @param old  the target's status, or null when there is no target yet. */
+bool ReplaceByRename(const std::string& path, std::string_view text, const struct stat* old)
+{
+    Replacement replacement(path);
+    if (!replacement) {
+        // An existing target opened for writing: this is a write error, which leaves it whole.
+        return old != nullptr;
+    }
+    if (old != nullptr) {
+        (void)::fchown(replacement.Get(), old->st_uid, old->st_gid);
+        (void)::fchmod(replacement.Get(), old->st_mode & 07777U);
+    }
+    if (!WriteAll(replacement.Get(), text) || ::fsync(replacement.Get()) != 0) {
+        return true;
+    }
+
+    if (replacement.Commit()) {
+        SyncFolderOf(path);
+    } else if (errno == EBUSY) {
+        // A mount point cannot be replaced by a file, only written.
+        return WriteInPlace(path, text);
+    }
+    return true;
+}
+
+bool RemoveNames(const std::string& path)
+{
+    // Truncated first: should the removal fail, what stays is an empty list.
+    const File file(OpenInPlace(path));
+    if (!file) {
+        return false;
+    }
+    (void)::unlink(path.c_str());
+    SyncFolderOf(path);
+    return true;
+}
+
+} // namespace
+
+bool MakeStateFolder()
+{
+    return VLIBCFileCheckDir(kStateFolder) != 0 || ::mkdir(kStateFolder, kStateFolderMode) >= 0;
+}
+
+bool ReadNames(const std::string& path, std::set<std::string>& names)
+{
+    const File file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
+    if (!file) {
+        return false;
+    }
+
+    std::string text;
+    std::array<char, BUFSIZ> part{};
+    ssize_t count = 0;
+    while ((count = ::read(file.Get(), part.data(), part.size())) > 0 ||
+           (count < 0 && errno == EINTR)) {
+        text.append(part.data(), count > 0 ? static_cast<std::size_t>(count) : 0);
+    }
+
+    std::string_view rest = text;
+    while (!rest.empty()) {
+        const std::string_view line = rest.substr(0, rest.find('\n'));
+        names.emplace(line);
+        rest.remove_prefix(line.size() < rest.size() ? line.size() + 1 : line.size());
+    }
+    return true;
+}
+
+bool WriteNames(const std::string& path, const std::set<std::string>& names)
+{
+    if (names.empty()) {
+        return RemoveNames(path);
+    }
+    std::string text;
+    for (const auto& name : names) {
+        text.append(name).append("\n");
+    }
+
+    struct stat status {};
+    if (::lstat(path.c_str(), &status) != 0) {
+        return errno == ENOENT && ReplaceByRename(path, text, nullptr);
+    }
+    if (!S_ISREG(status.st_mode)) {
+        return WriteInPlace(path, text);
+    }
+    const File probe(::open(path.c_str(), O_WRONLY | O_CLOEXEC | O_NOFOLLOW));
+    return probe && ReplaceByRename(path, text, &status);
+}
+
+} // namespace VORN::OVS

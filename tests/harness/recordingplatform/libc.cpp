@@ -1,0 +1,82 @@
+// `sleep` and the system log: definitions in the program take the place of the C library's.
+#include "recorder.h"
+
+#include <gtest/gtest.h>
+
+#include <cctype>
+#include <cstdarg>
+#include <cstdio>
+
+#include <syslog.h>
+#include <unistd.h>
+
+using harness::HarnessAllocations;
+using harness::LogLine;
+using harness::Recorder;
+
+namespace {
+
+constexpr std::string_view kPrefix = "%s:%d ";
+
+/** Takes "file:line text" apart. */
+LogLine Parse(int priority, const std::string& line)
+{
+    const std::size_t colon = line.find(':');
+    std::size_t end = colon == std::string::npos ? line.size() : colon + 1;
+    while (end < line.size() && std::isdigit(static_cast<unsigned char>(line[end])) != 0) {
+        ++end;
+    }
+    if (end >= line.size() || line[end] != ' ' || end == colon + 1) {
+        ADD_FAILURE() << "the log line does not begin with file and line: " << line;
+        return {priority, "", line};
+    }
+    return {priority, line.substr(0, colon), line.substr(end + 1)};
+}
+
+__attribute__((format(printf, 2, 0))) void Log(int priority, const char* format, va_list arguments)
+{
+    const HarnessAllocations guard;
+    Recorder& recorder = Recorder::Current("syslog");
+    if (!std::string_view(format).starts_with(kPrefix)) {
+        ADD_FAILURE() << "the log format does not begin with \"" << kPrefix << "\": " << format;
+    }
+    va_list measured;
+    va_copy(measured, arguments);
+    const int size = std::vsnprintf(nullptr, 0, format, measured);
+    va_end(measured);
+    std::string line(static_cast<std::size_t>(size) + 1, '\0');
+    (void)std::vsnprintf(line.data(), line.size(), format, arguments);
+    line.pop_back();
+    recorder.m_log.push_back(Parse(priority, line));
+}
+
+} // namespace
+
+extern "C" {
+
+unsigned int sleep(unsigned int seconds)
+{
+    const HarnessAllocations guard;
+    const std::optional<int> left =
+        Recorder::Current("sleep").Call("sleep " + std::to_string(seconds));
+    return static_cast<unsigned int>(left.value_or(0));
+}
+
+void syslog(int priority, const char* format, ...)
+{
+    va_list arguments;
+    va_start(arguments, format);
+    Log(priority, format, arguments);
+    va_end(arguments);
+}
+
+void __syslog_chk(int priority, int flag, const char* format, ...);
+
+void __syslog_chk(int priority, int /*flag*/, const char* format, ...)
+{
+    va_list arguments;
+    va_start(arguments, format);
+    Log(priority, format, arguments);
+    va_end(arguments);
+}
+}

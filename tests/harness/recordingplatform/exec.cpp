@@ -1,6 +1,6 @@
 // Programs and services.
-#include "keyvaluemodel.h"
-#include "recorder.h"
+#include "recordingplatform/keyvaluemodel.h"
+#include "recordingplatform/recorder.h"
 
 #include <vornplatform/core.h>
 

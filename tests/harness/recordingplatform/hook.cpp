@@ -1,5 +1,5 @@
 // The hook framework.
-#include "recorder.h"
+#include "recordingplatform/recorder.h"
 
 #include <vornplatform/hook.h>
 

@@ -1,6 +1,6 @@
 // Key=value files, hashes, lists and texts.
-#include "keyvaluemodel.h"
-#include "recorder.h"
+#include "recordingplatform/keyvaluemodel.h"
+#include "recordingplatform/recorder.h"
 
 #include <vornplatform/core.h>
 
@@ -59,8 +59,7 @@ int VLIBCFileGetKeyValue(const char* path, const char* key, char* value, int siz
     Expect("VLIBCFileGetKeyValue", "size", size, 1024);
     Expect("VLIBCFileGetKeyValue", "flags", flags, 0);
 
-    const std::optional<int> answer =
-        recorder.Call(CallText("VLIBCFileGetKeyValue", {file, name}));
+    const std::optional<int> answer = recorder.Call(CallText("VLIBCFileGetKeyValue", {file, name}));
     if (answer) {
         return *answer;
     }
@@ -77,12 +76,11 @@ int VLIBCFileSetKeyValue(const char* path, const char* key, const char* value, i
     const HarnessAllocations guard;
     Recorder& recorder = Recorder::Current("VLIBCFileSetKeyValue");
     const std::string file = Text("VLIBCFileSetKeyValue", path);
-    const KeyValues set{
-        {Text("VLIBCFileSetKeyValue", key), Text("VLIBCFileSetKeyValue", value)}};
+    const KeyValues set{{Text("VLIBCFileSetKeyValue", key), Text("VLIBCFileSetKeyValue", value)}};
     Expect("VLIBCFileSetKeyValue", "flags", flags, 0);
 
-    const std::optional<int> answer = recorder.Call(
-        CallText("VLIBCFileSetKeyValue", {file, set[0].first + "=" + set[0].second}));
+    const std::optional<int> answer =
+        recorder.Call(CallText("VLIBCFileSetKeyValue", {file, set[0].first + "=" + set[0].second}));
     return answer ? *answer : CarryOut(recorder, file, set, {});
 }
 
@@ -153,8 +151,7 @@ int VLIBCFileCheckDir(const char* path)
     const std::optional<int> answer = recorder.Call(CallText("VLIBCFileCheckDir", {folder}));
     struct stat status {};
     return answer ? *answer
-                  : static_cast<int>(stat(folder.c_str(), &status) == 0 &&
-                                     S_ISDIR(status.st_mode));
+                  : static_cast<int>(stat(folder.c_str(), &status) == 0 && S_ISDIR(status.st_mode));
 }
 
 VLIBCSzHash* VLIBCSzHashAlloc(int size)

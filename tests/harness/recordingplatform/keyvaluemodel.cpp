@@ -1,4 +1,4 @@
-#include "keyvaluemodel.h"
+#include "recordingplatform/keyvaluemodel.h"
 
 #include <algorithm>
 #include <fstream>

@@ -1,9 +1,8 @@
 // `sleep` and the system log: definitions in the program take the place of the C library's.
-#include "recorder.h"
+#include "recordingplatform/recorder.h"
 
 #include <gtest/gtest.h>
 
-#include <cctype>
 #include <cstdarg>
 #include <cstdio>
 
@@ -22,15 +21,12 @@ constexpr std::string_view kPrefix = "%s:%d ";
 LogLine Parse(int priority, const std::string& line)
 {
     const std::size_t colon = line.find(':');
-    std::size_t end = colon == std::string::npos ? line.size() : colon + 1;
-    while (end < line.size() && std::isdigit(static_cast<unsigned char>(line[end])) != 0) {
-        ++end;
-    }
-    if (end >= line.size() || line[end] != ' ' || end == colon + 1) {
+    const std::size_t blank = line.find(' ', colon);
+    const std::string number = line.substr(colon + 1, blank - colon - 1);
+    if (colon == 0 || number.empty() || number.front() == '-' || number == "0") {
         ADD_FAILURE() << "the log line does not begin with file and line: " << line;
-        return {priority, "", line};
     }
-    return {priority, line.substr(0, colon), line.substr(end + 1)};
+    return {priority, line.substr(0, colon), line.substr(blank + 1)};
 }
 
 __attribute__((format(printf, 2, 0))) void Log(int priority, const char* format, va_list arguments)
@@ -39,6 +35,7 @@ __attribute__((format(printf, 2, 0))) void Log(int priority, const char* format,
     Recorder& recorder = Recorder::Current("syslog");
     if (!std::string_view(format).starts_with(kPrefix)) {
         ADD_FAILURE() << "the log format does not begin with \"" << kPrefix << "\": " << format;
+        return;
     }
     va_list measured;
     va_copy(measured, arguments);

@@ -1,5 +1,5 @@
 // Locks and errors.
-#include "recorder.h"
+#include "recordingplatform/recorder.h"
 
 #include <vornplatform/core.h>
 
@@ -22,12 +22,11 @@ int VLIBCFileLockTimeByFile(const char* path, int mode, int seconds, int* handle
 {
     const HarnessAllocations guard;
     Recorder& recorder = Recorder::Current("VLIBCFileLockTimeByFile");
-    const int result =
-        recorder
-            .Call(CallText("VLIBCFileLockTimeByFile",
-                           {Text("VLIBCFileLockTimeByFile", path), std::to_string(mode),
-                            std::to_string(seconds)}))
-            .value_or(0);
+    const int result = recorder
+                           .Call(CallText("VLIBCFileLockTimeByFile",
+                                          {Text("VLIBCFileLockTimeByFile", path),
+                                           std::to_string(mode), std::to_string(seconds)}))
+                           .value_or(0);
     Expect("VLIBCFileLockTimeByFile", "handle before the call", *handle, -1);
     Expect("VLIBCFileLockTimeByFile", "lock held already", recorder.m_heldLock, -1);
     if (recorder.m_holdsPlatformLock) {
@@ -56,10 +55,10 @@ int VLIBCFileLock(int lockWord, int seconds)
 {
     const HarnessAllocations guard;
     Recorder& recorder = Recorder::Current("VLIBCFileLock");
-    const int result = recorder
-                           .Call(CallText("VLIBCFileLock", {std::to_string(lockWord),
-                                                            std::to_string(seconds)}))
-                           .value_or(0);
+    const int result =
+        recorder
+            .Call(CallText("VLIBCFileLock", {std::to_string(lockWord), std::to_string(seconds)}))
+            .value_or(0);
     if (recorder.m_holdsPlatformLock) {
         ADD_FAILURE() << "VLIBCFileLock: the lock is held already";
     }

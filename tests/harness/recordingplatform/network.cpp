@@ -1,5 +1,5 @@
 // Interfaces, VLANs, links and bonds.
-#include "recorder.h"
+#include "recordingplatform/recorder.h"
 
 #include <vornplatform/netsdk.h>
 #include <vornplatform/sdk.h>
@@ -24,8 +24,8 @@ constexpr int kConflictSize = 32;
 constexpr int kSpeed = 1000;
 
 constexpr std::array<const char*, 9> kModeNames{
-    "none",          "balance-rr",      "802.3ad",         "balance-xor",    "active-backup",
-    "balance-alb",   "ovs-active-backup", "ovs-balance-slb", "ovs-balance-tcp"};
+    "none",        "balance-rr",        "802.3ad",         "balance-xor",    "active-backup",
+    "balance-alb", "ovs-active-backup", "ovs-balance-slb", "ovs-balance-tcp"};
 
 void ExpectZeroed(const char* function, const void* record, std::size_t size)
 {
@@ -99,8 +99,8 @@ int VLIBNetVlanCreate(const char* parent, int vlanId, const VORNNETIPCONFIG* ipC
     std::array<char, sizeof(VORNNETIPCONFIG)> owner{};
     std::memcpy(owner.data(), ipConfig, owner.size() - 1);
     return recorder
-        .Call(CallText("VLIBNetVlanCreate", {Text("VLIBNetVlanCreate", parent),
-                                             std::to_string(vlanId), owner.data()}))
+        .Call(CallText("VLIBNetVlanCreate",
+                       {Text("VLIBNetVlanCreate", parent), std::to_string(vlanId), owner.data()}))
         .value_or(0);
 }
 
@@ -206,8 +206,7 @@ int VORNNetLinkAggrOptSlsaveAdd(VORNLINKAGGROPT* opt, const char* slave)
     const HarnessAllocations guard;
     Recorder& recorder = Recorder::Current("VORNNetLinkAggrOptSlsaveAdd");
     const std::string name = Text("VORNNetLinkAggrOptSlsaveAdd", slave);
-    const int result =
-        recorder.Call(CallText("VORNNetLinkAggrOptSlsaveAdd", {name})).value_or(0);
+    const int result = recorder.Call(CallText("VORNNetLinkAggrOptSlsaveAdd", {name})).value_or(0);
     if (result >= 0 && opt->nSlave < VORN_LINK_AGGR_SLAVES) {
         char(&field)[VORN_NAME_SIZE] = opt->rgszSlave[opt->nSlave];
         field[name.copy(field, VORN_NAME_SIZE - 1)] = '\0';

@@ -1,4 +1,4 @@
-#include "recorder.h"
+#include "recordingplatform/recorder.h"
 
 #include <gtest/gtest.h>
 

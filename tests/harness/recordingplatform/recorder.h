@@ -4,7 +4,7 @@
 #ifndef HARNESS_RECORDER_H
 #define HARNESS_RECORDER_H
 
-#include "recordingplatform.h"
+#include "recordingplatform/recordingplatform.h"
 
 #include <cstdarg>
 #include <map>

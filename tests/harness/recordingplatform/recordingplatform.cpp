@@ -1,6 +1,6 @@
-#include "recordingplatform.h"
+#include "recordingplatform/recordingplatform.h"
 
-#include "recorder.h"
+#include "recordingplatform/recorder.h"
 
 #include <algorithm>
 #include <cstring>

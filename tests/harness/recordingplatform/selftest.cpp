@@ -1,5 +1,4 @@
-#include "keyvaluemodel.h"
-#include "recordingplatform.h"
+#include "recordingplatform/recordingplatform.h"
 
 #include <vornplatform/core.h>
 #include <vornplatform/hook.h>
@@ -57,15 +56,16 @@ TEST(RecordingPlatform, TakesLogLinesApart)
     RecordingPlatform platform;
     syslog(LOG_ERR, "%s:%d  Open %s fails", "regconf.cpp", 12, "/x");
     syslog(LOG_INFO, "%s:%d up", "util.cpp", 3);
-    EXPECT_THAT(platform.Log(), ElementsAre(Err("regconf.cpp", " Open /x fails"),
-                                            Info("util.cpp", "up")));
+    EXPECT_THAT(platform.Log(),
+                ElementsAre(Err("regconf.cpp", " Open /x fails"), Info("util.cpp", "up")));
 }
 
 TEST(RecordingPlatform, FailsTheTestOnALogLineWithoutFileAndLine)
 {
     RecordingPlatform platform;
-    EXPECT_NONFATAL_FAILURE(syslog(LOG_ERR, "%s:%d up", "", 3), "");
-    EXPECT_NONFATAL_FAILURE(syslog(LOG_ERR, "%s:%dup", "util.cpp", 3), "");
+    EXPECT_NONFATAL_FAILURE(syslog(LOG_ERR, "%s:%dup", "util.cpp", 3), "the log format");
+    EXPECT_NONFATAL_FAILURE(syslog(LOG_ERR, "%s:%d up", "util.cpp", 0), "the log line");
+    EXPECT_NONFATAL_FAILURE(syslog(LOG_ERR, "%s:%d up", "", 3), "the log line");
 }
 
 TEST(RecordingPlatform, FailsTheTestOnAWrongConstant)

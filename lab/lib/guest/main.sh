@@ -1,0 +1,55 @@
+# shellcheck shell=dash
+# The guest's helpers, and the way through a case. A case's script is read by this shell, so every
+# function of these files is its vocabulary.
+
+. /lab/report.sh
+. /lab/wait.sh
+. /lab/topology.sh
+. /lab/snapshot.sh
+. /lab/probes.sh
+. /lab/host.sh
+
+lab_main()
+{
+    mkdir -p "$lab_out"
+    topology_build
+    if [ -e /lab/case/run.sh ]; then
+        lab_run_case
+    fi
+    if [ "$1" = here ]; then
+        printf '\nPorts: %s  The outside: ip netns exec outside ...  Leave with: exit\n\n' \
+            "$(topology_ports)"
+        cd /root || exit 1
+        setsid cttyhack bash
+    else
+        lab_send_results
+    fi
+}
+
+# The case runs in a shell of its own: whatever ends it, the results leave the guest.
+lab_run_case()
+{
+    (
+        set -eu
+        lab_boot
+        . /lab/case/run.sh
+    )
+    report_verdict "$?"
+    probes_stop >/dev/null 2>&1
+}
+
+# Brings the appliance's own network up as its boot does.
+lab_boot()
+{
+    if [ -x /etc/rc.network ] && [ ! -e /lab/case/no-boot ]; then
+        /etc/rc.network start || fail "the appliance's network did not start"
+        topology_ready
+    fi
+}
+
+lab_send_results()
+{
+    cp /var/log/messages "$lab_out/syslog" 2>/dev/null
+    cp -r /var/log/openvswitch "$lab_out/openvswitch-log" 2>/dev/null
+    tar -C "$lab_out" -cf - . >/dev/ttyS2 2>/dev/null
+}

@@ -1,0 +1,118 @@
+# shellcheck shell=dash
+# What a case says: steps, figures, and failures with their reason.
+
+lab_out=/run/lab
+
+# Guest time in seconds since boot, with hundredths: the clock that counts instructions.
+guest_time()
+{
+    cut -d ' ' -f 1 /proc/uptime
+}
+
+# Announces a step of the case.
+step()
+{
+    printf '[%8s] %s\n' "$(guest_time)" "$*"
+}
+
+# A line of detail under a step.
+note()
+{
+    printf '             %s\n' "$*"
+}
+
+# Prints standard input as detail.
+show()
+{
+    sed 's/^/             /'
+}
+
+# Records a measured value: figure NAME VALUE UNIT.
+figure()
+{
+    printf '%s\t%s\t%s\n' "$1" "$2" "$3" >>"$lab_out/figures"
+    note "$1: $2 $3"
+}
+
+# Ends the case: what did not hold.
+fail()
+{
+    printf 'FAILED: %s\n' "$*"
+    printf '%s\n' "$*" >>"$lab_out/failure"
+    exit 1
+}
+
+# The case's last line, which the host reads.
+report_verdict()
+{
+    if [ "$1" -eq 0 ] && [ ! -e "$lab_out/failure" ]; then
+        printf 'lab-verdict: passed\n'
+    else
+        if [ ! -e "$lab_out/failure" ]; then
+            echo "the case's script ended with status $1" >"$lab_out/failure"
+        fi
+        printf 'lab-verdict: failed: %s\n' "$(head -n 1 "$lab_out/failure")"
+    fi
+}
+
+# expect_equal WHAT WANTED GOT
+expect_equal()
+{
+    [ "$2" = "$3" ] || fail "$1: wanted '$2', got '$3'"
+}
+
+# expect_status WANTED COMMAND...: runs a command and holds its exit status against the one wanted.
+expect_status()
+{
+    local wanted="$1" status=0
+    shift
+    "$@" || status=$?
+    [ "$status" -eq "$wanted" ] || fail "'$*' ended with $status, not $wanted"
+}
+
+# expect_success COMMAND...
+expect_success()
+{
+    "$@" || fail "'$*' ended with $?"
+}
+
+# expect_failure COMMAND...
+expect_failure()
+{
+    if "$@"; then
+        fail "'$*' succeeded"
+    fi
+}
+
+# expect_at_most WHAT VALUE LIMIT, decimals allowed
+expect_at_most()
+{
+    awk -v value="$2" -v limit="$3" 'BEGIN { exit !(value + 0 <= limit + 0) }' ||
+        fail "$1: $2 is more than $3"
+}
+
+# expect_logged PATTERN: a line of the system log matches.
+expect_logged()
+{
+    grep -Eq -- "$1" /var/log/messages || fail "the system log has no line '$1'"
+}
+
+expect_not_logged()
+{
+    if grep -E -- "$1" /var/log/messages; then
+        fail "the system log has a line '$1'"
+    fi
+}
+
+# expect_line FILE LINE: the file holds exactly this line.
+expect_line()
+{
+    grep -Fqx -- "$2" "$1" || fail "$1 has no line '$2'"
+}
+
+expect_no_line()
+{
+    if grep -Fqx -- "$2" "$1"; then
+        fail "$1 has a line '$2'"
+    fi
+}

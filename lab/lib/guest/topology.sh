@@ -1,0 +1,120 @@
+# shellcheck shell=dash
+# The appliance's ports in this namespace, and the outside world in another.
+#
+# Each port is on a network segment of its own, as if on a switch of its own: on a shared one Linux
+# answers for an address on every port, and a probe would not notice that a port is dead.
+#
+# A topology's file `topology` has these lines:
+#   port NAME KIND MAC      KIND veth: a pair of the guest's kernel, fastest and exactly repeatable
+#                                virtio: a PCI card, connected to one of the outside's
+#   outside NAME ADDRESS... the outside's addresses on the port's segment
+#   far ADDRESS...          addresses of a host behind the gateways
+# Its folder `host` is laid over the appliance's file system.
+
+topology_ports()
+{
+    awk '$1 == "port" { print $2 }' /lab/topology/topology | tr '\n' ' '
+}
+
+topology_build()
+{
+    local word name kind mac rest
+    ip netns add outside
+    in_outside ip link set lo up
+    # Each of the outside's segments keeps to itself.
+    in_outside sysctl -q -w net.ipv4.conf.all.arp_ignore=1 net.ipv4.conf.all.arp_announce=2 \
+        net.ipv4.conf.default.rp_filter=0 net.ipv6.conf.default.accept_dad=0 \
+        net.ipv6.conf.all.accept_dad=0 net.ipv4.ping_group_range='0 2147483647'
+
+    while read -r word name kind mac rest; do
+        if [ "$word" = port ]; then
+            topology_port "$name" "$kind" "$mac"
+        fi
+    done </lab/topology/topology
+    while read -r word name rest; do
+        case $word in
+            outside) topology_outside "$name" "$rest" ;;
+            far) topology_far "$name $rest" ;;
+        esac
+    done </lab/topology/topology
+
+    if [ -d /lab/topology/host ]; then
+        cp -a /lab/topology/host/. /
+    fi
+}
+
+topology_port()
+{
+    local name="$1" kind="$2" mac="$3"
+    local peer_mac="06${mac#??}"
+    if [ "$kind" = veth ]; then
+        ip link add "$name" address "$mac" type veth peer name "out-$name" address "$peer_mac" \
+            netns outside
+    else
+        # The kernel numbers cards as it finds them; the MAC tells which one is meant.
+        topology_rename "$mac" "$name"
+        topology_rename "$peer_mac" "out-$name"
+        ip link set "out-$name" netns outside
+    fi
+    in_outside ip link set "out-$name" up
+}
+
+topology_rename()
+{
+    local folder name
+    for folder in /sys/class/net/*; do
+        name="${folder##*/}"
+        if [ "$(cat "$folder/address")" = "$1" ]; then
+            [ "$name" = "$2" ] && return
+            # The wanted name may still be another card's.
+            if [ -e "/sys/class/net/$2" ]; then
+                ip link set "$2" name "was-$2"
+            fi
+            ip link set "$name" name "$2"
+            return
+        fi
+    done
+    fail "no card has the address $1"
+}
+
+topology_outside()
+{
+    local address
+    for address in $2; do
+        in_outside ip address add "$address" dev "out-$1"
+    done
+}
+
+topology_far()
+{
+    local address
+    for address in $1; do
+        in_outside ip address add "$address" dev lo
+    done
+}
+
+in_outside()
+{
+    ip netns exec outside "$@"
+}
+
+# The appliance's addresses as its files give them, one a line: FAMILY ADDRESS PORT.
+topology_addresses()
+{
+    local file port
+    for file in /lab/topology/host/etc/sysconfig/network-scripts/ifcfg-*; do
+        port="${file##*/ifcfg-}"
+        sed -n -e "s|^IPADDR=\"\\{0,1\\}\\([0-9.]*\\).*|4 \\1 $port|p" \
+            -e "s|^IPV6ADDR=\"\\{0,1\\}\\([0-9a-f:]*\\).*|6 \\1 $port|p" "$file"
+    done
+}
+
+# Waits until every address of the appliance answers the outside.
+topology_ready()
+{
+    local family address port
+    topology_addresses >"$lab_out/addresses"
+    while read -r family address port; do
+        wait_until 30 in_outside fping "-$family" -q -r 0 -t 200 "$address"
+    done <"$lab_out/addresses"
+}

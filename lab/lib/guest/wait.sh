@@ -1,0 +1,77 @@
+# shellcheck shell=dash
+# Waiting for conditions. Deadlines are of the guest's clock; an idle guest costs no real time.
+
+# Sets $ticks to the hundredths of a second since boot. Starts no process: it is called in loops.
+guest_ticks()
+{
+    local seconds hundredths
+    IFS='. ' read -r seconds hundredths _ </proc/uptime
+    ticks=$((seconds * 100 + ${hundredths#0}))
+}
+
+# wait_until SECONDS COMMAND...: tries a command every 20 ms until it succeeds; fails the case when
+# it has not within the given seconds.
+wait_until()
+{
+    local seconds="$1" ticks deadline
+    shift
+    guest_ticks
+    deadline=$((ticks + seconds * 100))
+    while ! "$@" >/dev/null 2>&1; do
+        guest_ticks
+        if [ "$ticks" -ge "$deadline" ]; then
+            fail "after $seconds s still not so: $*"
+        fi
+        usleep 20000
+    done
+}
+
+# True once the guest has been up for so many seconds.
+uptime_reached()
+{
+    local ticks
+    guest_ticks
+    [ "$ticks" -ge "$(($1 * 100))" ]
+}
+
+# True when a process of that pid is there and not a zombie.
+process_runs()
+{
+    local state
+    [ -r "/proc/$1/stat" ] || return 1
+    read -r state <"/proc/$1/stat" || return 1
+    state="${state##*) }"
+    [ "${state%% *}" != Z ]
+}
+
+process_ended()
+{
+    ! process_runs "$1"
+}
+
+# Pids of the processes with this program name, one a line; the name is the kernel's, 15 bytes.
+processes_named()
+{
+    local folder name
+    for folder in /proc/[0-9]*; do
+        read -r name 2>/dev/null <"$folder/comm" || continue
+        if [ "$name" = "$1" ]; then
+            echo "${folder#/proc/}"
+        fi
+    done
+}
+
+process_named()
+{
+    [ -n "$(processes_named "$1")" ]
+}
+
+no_process_named()
+{
+    [ -z "$(processes_named "$1")" ]
+}
+
+file_has()
+{
+    grep -Eq -- "$2" "$1"
+}

@@ -1,0 +1,83 @@
+# shellcheck shell=bash disable=SC2154,SC2034 # variables that the lab's files share
+# Running cases: each in a guest of its own.
+
+lab_case_names()
+{
+    local folder
+    for folder in "$lab_source"/cases/*/; do
+        basename "$folder"
+    done
+}
+
+# The first line of text in a case's steps.
+lab_case_title()
+{
+    sed -n '/^[^#[:space:]]/ { p; q; }' "$lab_source/cases/$1/README.md"
+}
+
+lab_case_deadline()
+{
+    local file=$lab_source/cases/$1/deadline
+    if [[ -f $file ]]; then
+        cat "$file"
+    else
+        echo 300
+    fi
+}
+
+# Runs one case and leaves in its results folder: console, report, syslog, figures, verdict and
+# whatever else the case kept.
+lab_run_case()
+{
+    local name=$1 results=$lab_results/$1 topology began status=0 verdict
+    topology=$(<"$lab_source/cases/$name/topology")
+    rm -rf "$results"
+    mkdir -p "$results"
+    lab_make_guest_image "$results/guest.cpio" "$topology" "$lab_source/cases/$name"
+
+    began=$(date +%s)
+    # The deadline is of this machine's time: it ends a guest whose own clock may stand still.
+    (lab_start_guest "$(lab_case_deadline "$name")" "$topology" "$results/guest.cpio" '' \
+        -serial "file:$results/console" -serial "file:$results/report" \
+        -serial "file:$results/results.tar") </dev/null >"$results/qemu" 2>&1 || status=$?
+    echo $(($(date +%s) - began)) >"$results/seconds"
+
+    tar -C "$results" -xf "$results/results.tar" 2>/dev/null || true
+    rm -f "$results/results.tar" "$results/guest.cpio"
+    verdict=$(sed -n 's/^lab-verdict: //p' "$results/report" 2>/dev/null | tr -d '\r' | tail -n 1)
+    if [[ -z $verdict ]]; then
+        verdict="failed: $(lab_why_no_verdict "$status" "$name")"
+    fi
+    echo "$verdict" >"$results/verdict"
+}
+
+lab_why_no_verdict()
+{
+    if [[ $1 -eq 124 || $1 -eq 137 ]]; then
+        echo "the guest hung; ended after $(lab_case_deadline "$2") s"
+    else
+        echo "the guest ended without a verdict (status $1)"
+    fi
+}
+
+# A case's closing line: verdict, time and figures; for a failed one the tail of its output.
+lab_print_case()
+{
+    local name=$1 results=$lab_results/$1 verdict figures=''
+    verdict=$(<"$results/verdict")
+    if [[ -s $results/figures ]]; then
+        figures=$(awk -F '\t' '{ printf "%s%s %s %s", (NR > 1 ? ", " : ""), $1, $2, $3 }' \
+            "$results/figures")
+    fi
+    printf '%-6s %-28s %4s s  %s\n' "${verdict%%:*}" "$name" "$(<"$results/seconds")" "$figures"
+    if [[ $verdict == passed ]]; then
+        return
+    fi
+    printf '       %s\n' "${verdict#failed: }"
+    printf '       the end of its report (all of it, and more, is in %s):\n' "$results"
+    tail -n 15 "$results/report" 2>/dev/null | sed 's/^/         | /'
+    if ! grep -q '^lab-verdict' "$results/report" 2>/dev/null; then
+        printf '       the end of its console:\n'
+        tail -n 25 "$results/console" "$results/qemu" 2>/dev/null | sed 's/^/         | /'
+    fi
+}

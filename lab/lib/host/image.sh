@@ -1,0 +1,249 @@
+# shellcheck shell=bash disable=SC2154,SC2034 # variables that the lab's files share
+# The appliance's file system: cpio archives that the kernel unpacks one after the other.
+#   system   Debian's programs, their libraries, the kernel's modules
+#   product  what this repository installs
+#   guest    the guest's scripts, a topology and a case; made anew for each guest
+# A layer is kept as long as nothing it is made of changes.
+
+# What the guest runs of Debian's, besides busybox.
+lab_programs=(
+    bin/bash bin/dash bin/cp bin/ip sbin/bridge sbin/tc bin/ss usr/bin/chrt usr/bin/fping
+    usr/bin/tcpdump usr/bin/uuidgen sbin/ldconfig usr/bin/getconf
+    usr/bin/ovs-vsctl usr/bin/ovs-appctl usr/bin/ovs-ofctl usr/bin/ovs-dpctl
+    usr/bin/ovsdb-tool usr/bin/ovsdb-client usr/sbin/ovsdb-server
+    usr/lib/openvswitch-switch/ovs-vswitchd
+)
+
+# What the kernel needs for the lab, in any order: what they need in turn is found below.
+lab_modules=(openvswitch bonding 8021q dummy veth virtio_net virtio_pci)
+
+lab_busybox()
+{
+    "$lab_debian/bin/busybox" "$@"
+}
+
+# The place of a path in a tree whose /bin, /sbin and /lib are links into /usr.
+lab_merged_path()
+{
+    case $1 in
+        bin/* | sbin/* | lib/* | lib64/*) printf 'usr/%s' "$1" ;;
+        *) printf '%s' "$1" ;;
+    esac
+}
+
+# Copies the libraries that a program or library needs into a tree, found first in the tree itself
+# and then among Debian's packages.
+lab_copy_libraries()
+{
+    local root=$1 program=$2 list library place
+    local folder=usr/lib/x86_64-linux-gnu
+    if ! head -c 4 "$program" | grep -q ELF; then
+        return
+    fi
+    if ! list=$("$lab_debian/lib64/ld-linux-x86-64.so.2" --inhibit-cache --library-path \
+        "$root/usr/lib:$root/$folder:$lab_debian/lib/x86_64-linux-gnu:$lab_debian/$folder" \
+        --list "$program" 2>&1); then
+        # A static program asks for nothing.
+        if [[ $list == *"not a dynamic executable"* || $list == *"statically linked"* ]]; then
+            return
+        fi
+        die "cannot load $program: $list"
+    fi
+    while read -r library; do
+        place=$folder/${library##*/}
+        [[ $library == "$lab_debian"/* && ! -e $root/$place ]] || continue
+        cp -L "$library" "$root/$place"
+    done < <(sed -n 's/.* => \(\/.*\) (0x.*/\1/p' <<<"$list")
+}
+
+# Prints a module's file and those of the modules it needs, needed ones first.
+lab_module_order()
+{
+    local modules=$1 name=$2 file needs
+    file=$(find "$modules" -name "${name//_/[-_]}.ko" -print -quit)
+    if [[ -z $file ]]; then
+        if grep -q "/${name//_/[-_]}\.ko$" "$modules/modules.builtin"; then
+            return
+        fi
+        die "the kernel has no module $name"
+    fi
+    needs=$(lab_busybox strings "$file" | sed -n "s/^depends=//p")
+    for name in ${needs//,/ }; do
+        lab_module_order "$modules" "$name"
+    done
+    printf '%s\n' "$file"
+}
+
+lab_install_modules()
+{
+    local root=$1 modules name file
+    modules=$(echo "$lab_debian"/lib/modules/*)
+    mkdir -p "$root/lab/modules"
+    for name in "${lab_modules[@]}"; do
+        lab_module_order "$modules" "$name"
+    done | awk '!seen[$0]++' | while read -r file; do
+        cp "$file" "$root/lab/modules/"
+        printf '%s\n' "${file##*/}" >>"$root/lab/modules/order"
+    done
+}
+
+lab_make_system()
+{
+    local root=$1 path place applet folder
+    mkdir -p "$root"/{dev,proc,sys,run,tmp,root,var/lib,var/log/openvswitch,etc/openvswitch} \
+        "$root"/usr/{bin,sbin,lib/x86_64-linux-gnu,lib64,share,local/bin}
+    for folder in bin sbin lib lib64; do
+        ln -s "usr/$folder" "$root/$folder"
+    done
+    ln -s /run "$root/var/run"
+    ln -s /run/lock "$root/var/lock"
+    chmod 1777 "$root/tmp"
+
+    cp "$lab_debian/bin/busybox" "$root/usr/bin/busybox"
+    while read -r applet; do
+        ln -s busybox "$root/usr/bin/$applet"
+    done < <(lab_busybox --list | grep -vx -e busybox -e init -e linuxrc)
+
+    cp -L "$lab_debian/lib64/ld-linux-x86-64.so.2" "$root/usr/lib64/"
+    for path in "${lab_programs[@]}"; do
+        place=$root/$(lab_merged_path "$path")
+        mkdir -p "${place%/*}"
+        # The applet of the same name gives way to Debian's program.
+        rm -f "$place" "$root/usr/bin/${path##*/}"
+        cp -L "$lab_debian/$path" "$place"
+        lab_copy_libraries "$root" "$place"
+    done
+    ln -sf dash "$root/usr/bin/sh"
+    ln -s ../lib/openvswitch-switch/ovs-vswitchd "$root/usr/sbin/ovs-vswitchd"
+    cp -r "$lab_debian/usr/share/openvswitch" "$root/usr/share/"
+    mkdir -p "$root/etc/default" "$root/etc/iproute2"
+    cp "$lab_debian/etc/default/openvswitch-switch" "$root/etc/default/"
+    cp "$lab_debian"/etc/iproute2/* "$root/etc/iproute2/" 2>/dev/null || true
+
+    printf 'root:x:0:0:root:/root:/bin/sh\n' >"$root/etc/passwd"
+    printf 'root:x:0:\n' >"$root/etc/group"
+    printf '127.0.0.1 localhost appliance\n::1 localhost\n' >"$root/etc/hosts"
+    printf 'passwd: files\ngroup: files\nhosts: files\n' >"$root/etc/nsswitch.conf"
+    printf 'icmp 1 ICMP\nudp 17 UDP\ntcp 6 TCP\nipv6-icmp 58 IPv6-ICMP\n' >"$root/etc/protocols"
+    printf '12\n' >"$root/etc/debian_version"
+    printf 'appliance\n' >"$root/etc/hostname"
+    lab_install_modules "$root"
+}
+
+# What the repository installs, and the libraries of Debian's that it needs.
+lab_make_product()
+{
+    local root=$1 file
+    mkdir -p "$root/usr/lib/x86_64-linux-gnu"
+    DESTDIR=$root cmake --install "$lab_release" --prefix /usr >"$lab_build/install.log" ||
+        die "cmake --install failed: see $lab_build/install.log"
+    rm -rf "$root/usr/include" "$root/usr/share/man"
+    lab_build_clients "$root"
+    while read -r file; do
+        lab_copy_libraries "$root" "$file"
+    done < <(find "$root" -type f \( -perm -u+x -o -name '*.so*' \))
+}
+
+# The lab's own client programs, one source file each, linked to the installed library.
+lab_build_clients()
+{
+    local root=$1 source folder
+    folder=$(dirname "$(find "$root/usr/lib" -name libvornovs.so -print -quit)")
+    mkdir -p "$root/lab/clients"
+    for source in "$lab_source"/clients/*.cpp; do
+        [[ -e $source ]] || continue
+        "${CXX:-c++}" -std=c++20 -O1 -Wall -Wextra -Werror -I "$lab_root/include" \
+            -I "$lab_root/src/platform" "$source" -o "$root/lab/clients/$(basename "$source" .cpp)" \
+            -L "$folder" -Wl,-rpath-link,"$folder" -lvornovs ||
+            die "the client $source does not build"
+    done
+}
+
+# Makes an archive of a tree; everything in it belongs to root.
+lab_archive()
+{
+    local root=$1 archive=$2
+    (cd "$root" && find . -mindepth 1 | LC_ALL=C sort |
+        lab_busybox cpio -o -H newc -R 0:0 2>/dev/null) >"$archive.new"
+    mv "$archive.new" "$archive"
+}
+
+# Makes a layer with the function given unless it was made of the same things, and sets
+# $lab_layer to its archive.
+lab_layer()
+{
+    local name=$1 make=$2 print=$3
+    local root=$lab_layers/$name
+    lab_layer=$lab_layers/$name-$print.cpio
+    if [[ -f $lab_layer ]]; then
+        return
+    fi
+    say_note "making the lab's $name layer"
+    rm -rf "$root" "$lab_layers/$name"-*.cpio
+    mkdir -p "$root"
+    "$make" "$root"
+    lab_archive "$root" "$lab_layer"
+}
+
+# Makes the system and product layers; sets $lab_kernel and $lab_image.
+lab_make_image()
+{
+    local here=${BASH_SOURCE[0]} system product
+    mkdir -p "$lab_layers"
+    lab_fetch_packages
+    lab_kernel=$(echo "$lab_debian"/boot/vmlinuz-*)
+
+    lab_layer system lab_make_system \
+        "$(printf '%s\n' "$here" "$lab_debian/.packages" | fingerprint)"
+    system=$lab_layer
+    lab_layer product lab_make_product "$(lab_product_files | fingerprint)"
+    product=$lab_layer
+
+    lab_image=$lab_layers/image.cpio
+    if [[ ! $lab_image -nt $system || ! $lab_image -nt $product ]]; then
+        cat "$system" "$product" >"$lab_image.new"
+        mv "$lab_image.new" "$lab_image"
+    fi
+}
+
+# Everything that decides what the product layer holds.
+lab_product_files()
+{
+    printf '%s\n' "${BASH_SOURCE[0]}" "$lab_debian/.packages"
+    find "$lab_root/lab/clients" -name '*.cpp' 2>/dev/null || true
+    find "$lab_release/bin" "$lab_release/lib" -type f 2>/dev/null || true
+    find "$lab_root/host" "$lab_root/tools" -type f ! -name '*.cpp' ! -name '*.h'
+    find "$lab_release" -name cmake_install.cmake
+}
+
+# Adds the guest's scripts, a topology and a case to the image: $1 archive to write, $2 topology,
+# $3 case folder or empty.
+lab_make_guest_image()
+{
+    local archive=$1 topology=$2 case_folder=$3 root
+    root=$(mktemp -d "$lab_build/guest.XXXXXX")
+    mkdir -p "$root/lab/topology" "$root/lab/case"
+    cp "$lab_source"/lib/guest/* "$root/lab/"
+    cp -r "$lab_source/topologies/$topology/." "$root/lab/topology/"
+    if [[ -n $case_folder ]]; then
+        cp -r "$case_folder/." "$root/lab/case/"
+    fi
+    chmod 755 "$root/lab/init"
+    ln -s lab/init "$root/init"
+    lab_archive "$root" "$root.cpio"
+    cat "$lab_image" "$root.cpio" >"$archive"
+    rm -rf "$root" "$root.cpio"
+}
+
+# Builds what the appliance runs; the tests are not part of it.
+lab_build_release()
+{
+    say_note "building the release"
+    mkdir -p "$lab_build"
+    (cd "$lab_root" && cmake --preset release &&
+        cmake --build --preset release --target src/all host/all tools/all) \
+        >"$lab_build/release.log" 2>&1 || {
+        tail -n 30 "$lab_build/release.log" >&2
+        die "the release does not build: see $lab_build/release.log"
+    }
+}

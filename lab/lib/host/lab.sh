@@ -1,0 +1,14 @@
+# shellcheck shell=bash
+# All of the lab's side on this machine.
+
+lab_library=$(dirname "${BASH_SOURCE[0]}")
+# shellcheck source=lab/lib/host/paths.sh
+. "$lab_library/paths.sh"
+# shellcheck source=lab/lib/host/packages.sh
+. "$lab_library/packages.sh"
+# shellcheck source=lab/lib/host/image.sh
+. "$lab_library/image.sh"
+# shellcheck source=lab/lib/host/guest.sh
+. "$lab_library/guest.sh"
+# shellcheck source=lab/lib/host/cases.sh
+. "$lab_library/cases.sh"

@@ -1,0 +1,64 @@
+# shellcheck shell=bash disable=SC2154,SC2034 # variables that the lab's files share
+# The Debian packages of the appliance: downloaded and unpacked into the build folder, never
+# installed.
+
+# Programs of the appliance.
+lab_packages=(
+    linux-image-cloud-amd64
+    bash busybox-static coreutils dash fping iproute2 libc-bin tcpdump util-linux uuid-runtime
+    openvswitch-common openvswitch-switch
+)
+
+# Libraries that those and the repository's own programs need. One that is missing here is named
+# when the image is made.
+lab_packages+=(
+    libacl1 libattr1 libbpf1 libbsd0 libc6 libcap-ng0 libcap2 libcom-err2 libdb5.3 libelf1
+    libevent-2.1-7 libgcc-s1 libgmp10 libgssapi-krb5-2 libhogweed6 libk5crypto3 libkeyutils1
+    libkrb5-3 libkrb5support0 libmd0 libmnl0 libnettle8 libnghttp2-14 libnl-3-200
+    libnl-route-3-200 libnuma1 libpcap0.8 libpcre2-8-0 libselinux1 libssl3 libstdc++6 libtinfo6
+    libtirpc3 libunbound8 libuuid1 libxdp1 libxtables12 zlib1g
+)
+
+# Prints package=version of everything the appliance is made of, as apt offers it now.
+lab_wanted_packages()
+{
+    local kernel
+    ensure_package_lists linux-image-cloud-amd64
+    ensure_package_lists openvswitch-switch
+    kernel=$(apt-cache depends --important linux-image-cloud-amd64 |
+        sed -n 's/^ *Depends: \(linux-image-.*\)/\1/p' | head -n 1)
+    [[ -n $kernel ]] || die "apt offers no linux-image-cloud-amd64"
+
+    LC_ALL=C apt-cache policy "$kernel" "${lab_packages[@]}" |
+        awk '/^[^ ].*:$/ { name = $1; sub(/:$/, "", name) }
+             $1 == "Candidate:" { print name "=" $2 }' |
+        grep -v '^linux-image-cloud-amd64=' | LC_ALL=C sort -u
+}
+
+# Unpacks every package into $lab_debian; does nothing when what is there is what apt offers.
+lab_fetch_packages()
+{
+    local stamp=$lab_debian/.packages wanted archive
+    # apt offers the same as long as its lists are the same, and asking takes seconds.
+    if [[ $stamp -nt /var/lib/apt/lists && $stamp -nt ${BASH_SOURCE[0]} ]]; then
+        return
+    fi
+    wanted=$(lab_wanted_packages)
+    if [[ -f $stamp && $(<"$stamp") == "$wanted" ]]; then
+        touch "$stamp"
+        return
+    fi
+
+    say_note "fetching Debian's packages for the lab"
+    rm -rf "$lab_debian" "$lab_build/archives"
+    mkdir -p "$lab_debian" "$lab_build/archives"
+    # The sandbox user of apt cannot enter a build folder in somebody's home.
+    (cd "$lab_build/archives" && xargs apt-get -q -o APT::Sandbox::User=root download <<<"$wanted") \
+        >"$lab_build/fetch.log" 2>&1 ||
+        die "apt cannot download the lab's packages: see $lab_build/fetch.log"
+    for archive in "$lab_build"/archives/*.deb; do
+        dpkg-deb -x "$archive" "$lab_debian"
+    done
+    rm -rf "$lab_build/archives"
+    printf '%s\n' "$wanted" >"$stamp"
+}

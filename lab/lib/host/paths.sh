@@ -1,0 +1,21 @@
+# shellcheck shell=bash disable=SC2034 # read by the files that come after
+# Where the lab keeps what it makes. Everything is under the build folder; LAB_BUILD moves it.
+
+lab_root=$(cd "$(dirname "${BASH_SOURCE[0]}")/../../.." && pwd)
+lab_source=$lab_root/lab
+lab_build=${LAB_BUILD:-$lab_root/build/lab}
+lab_release=${LAB_RELEASE:-$lab_root/build/release}
+lab_results=$lab_build/results
+lab_debian=$lab_build/debian
+lab_layers=$lab_build/layers
+
+# shellcheck source=scripts/lib/say.sh
+. "$lab_root/scripts/lib/say.sh"
+# shellcheck source=scripts/lib/hostpackages.sh
+. "$lab_root/scripts/lib/hostpackages.sh"
+
+# A name for the content of files: paths on standard input, one a line.
+fingerprint()
+{
+    LC_ALL=C sort | tr '\n' '\0' | xargs -0 -r sha256sum | sha256sum | cut -c 1-16
+}

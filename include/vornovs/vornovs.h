@@ -256,7 +256,7 @@ class VORNOVS_API OVSChangeHook : public vornnetsdk::hook::BaseHook {
 public:
     /** @param action  "create" (to the switch) or "delete" (back). */
     explicit OVSChangeHook(const std::string& action);
-    virtual ~OVSChangeHook();
+    ~OVSChangeHook() override;
 };
 
 /** Bond modes and bonds on the switch. Takes no lock. */

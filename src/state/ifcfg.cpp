@@ -20,12 +20,12 @@ std::string Fit(std::string text, std::size_t buffer)
 
 std::string BridgeName(const std::string& name, std::size_t buffer)
 {
-    return Fit(std::string(kBridgePrefix) + name.c_str(), buffer);
+    return Fit(std::string(kBridgePrefix).append(TextOf(name)), buffer);
 }
 
 std::string PlainName(const std::string& bridge, std::size_t buffer)
 {
-    const std::string_view text = bridge.c_str();
+    const std::string_view text = TextOf(bridge);
     if (text.substr(0, kBridgePrefix.size()) != kBridgePrefix) {
         return {};
     }
@@ -44,7 +44,7 @@ std::string FirstWord(std::string_view text)
 
 std::string IfcfgPath(const std::string& name, std::size_t buffer)
 {
-    return Fit(std::string(kIfcfgPrefix) + name.c_str(), buffer);
+    return Fit(std::string(kIfcfgPrefix).append(TextOf(name)), buffer);
 }
 
 } // namespace VORN::OVS

@@ -26,6 +26,12 @@ constexpr char kKeySlave[] = "SLAVE";
 constexpr char kKeyType[] = "TYPE";
 constexpr char kKeyVlanId[] = "OVS_VLAN_ID";
 
+/** @return the name as the platform reads it: a byte string that ends at its first NUL. */
+inline std::string_view TextOf(const std::string& name)
+{
+    return name.c_str();
+}
+
 /** @return as much of the text as a buffer of that many bytes holds beside its terminator. */
 std::string Fit(std::string text, std::size_t buffer);
 

@@ -44,7 +44,7 @@ try {
 
 int OVSIfsConf::Write(const std::string& name)
 try {
-    if (m_names.count(name) > 0) {
+    if (m_names.contains(name)) {
         OVS_ERR("The %s has exist", name.c_str());
         return -1;
     }

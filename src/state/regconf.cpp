@@ -39,7 +39,7 @@ try {
 
 int OVSRegConf::Register(const std::string& name)
 try {
-    if (m_names.count(name) > 0) {
+    if (m_names.contains(name)) {
         OVS_ERR("The %s has been registered before", name.c_str());
         return 1;
     }
@@ -60,7 +60,7 @@ int OVSRegConf::UnRegister(const std::string& name)
 
 int OVSRegConf::IsRegister(const std::string& name)
 {
-    return m_names.count(name) > 0 ? 1 : -1;
+    return m_names.contains(name) ? 1 : -1;
 }
 
 int OVSRegConf::GetRegNames(std::set<std::string>& out)

@@ -82,7 +82,7 @@ try {
             m_vlans[name] = vlan;
             name = NameOf(vlan.szRealName);
         }
-        if (AgreesWith(name, "bond") && m_bonds.count(name) == 0) {
+        if (AgreesWith(name, "bond") && !m_bonds.contains(name)) {
             (void)InitBondOpt(name);
         }
         m_ifs.insert(name);
@@ -116,7 +116,7 @@ try {
         if (VlanManager::Get(name, &vlan) == 1) {
             m_vlans[name] = vlan;
         }
-        if (VLIBNetOVSIfIsMaster(name.c_str()) == kCarriesBond && m_bonds.count(name) == 0) {
+        if (VLIBNetOVSIfIsMaster(name.c_str()) == kCarriesBond && !m_bonds.contains(name)) {
             (void)InitBondOpt(name);
         }
         bridges.insert(name);

@@ -87,7 +87,7 @@ bool StopNetwork(const std::vector<std::string>& names)
 bool IsInterfaceExist(const std::string& name)
 try {
     const std::string path =
-        Fit(std::string("/sys/class/net/") + name.c_str() + "/flags", kNameBuffer);
+        Fit(std::string("/sys/class/net/").append(TextOf(name)).append("/flags"), kNameBuffer);
     return VLIBCFileExist(path.c_str()) != 0;
 } catch (const std::exception&) {
     return false;

@@ -88,7 +88,7 @@ try {
 
 int VlanManager::Set(const std::string& port, const std::string& id)
 try {
-    const std::string tag = Fit(std::string("tag=") + id.c_str(), kNameBuffer);
+    const std::string tag = Fit(std::string("tag=").append(TextOf(id)), kNameBuffer);
     if (VLIBCExecl(kSwitchTool, kExecOptions, "set", "port", port.c_str(), tag.c_str(), nullptr) !=
         0) {
         OVS_ERR("set %s's vlan tag failed, tag ID = %s", port.c_str(), id.c_str());

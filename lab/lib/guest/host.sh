@@ -1,1 +1,1 @@
-# shellcheck shell=dash
+# shellcheck shell=bash

@@ -1,4 +1,4 @@
-# shellcheck shell=dash
+# shellcheck shell=bash
 # The guest's helpers, and the way through a case. A case's script is read by this shell, so every
 # function of these files is its vocabulary.
 
@@ -30,8 +30,10 @@ lab_main()
 lab_run_case()
 {
     (
-        set -eu
+        set -eEu -o pipefail
+        trap 'report_ended_at "$?" "${BASH_SOURCE[0]}" "$LINENO" "$BASH_COMMAND"' ERR
         lab_boot
+        # shellcheck source=/dev/null
         . /lab/case/run.sh
     )
     report_verdict "$?"

@@ -126,6 +126,7 @@ lab_make_system()
     printf 'passwd: files\ngroup: files\nhosts: files\n' >"$root/etc/nsswitch.conf"
     printf 'icmp 1 ICMP\nudp 17 UDP\ntcp 6 TCP\nipv6-icmp 58 IPv6-ICMP\n' >"$root/etc/protocols"
     printf '12\n' >"$root/etc/debian_version"
+    : >"$root/etc/resolv.conf"
     printf 'appliance\n' >"$root/etc/hostname"
     lab_install_modules "$root"
 }

@@ -111,7 +111,7 @@ bool ReplaceByRename(const std::string& path, std::string_view text, const struc
         return old != nullptr;
     }
     if (old != nullptr) {
-        (void)::fchown(replacement.Get(), old->st_uid, old->st_gid);
+        [[maybe_unused]] const int owned = ::fchown(replacement.Get(), old->st_uid, old->st_gid);
         (void)::fchmod(replacement.Get(), old->st_mode & 07777U);
     }
     if (!WriteAll(replacement.Get(), text) || ::fsync(replacement.Get()) != 0) {

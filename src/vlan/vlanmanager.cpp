@@ -68,7 +68,8 @@ try {
         return -1;
     }
     std::array<char, kNameBuffer> line{};
-    (void)std::fgets(line.data(), static_cast<int>(line.size()), pipe.Get());
+    [[maybe_unused]] const char* const read =
+        std::fgets(line.data(), static_cast<int>(line.size()), pipe.Get());
     const int status = pipe.Close();
     if (status != 0) {
         OVS_ERR("Execute cmd /usr/bin/ovs-vsctlget port %s tag failed, err=%d", port.c_str(),

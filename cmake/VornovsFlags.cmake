@@ -14,8 +14,6 @@ add_library(vornovs_warnings INTERFACE)
 target_compile_options(vornovs_warnings INTERFACE
     -Wall -Wextra -Wpedantic -Wshadow -Wconversion -Wsign-conversion -Wold-style-cast
     -Wnon-virtual-dtor -Woverloaded-virtual -Wcast-qual -Wformat=2 -Wundef
-    # GCC's -Wnull-dereference follows inlined code into other libraries' headers.
-    $<$<CXX_COMPILER_ID:Clang>:-Wnull-dereference>
     $<$<CXX_COMPILER_ID:GNU>:-Wduplicated-cond -Wlogical-op -Wuseless-cast>
     $<$<BOOL:${VORNOVS_WERROR}>:-Werror>)
 

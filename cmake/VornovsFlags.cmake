@@ -13,7 +13,7 @@ check_pie_supported(LANGUAGES CXX)
 add_library(vornovs_warnings INTERFACE)
 target_compile_options(vornovs_warnings INTERFACE
     -Wall -Wextra -Wpedantic -Wshadow -Wconversion -Wsign-conversion -Wold-style-cast
-    -Wnon-virtual-dtor -Woverloaded-virtual -Wcast-qual -Wformat=2 -Wundef -Wnull-dereference
+    -Wnon-virtual-dtor -Woverloaded-virtual -Wcast-qual -Wformat=2 -Wundef
     $<$<CXX_COMPILER_ID:GNU>:-Wduplicated-cond -Wlogical-op -Wuseless-cast>
     $<$<BOOL:${VORNOVS_WERROR}>:-Werror>)
 

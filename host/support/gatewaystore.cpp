@@ -16,6 +16,7 @@
 #include <sys/file.h>
 #include <sys/stat.h>
 #include <unistd.h>
+#include <utility>
 
 namespace vornhost {
 
@@ -261,17 +262,9 @@ GatewayStoreLock::GatewayStoreLock(const std::string& path)
     if (!MakeRuntimeFolder(std::filesystem::path(path).parent_path())) {
         return;
     }
-    m_file = open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0600);
-    if (m_file >= 0 && !LockFile(m_file)) {
-        (void)close(m_file);
-        m_file = -1;
-    }
-}
-
-GatewayStoreLock::~GatewayStoreLock()
-{
-    if (m_file >= 0) {
-        (void)close(m_file);
+    Descriptor file(open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0600));
+    if (file && LockFile(file.Get())) {
+        m_file = std::move(file);
     }
 }
 

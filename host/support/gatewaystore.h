@@ -9,6 +9,8 @@
 #ifndef VORNHOST_SUPPORT_GATEWAYSTORE_H
 #define VORNHOST_SUPPORT_GATEWAYSTORE_H
 
+#include "descriptor.h"
+
 #include <optional>
 #include <string>
 #include <string_view>
@@ -105,15 +107,12 @@ class GatewayStoreLock {
 public:
     /** Waits until the lock is free. */
     explicit GatewayStoreLock(const std::string& path = "/run/vornovs/gateways.lock");
-    ~GatewayStoreLock();
-    GatewayStoreLock(const GatewayStoreLock&) = delete;
-    GatewayStoreLock& operator=(const GatewayStoreLock&) = delete;
 
     /** @return  whether the lock was taken (errno says why not). */
-    bool Held() const { return m_file >= 0; }
+    bool Held() const { return static_cast<bool>(m_file); }
 
 private:
-    int m_file = -1;
+    Descriptor m_file;
 };
 
 } // namespace vornhost

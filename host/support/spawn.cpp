@@ -1,13 +1,11 @@
 #include "spawn.h"
 
-#include "descriptor.h"
-
 #include <algorithm>
 #include <cerrno>
 #include <climits>
 
 #include <poll.h>
-#include <sys/pidfd.h>
+#include <sys/syscall.h>
 #include <sys/wait.h>
 
 namespace vornhost {
@@ -59,6 +57,11 @@ void SpawnActions::Duplicate(int source, int target)
     m_complete = ::posix_spawn_file_actions_adddup2(&m_actions, source, target) == 0 && m_complete;
 }
 
+void SpawnActions::Close(int target)
+{
+    m_complete = ::posix_spawn_file_actions_addclose(&m_actions, target) == 0 && m_complete;
+}
+
 void SpawnActions::CloseFrom(int first)
 {
     m_complete = ::posix_spawn_file_actions_addclosefrom_np(&m_actions, first) == 0 && m_complete;
@@ -104,10 +107,16 @@ std::vector<char*> Pointers(const std::vector<std::string>& strings)
     return pointers;
 }
 
+Descriptor OpenProcess(pid_t process)
+{
+    // The C library's own declaration cannot be used from C++ before its version 2.37.
+    return Descriptor(static_cast<int>(::syscall(SYS_pidfd_open, process, 0)));
+}
+
 ProgramEnd WaitForGroup(pid_t leader, std::chrono::milliseconds deadline)
 {
     ProgramEnd end;
-    const Descriptor process(::pidfd_open(leader, 0));
+    const Descriptor process = OpenProcess(leader);
     if (process && deadline.count() > 0 && !WaitUntil(process.Get(), Clock::now() + deadline)) {
         end.timedOut = true;
         (void)::kill(-leader, SIGTERM);

@@ -4,6 +4,8 @@
 #ifndef VORNHOST_SUPPORT_SPAWN_H
 #define VORNHOST_SUPPORT_SPAWN_H
 
+#include "descriptor.h"
+
 #include <chrono>
 #include <string>
 #include <vector>
@@ -26,6 +28,8 @@ public:
     void Open(int target, const char* path, int flags);
     /** Makes a descriptor another one too; they must differ. */
     void Duplicate(int source, int target);
+    /** Closes a descriptor, which need not be open. */
+    void Close(int target);
     /** Closes every descriptor from that one on. */
     void CloseFrom(int first);
     void ChangeFolder(const char* path);
@@ -59,6 +63,9 @@ sigset_t FullSignalSet();
 
 /** The pointers to strings, ended with a null one, as programs receive them. */
 std::vector<char*> Pointers(const std::vector<std::string>& strings);
+
+/** A descriptor that can be read once the process has ended; none when there is no such process. */
+Descriptor OpenProcess(pid_t process);
 
 /** How a program ended. */
 struct ProgramEnd {

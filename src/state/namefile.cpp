@@ -102,6 +102,12 @@ void SyncFolderOf(const std::string& path)
     }
 }
 
+bool KeepOwnerAndMode(int descriptor, const struct stat& old)
+{
+    return ::fchown(descriptor, old.st_uid, old.st_gid) == 0 &&
+           ::fchmod(descriptor, old.st_mode & 07777U) == 0;
+}
+
 /** @param old  the target's status, or null when there is no target yet. */
 bool ReplaceByRename(const std::string& path, std::string_view text, const struct stat* old)
 {
@@ -110,9 +116,8 @@ bool ReplaceByRename(const std::string& path, std::string_view text, const struc
         // An existing target opened for writing: this is a write error, which leaves it whole.
         return old != nullptr;
     }
-    if (old != nullptr) {
-        (void)::fchown(replacement.Get(), old->st_uid, old->st_gid);
-        (void)::fchmod(replacement.Get(), old->st_mode & 07777U);
+    if (old != nullptr && !KeepOwnerAndMode(replacement.Get(), *old)) {
+        return WriteInPlace(path, text);
     }
     if (!WriteAll(replacement.Get(), text) || ::fsync(replacement.Get()) != 0) {
         return true;

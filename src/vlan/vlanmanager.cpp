@@ -68,7 +68,9 @@ try {
         return -1;
     }
     std::array<char, kNameBuffer> line{};
-    (void)std::fgets(line.data(), static_cast<int>(line.size()), pipe.Get());
+    if (std::fgets(line.data(), static_cast<int>(line.size()), pipe.Get()) == nullptr) {
+        line.front() = '\0'; // no answer reads as tag 0 unless the tool says that it failed
+    }
     const int status = pipe.Close();
     if (status != 0) {
         OVS_ERR("Execute cmd /usr/bin/ovs-vsctlget port %s tag failed, err=%d", port.c_str(),

@@ -1,4 +1,4 @@
-# shellcheck shell=dash
+# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
 # What a case says: steps, figures, and failures with their reason.
 
 lab_out=/run/lab
@@ -40,6 +40,14 @@ fail()
     printf 'FAILED: %s\n' "$*"
     printf '%s\n' "$*" >>"$lab_out/failure"
     exit 1
+}
+
+# Tells which command ended the case's script: status, file, line, command.
+report_ended_at()
+{
+    if [ ! -e "$lab_out/failure" ]; then
+        echo "${2##*/} line $3: '$4' ended with $1" >>"$lab_out/failure"
+    fi
 }
 
 # The case's last line, which the host reads.

@@ -1,1 +1,113 @@
-# shellcheck shell=dash
+# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
+# The state of the host's network as text, and the difference of two states.
+
+# snapshot NAME: writes the present state to $lab_out/snapshots/NAME, a file a subject.
+snapshot()
+{
+    local folder="$lab_out/snapshots/$1"
+    rm -rf "$folder"
+    mkdir -p "$folder"
+    snapshot_links >"$folder/links"
+    snapshot_addresses >"$folder/addresses"
+    snapshot_routes >"$folder/routes"
+    snapshot_groups >"$folder/groups"
+    snapshot_sysctls >"$folder/sysctls"
+    snapshot_switch >"$folder/switch"
+    snapshot_files "$folder"
+}
+
+# Interface numbers change when a device is made anew and say nothing; the switch's own device is
+# part of the switch.
+snapshot_links()
+{
+    ip -details -oneline link show |
+        sed -E -e 's/^[0-9]+: //' -e 's/@(if)?[0-9]+:/:/' -e 's/ link-netns(id)? [^ ]+//' \
+            -e 's/\\//g' -e 's/  +/ /g' |
+        sed '/^ovs-system:/d' | sort
+}
+
+snapshot_addresses()
+{
+    ip -oneline address show | sed -E -e 's/^[0-9]+: //' -e 's/\\//g' -e 's/  +/ /g' | sort
+}
+
+snapshot_routes()
+{
+    ip -4 -details route show table all | sed -e 's/^/4 /' -e 's/ *$//' | sort
+    ip -6 -details route show table all | sed -E -e 's/^/6 /' -e 's/ expires [0-9]+sec//' \
+        -e 's/ *$//' | sort
+    ip -4 rule show | sed 's/^/rule 4 /'
+    ip -6 rule show | sed 's/^/rule 6 /'
+}
+
+# Multicast groups that each interface listens to.
+snapshot_groups()
+{
+    ip maddress show |
+        awk '/^[0-9]+:/ { name = $2; next } { $1 = $1; print name, $0 }' |
+        sed '/^ovs-system /d' | sort
+}
+
+snapshot_sysctls()
+{
+    # Some of them cannot be read, which is no difference.
+    { grep -rs . /proc/sys/net/ipv4/conf /proc/sys/net/ipv6/conf /proc/sys/net/ipv4/neigh \
+        /proc/sys/net/ipv6/neigh || true; } |
+        sed -e '/\/ovs-system\//d' -e 's|^/proc/sys/||' | sort
+}
+
+snapshot_switch()
+{
+    local bridge
+    if ! process_named ovsdb-server; then
+        return
+    fi
+    for bridge in $(ovs-vsctl --timeout=10 list-br); do
+        echo "bridge $bridge"
+        ovs-vsctl --timeout=10 list-ports "$bridge" | sed "s/^/port $bridge /"
+    done
+}
+
+# Files are kept whole, with their mode and owner in a list beside them. State that comes and goes
+# with the switch's use is not configuration, and neither is an empty folder for it.
+snapshot_files()
+{
+    local file
+    mkdir -p "$1/files"
+    { find /etc/sysconfig /usr/vorn/etc /etc/vornovs-host.conf /etc/vorninfo.conf -type f \
+        2>/dev/null || true; } | sort >"$1/file-list"
+    while read -r file; do
+        stat -c '%A %U:%G %n' "$file"
+        mkdir -p "$1/files${file%/*}"
+        cp -p "$file" "$1/files$file"
+    done <"$1/file-list" >"$1/file-modes"
+    rm "$1/file-list"
+}
+
+# snapshot_difference ONE OTHER: prints what differs; empty when nothing does.
+snapshot_difference()
+{
+    (
+        cd "$lab_out/snapshots" || exit 1
+        diff -r -U 0 "$1" "$2" | sed -e '/^@@/d' -e '/^diff /d' || true
+    )
+}
+
+# expect_unchanged ONE OTHER
+expect_unchanged()
+{
+    snapshot_difference "$1" "$2" >"$lab_out/difference"
+    if [ -s "$lab_out/difference" ]; then
+        printf 'Between "%s" and "%s":\n' "$1" "$2"
+        show <"$lab_out/difference"
+        fail "the host at '$2' is not what it was at '$1'"
+    fi
+}
+
+# expect_changed ONE OTHER PATTERN: the difference has a line that matches.
+expect_changed()
+{
+    snapshot_difference "$1" "$2" >"$lab_out/difference"
+    grep -Eq -- "$3" "$lab_out/difference" ||
+        fail "the difference of '$1' and '$2' has no '$3': $(cat "$lab_out/difference")"
+}

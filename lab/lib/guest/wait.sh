@@ -1,5 +1,14 @@
-# shellcheck shell=dash
+# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
 # Waiting for conditions. Deadlines are of the guest's clock; an idle guest costs no real time.
+
+# A descriptor on which nothing ever comes.
+exec {lab_silence}<> <(:)
+
+# pause SECONDS: sleeps without starting a process.
+pause()
+{
+    read -r -t "$1" -u "$lab_silence" || true
+}
 
 # Sets $ticks to the hundredths of a second since boot. Starts no process: it is called in loops.
 guest_ticks()
@@ -22,7 +31,7 @@ wait_until()
         if [ "$ticks" -ge "$deadline" ]; then
             fail "after $seconds s still not so: $*"
         fi
-        usleep 20000
+        pause 0.02
     done
 }
 

@@ -1,0 +1,89 @@
+# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
+
+fails_with()
+{
+    if ( "$@" ) >/dev/null 2>&1; then fail "'$*' did not fail"; fi
+    rm -f "$lab_out/failure"
+}
+
+step "Bring the port up by hand"
+ip link set eth0 up
+ip address add 10.10.0.2/24 dev eth0
+ip address add fd10:0:0:a0::2/64 dev eth0 nodad
+ip route add default via 10.10.0.1 dev eth0
+ip route add default via fd10:0:0:a0::1 dev eth0
+topology_ready
+
+step "Probe a host to which nothing happens"
+probes_start
+lab_probe_after=2 probes_finish quiet 1
+
+step "Take the outside's end down for 60 ms"
+probes_start
+in_outside ip link set out-eth0 down
+usleep 60000
+in_outside ip link set out-eth0 up
+sleep 1
+probes_stop
+for probe in in-4 in-6 out-4 out-6; do
+    outage="$(probes_outage "$probe")"
+    figure "60 ms down $probe" "$outage" ms
+    expect_at_most "60 ms, seen by $probe" 60 "$outage"
+done
+expect_at_most "60 ms, seen from inside" "$(probes_outage out-4)" 100
+
+step "Take it down for good"
+probes_start
+in_outside ip link set out-eth0 down
+sleep 2
+probes_stop
+expect_at_most "2 s, seen to the end" 1900 "$(probes_outage in-4)"
+in_outside ip link set out-eth0 up
+in_outside ip address replace fd10:0:0:a0::1/64 dev out-eth0
+topology_ready
+
+step "Compare"
+snapshot before
+snapshot same
+expect_unchanged before same
+ip link set eth0 mtu 1400
+ip address add 10.10.0.77/24 dev eth0
+ip route add 10.77.0.0/16 via 10.10.0.1 metric 7
+sysctl -q -w net.ipv4.conf.eth0.forwarding=1
+chmod 600 /etc/sysconfig/network-scripts/ifcfg-eth0
+sed -i 's/upper shelf/Upper shelf/' /etc/sysconfig/network-scripts/ifcfg-eth0
+snapshot changed
+expect_changed before changed '^\+eth0: .* mtu 1400'
+expect_changed before changed '^\+eth0 inet 10.10.0.77/24 .* secondary'
+expect_changed before changed '^\+4 .*10.77.0.0/16 via 10.10.0.1 .*metric 7'
+expect_changed before changed '^\+net/ipv4/conf/eth0/forwarding:1'
+expect_changed before changed '^\+-rw------- root:root /etc/sysconfig/network-scripts/ifcfg-eth0'
+expect_changed before changed '^\+SITE_LABEL="Rack 7, Upper shelf"'
+fails_with expect_unchanged before changed
+
+step "Start the switch by hand"
+ip link set eth0 mtu 1500
+mkdir -p /run/openvswitch
+ovsdb-tool create /etc/openvswitch/conf.db /usr/share/openvswitch/vswitch.ovsschema
+ovsdb-server --remote=punix:/run/openvswitch/db.sock --pidfile --detach --log-file \
+    /etc/openvswitch/conf.db
+ovs-vsctl --no-wait init
+wait_until 15 uptime_reached 10
+ovs-vswitchd --pidfile --detach --log-file
+
+step "Move the port on to a bridge by hand"
+probes_start
+ovs-vsctl add-br ovs_eth0 -- set bridge ovs_eth0 other-config:hwaddr=02:00:0a:0a:00:02
+ip link set ovs_eth0 up
+ovs-vsctl add-port ovs_eth0 eth0
+ip -batch - <<END
+address del 10.10.0.2/24 dev eth0
+address del fd10:0:0:a0::2/64 dev eth0
+route del default via fd10:0:0:a0::1 dev eth0
+address add 10.10.0.2/24 dev ovs_eth0
+address add fd10:0:0:a0::2/64 dev ovs_eth0 nodad
+route add default via 10.10.0.1 dev ovs_eth0
+route add default via fd10:0:0:a0::1 dev ovs_eth0
+END
+ovs-vsctl show | show
+lab_probe_after=3 probes_finish by-hand 100

@@ -152,18 +152,17 @@ void Decider::CheckPort()
     if (m_pair.target == Target::kLeaveAlone) {
         return;
     }
-    const bool asked = m_inputs.request.verb == Verb::kStart &&
-                       (!m_inputs.request.names.empty() ||
-                        (m_pair.file != nullptr && m_pair.file->onBoot));
+    const bool asked =
+        m_inputs.request.verb == Verb::kStart &&
+        (!m_inputs.request.names.empty() || (m_pair.file != nullptr && m_pair.file->onBoot));
     if (m_pair.port == nullptr) {
-        Say(asked ? Severity::kError : Severity::kWarning,
-            "there is no interface " + m_pair.name);
+        Say(asked ? Severity::kError : Severity::kWarning, "there is no interface " + m_pair.name);
         m_pair.target = Target::kLeaveAlone;
     } else if (m_pair.file != nullptr && !m_pair.file->requiredMac.empty() &&
                m_pair.file->requiredMac != m_pair.port->mac) {
-        Say(Severity::kError, "ifcfg-" + m_pair.file->name + ": HWADDR=" +
-                                  m_pair.file->requiredMac + ", but " + m_pair.name + " has " +
-                                  m_pair.port->mac + "; it is left as it is");
+        Say(Severity::kError, "ifcfg-" + m_pair.file->name +
+                                  ": HWADDR=" + m_pair.file->requiredMac + ", but " + m_pair.name +
+                                  " has " + m_pair.port->mac + "; it is left as it is");
         m_pair.target = Target::kLeaveAlone;
     } else {
         CheckMaster();
@@ -250,9 +249,9 @@ std::vector<std::string> Pair::ForeignPorts() const
 {
     std::vector<std::string> ports;
     if (switchBridge != nullptr) {
-        for (const SwitchPort& port : switchBridge->ports) {
-            if (port.name != name && port.name != bridge) {
-                ports.push_back(port.name);
+        for (const SwitchPort& each : switchBridge->ports) {
+            if (each.name != name && each.name != bridge) {
+                ports.push_back(each.name);
             }
         }
     }

@@ -39,10 +39,10 @@ std::string CommentValue(const std::string& script, const std::string& key)
 bool ServiceRuns(const std::string& script)
 {
     const std::string process = FirstLine(CommentValue(script, "pidfile"));
-    const bool isNumber = !process.empty() &&
-                          process.find_first_not_of("0123456789") == std::string::npos;
-    return isNumber && FirstLine("/proc/" + process + "/comm") ==
-                           CommentValue(script, "processname");
+    const bool isNumber =
+        !process.empty() && process.find_first_not_of("0123456789") == std::string::npos;
+    return isNumber &&
+           FirstLine("/proc/" + process + "/comm") == CommentValue(script, "processname");
 }
 
 ParsedFile ReadInterfaceFile(const std::string& name, const std::filesystem::path& path)
@@ -110,8 +110,8 @@ void ReadSwitch(Inputs& inputs, std::vector<Remark>& remarks)
     if (state) {
         inputs.switchState = *state;
     } else {
-        remarks.push_back({Severity::kError,
-                           "the switch's database does not answer: " + result.errors});
+        remarks.push_back(
+            {Severity::kError, "the switch's database does not answer: " + result.errors});
     }
 }
 

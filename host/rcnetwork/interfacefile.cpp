@@ -20,9 +20,8 @@ constexpr unsigned kMostNumberedAddresses = 256;
 
 std::string Lower(std::string text)
 {
-    std::transform(text.begin(), text.end(), text.begin(), [](unsigned char letter) {
-        return static_cast<char>(std::tolower(letter));
-    });
+    std::transform(text.begin(), text.end(), text.begin(),
+                   [](unsigned char letter) { return static_cast<char>(std::tolower(letter)); });
     return text;
 }
 
@@ -74,8 +73,7 @@ std::optional<unsigned> MaskLength(const std::string& mask)
 /** Reads the keys of one file and keeps what there is to say about them. */
 class Parser {
 public:
-    Parser(const std::string& name, const std::string& text)
-        : m_values(KeyValueFile::Parse(text))
+    Parser(const std::string& name, const std::string& text) : m_values(KeyValueFile::Parse(text))
     {
         m_parsed.file.name = name;
     }
@@ -304,9 +302,9 @@ ParsedFile Parser::Parse()
 
 std::string InterfaceOfFileName(const std::string& fileName)
 {
-    constexpr std::array kForeignEndings{"~",        ".bak",    ".orig", ".old", ".rpmsave",
-                                         ".rpmnew",  ".rpmorig", ".swp",  ".tmp", ".dpkg-old",
-                                         ".dpkg-new", ".dpkg-dist"};
+    constexpr std::array kForeignEndings{"~",        ".bak",      ".orig",     ".old",
+                                         ".rpmsave", ".rpmnew",   ".rpmorig",  ".swp",
+                                         ".tmp",     ".dpkg-old", ".dpkg-new", ".dpkg-dist"};
     if (fileName.rfind(kFilePrefix, 0) != 0) {
         return {};
     }

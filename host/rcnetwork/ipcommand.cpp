@@ -14,11 +14,10 @@ struct FlagName {
     const char* name;
 };
 
-constexpr std::array kAddressFlags{FlagName{IFA_F_NODAD, "nodad"},
-                                   FlagName{IFA_F_HOMEADDRESS, "home"},
-                                   FlagName{IFA_F_MANAGETEMPADDR, "mngtmpaddr"},
-                                   FlagName{IFA_F_NOPREFIXROUTE, "noprefixroute"},
-                                   FlagName{IFA_F_MCAUTOJOIN, "autojoin"}};
+constexpr std::array kAddressFlags{
+    FlagName{IFA_F_NODAD, "nodad"}, FlagName{IFA_F_HOMEADDRESS, "home"},
+    FlagName{IFA_F_MANAGETEMPADDR, "mngtmpaddr"}, FlagName{IFA_F_NOPREFIXROUTE, "noprefixroute"},
+    FlagName{IFA_F_MCAUTOJOIN, "autojoin"}};
 
 struct MetricName {
     unsigned kind;
@@ -26,16 +25,11 @@ struct MetricName {
 };
 
 constexpr std::array kMetricNames{
-    MetricName{RTAX_MTU, "mtu"},
-    MetricName{RTAX_WINDOW, "window"},
-    MetricName{RTAX_SSTHRESH, "ssthresh"},
-    MetricName{RTAX_CWND, "cwnd"},
-    MetricName{RTAX_ADVMSS, "advmss"},
-    MetricName{RTAX_REORDERING, "reordering"},
-    MetricName{RTAX_HOPLIMIT, "hoplimit"},
-    MetricName{RTAX_INITCWND, "initcwnd"},
-    MetricName{RTAX_INITRWND, "initrwnd"},
-    MetricName{RTAX_QUICKACK, "quickack"},
+    MetricName{RTAX_MTU, "mtu"},           MetricName{RTAX_WINDOW, "window"},
+    MetricName{RTAX_SSTHRESH, "ssthresh"}, MetricName{RTAX_CWND, "cwnd"},
+    MetricName{RTAX_ADVMSS, "advmss"},     MetricName{RTAX_REORDERING, "reordering"},
+    MetricName{RTAX_HOPLIMIT, "hoplimit"}, MetricName{RTAX_INITCWND, "initcwnd"},
+    MetricName{RTAX_INITRWND, "initrwnd"}, MetricName{RTAX_QUICKACK, "quickack"},
 };
 
 /** Preferences of a router as the kernel codes them; 0, medium, is the default. */
@@ -127,10 +121,9 @@ std::string AddressText(const Address& address)
 std::string AddressArguments(const Address& address, const std::string& interface,
                              const std::string& formerInterface, bool settled)
 {
-    std::string text = address.peer.empty()
-                           ? AddressText(address)
-                           : address.local + " peer " + address.peer + "/" +
-                                 std::to_string(address.prefixLength);
+    std::string text = address.peer.empty() ? AddressText(address)
+                                            : address.local + " peer " + address.peer + "/" +
+                                                  std::to_string(address.prefixLength);
     if (!address.broadcast.empty()) {
         text += " brd " + address.broadcast;
     }

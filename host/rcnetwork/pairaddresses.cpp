@@ -75,10 +75,10 @@ bool PairPlanner::IsCarried(const Address& address) const
     }
     const auto& all = m_inputs.live.addresses;
     const Link* target = m_pair.TargetLink();
-    return m_moves && (target == nullptr ||
-                       std::none_of(all.begin(), all.end(), [&](const Address& each) {
-                           return each.index == target->index && IsLinkLocal(each);
-                       }));
+    return m_moves &&
+           (target == nullptr || std::none_of(all.begin(), all.end(), [&](const Address& each) {
+                return each.index == target->index && IsLinkLocal(each);
+            }));
 }
 
 void PairPlanner::CarryAddress(const Address& address)
@@ -96,10 +96,9 @@ void PairPlanner::CarryAddress(const Address& address)
 
 void PairPlanner::RemoveAddress(const Address& address, const std::string& interface)
 {
-    const std::string peer = address.peer.empty()
-                                 ? AddressText(address)
-                                 : address.local + " peer " + address.peer + "/" +
-                                       std::to_string(address.prefixLength);
+    const std::string peer = address.peer.empty() ? AddressText(address)
+                                                  : address.local + " peer " + address.peer + "/" +
+                                                        std::to_string(address.prefixLength);
     m_steps.move.removedAddresses.push_back("addr del " + peer + " dev " + interface);
 }
 
@@ -200,8 +199,8 @@ void PairPlanner::CarryNeighbours()
             continue;
         }
         m_steps.beside.neighbours.push_back(
-            "neigh replace " + neighbour.address + " lladdr " + neighbour.mac + " dev " +
-            Target() + (neighbour.permanent ? " nud permanent" : " nud stale") +
+            "neigh replace " + neighbour.address + " lladdr " + neighbour.mac + " dev " + Target() +
+            (neighbour.permanent ? " nud permanent" : " nud stale") +
             (neighbour.router ? " router" : ""));
         if (neighbour.permanent && m_pair.SourceStays()) {
             m_steps.move.removedNeighbours.push_back("neigh del " + neighbour.address + " dev " +

@@ -14,9 +14,12 @@ constexpr char kAddressMode[] = "ipv6.conf.addr_gen_mode";
 constexpr char kAddressModeNone[] = "1";
 
 // Moved with the IPv6 stack, following the MTU, or not for writing.
-constexpr std::array<std::string_view, 6> kSettingsOfTheirOwn{
-    kDisableIpv6,         kAddressMode,          "ipv6.conf.mtu", "ipv6.conf.stable_secret",
-    "ipv4.conf.mc_forwarding", "ipv6.conf.mc_forwarding"};
+constexpr std::array<std::string_view, 6> kSettingsOfTheirOwn{kDisableIpv6,
+                                                              kAddressMode,
+                                                              "ipv6.conf.mtu",
+                                                              "ipv6.conf.stable_secret",
+                                                              "ipv4.conf.mc_forwarding",
+                                                              "ipv6.conf.mc_forwarding"};
 
 bool HasOwnWay(const std::string& setting)
 {

@@ -42,8 +42,7 @@ void PairPlanner::PlanBridge()
         m_steps.waitFor.push_back(m_pair.bridge + " " + m_pair.port->mac);
     }
     if (!m_pair.joined) {
-        m_steps.joinAndLeave.push_back("--may-exist add-port " + m_pair.bridge + " " +
-                                       m_pair.name);
+        m_steps.joinAndLeave.push_back("--may-exist add-port " + m_pair.bridge + " " + m_pair.name);
         m_steps.joinAndLeave.push_back("set Port " + m_pair.name + " " + MarkText());
     }
 }
@@ -95,8 +94,8 @@ void PairPlanner::LeaveBridge()
     const SwitchBridge* bridge = m_pair.switchBridge;
     if (bridge == nullptr) {
         // A bridge without a switch that answers: only the switch can take the port off it.
-        m_steps.needsSwitch = m_steps.needsSwitch ||
-                              (m_pair.bridgeLink != nullptr && !m_inputs.switchState.running);
+        m_steps.needsSwitch =
+            m_steps.needsSwitch || (m_pair.bridgeLink != nullptr && !m_inputs.switchState.running);
         return;
     }
     const bool carriesPort = bridge->FindPort(m_pair.name) != nullptr;
@@ -112,8 +111,7 @@ void PairPlanner::LeaveBridge()
         m_steps.joinAndLeave.push_back("--if-exists del-br " + bridge->name);
         m_moves = true;
     } else if (carriesPort) {
-        m_steps.joinAndLeave.push_back("--if-exists del-port " + bridge->name + " " +
-                                       m_pair.name);
+        m_steps.joinAndLeave.push_back("--if-exists del-port " + bridge->name + " " + m_pair.name);
         m_remarks.push_back({Severity::kWarning, bridge->name +
                                                      " stays without uplink and addresses, because "
                                                      "other programs have ports on it"});

@@ -10,9 +10,7 @@
 namespace vornhost {
 namespace {
 
-
-void AddStage(Plan& plan, StageKind kind, const std::string& title,
-              std::vector<std::string> lines)
+void AddStage(Plan& plan, StageKind kind, const std::string& title, std::vector<std::string> lines)
 {
     if (!lines.empty()) {
         plan.stages.push_back({kind, title, std::move(lines)});
@@ -49,9 +47,9 @@ void AddRecords(const Inputs& inputs, const Steps& steps, Plan& plan)
 void AddStages(const Inputs& inputs, const Steps& steps, Plan& plan)
 {
     if (steps.needsSwitch && !inputs.switchState.running) {
-        AddStage(plan, StageKind::kServices, "start the switch",
-                 {std::string(kDatabaseService) + " start",
-                  std::string(kSwitchService) + " start"});
+        AddStage(
+            plan, StageKind::kServices, "start the switch",
+            {std::string(kDatabaseService) + " start", std::string(kSwitchService) + " start"});
     }
     AddStage(plan, StageKind::kSwitch, "make bridges", steps.makeBridges);
     AddStage(plan, StageKind::kWait, "wait for bridges", steps.waitFor);

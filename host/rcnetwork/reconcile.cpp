@@ -29,7 +29,7 @@ private:
     bool Attempt();
     void Save(const RunState& former, const RunState& state);
     void StayWithoutSwitch();
-    void ReportRest();
+    bool ReportRest();
 
     Request m_request;
     std::vector<Remark> m_said;
@@ -61,8 +61,8 @@ std::optional<Inputs> Reconciler::Read()
 void Reconciler::Save(const RunState& former, const RunState& state)
 {
     if (state != former && !ReplaceFile(kRunStatePath, RunStateText(state), kPrivate)) {
-        SayOnce({{Severity::kError, std::string("cannot write ") + kRunStatePath + ": " +
-                                        std::strerror(errno)}});
+        SayOnce({{Severity::kError,
+                  std::string("cannot write ") + kRunStatePath + ": " + std::strerror(errno)}});
     }
 }
 
@@ -121,22 +121,24 @@ void Reconciler::StayWithoutSwitch()
     }
 }
 
-void Reconciler::ReportRest()
+/** @return  whether nothing is left to do. */
+bool Reconciler::ReportRest()
 {
     const auto inputs = Read();
     if (!inputs) {
-        return;
+        return false;
     }
     const Plan plan = MakePlan(*inputs);
     if (plan.Empty()) {
         Save(inputs->runState, plan.recordAfter);
-        return;
+        return true;
     }
     for (const Stage& stage : plan.stages) {
         for (const std::string& line : stage.lines) {
             SayOnce({{Severity::kError, "could not be done: " + line}});
         }
     }
+    return false;
 }
 
 bool Reconciler::Run()
@@ -147,17 +149,11 @@ bool Reconciler::Run()
                 return !m_failed;
             }
         }
-        if (m_canGoOn && Attempt()) {
-            return !m_failed;
-        }
     }
     if (m_canGoOn) {
         StayWithoutSwitch();
     }
-    if (m_canGoOn) {
-        ReportRest();
-    }
-    return false;
+    return m_canGoOn && ReportRest() && !m_failed;
 }
 
 } // namespace

@@ -59,12 +59,12 @@ bool RoutePlanner::IsOnLink(const Pair& pair, int family, const std::string& gat
             return true;
         }
     }
-    return std::any_of(
-        m_inputs.live.addresses.begin(), m_inputs.live.addresses.end(), [&](const Address& live) {
-            return PairOf(live.index) == &pair && live.family == family &&
-                   SamePrefix(family, live.peer.empty() ? live.local : live.peer, gateway,
-                              live.prefixLength);
-        });
+    return std::any_of(m_inputs.live.addresses.begin(), m_inputs.live.addresses.end(),
+                       [&](const Address& live) {
+                           return PairOf(live.index) == &pair && live.family == family &&
+                                  SamePrefix(family, live.peer.empty() ? live.local : live.peer,
+                                             gateway, live.prefixLength);
+                       });
 }
 
 void RoutePlanner::AddWantedDefault(const Pair& pair, int family, std::vector<Route>& routes) const
@@ -244,9 +244,8 @@ void RoutePlanner::Run()
         if (pair.removeUnwanted) {
             std::erase_if(m_steps.records[pair.name].routes, [&](const std::string& key) {
                 const auto& wanted = m_wanted.at(pair.name);
-                return std::none_of(wanted.begin(), wanted.end(), [&](const Route& each) {
-                    return RouteKeyText(each) == key;
-                });
+                return std::none_of(wanted.begin(), wanted.end(),
+                                    [&](const Route& each) { return RouteKeyText(each) == key; });
             });
         }
     }

@@ -77,8 +77,8 @@ SwitchPort ReadPort(const Json& row, const Rows& interfaces)
     port.tag = Number(row.at("tag"));
     for (const Json& reference : Elements(row.at("interfaces"))) {
         const Json& interface = interfaces.at(reference.at(1).get<std::string>());
-        port.working = Number(interface.at("ofport")).has_value() &&
-                       Text(interface.at("error")).empty();
+        port.working =
+            Number(interface.at("ofport")).has_value() && Text(interface.at("error")).empty();
         port.mtuRequest = Number(interface.at("mtu_request"));
     }
     return port;

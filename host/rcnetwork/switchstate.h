@@ -26,8 +26,8 @@ struct SwitchPort {
 struct SwitchBridge {
     std::string name;
     bool ours = false;
-    std::string hwaddr;       ///< other-config:hwaddr
-    std::string datapathType; ///< Empty or "system" for the kernel's.
+    std::string hwaddr;            ///< other-config:hwaddr
+    std::string datapathType;      ///< Empty or "system" for the kernel's.
     std::vector<SwitchPort> ports; ///< The bridge's own port among them.
 
     const SwitchPort* FindPort(const std::string& port) const;

@@ -16,7 +16,7 @@ pid_file=$run_folder/$daemon.pid
 
 # How long a daemon may take to start, and to leave once asked to, in seconds.
 start_limit=60
-stop_limit=10
+stop_limit=5
 
 report()
 {
@@ -70,9 +70,11 @@ is_running()
     process_is_daemon "$pid"
 }
 
+# A process that has ended but is not yet collected by its parent has no program any more.
 process_is_daemon()
 {
     comm=
+    [ -e "/proc/$1/exe" ] || return 1
     { read -r comm <"/proc/$1/comm"; } 2>/dev/null || return 1
     [ "$comm" = "$daemon" ]
 }
@@ -136,7 +138,7 @@ stop()
     fi
     stopping=$pid
 
-    ovs-appctl --timeout=5 -t "$run_folder/$daemon.$stopping.ctl" exit >/dev/null 2>&1 || :
+    ovs-appctl --timeout=2 -t "$run_folder/$daemon.$stopping.ctl" exit >/dev/null 2>&1 || :
     for signal in TERM KILL FAIL; do
         if wait_until "$stop_limit" has_stopped "$stopping"; then
             remove_leavings

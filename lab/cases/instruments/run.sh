@@ -1,4 +1,4 @@
-# shellcheck shell=bash
+# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
 
 fails_with()
 {

@@ -1,13 +1,21 @@
-# shellcheck shell=bash
+# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
 # The guest's helpers, and the way through a case. A case's script is read by this shell, so every
 # function of these files is its vocabulary.
 
+# shellcheck source=report.sh
 . /lab/report.sh
+# shellcheck source=wait.sh
 . /lab/wait.sh
+# shellcheck source=topology.sh
 . /lab/topology.sh
+# shellcheck source=snapshot.sh
 . /lab/snapshot.sh
+# shellcheck source=probes.sh
 . /lab/probes.sh
+# shellcheck source=host.sh
 . /lab/host.sh
+# shellcheck source=killed.sh
+. /lab/killed.sh
 
 lab_main()
 {

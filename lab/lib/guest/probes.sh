@@ -1,4 +1,4 @@
-# shellcheck shell=bash
+# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
 # Echo requests every 5 ms to and from the host, and how long they went unanswered.
 #
 # The probes run with a real-time priority: the other host is a machine of its own, so what the

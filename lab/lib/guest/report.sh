@@ -1,4 +1,4 @@
-# shellcheck shell=bash
+# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
 # What a case says: steps, figures, and failures with their reason.
 
 lab_out=/run/lab

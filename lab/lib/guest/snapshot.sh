@@ -1,4 +1,4 @@
-# shellcheck shell=bash
+# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
 # The state of the host's network as text, and the difference of two states.
 
 # snapshot NAME: writes the present state to $lab_out/snapshots/NAME, a file a subject.

@@ -1,4 +1,4 @@
-# shellcheck shell=bash
+# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
 # The appliance's ports in this namespace, and the outside world in another.
 #
 # Each port is on a network segment of its own, as if on a switch of its own: on a shared one Linux
@@ -63,7 +63,8 @@ topology_port()
 topology_rename()
 {
     local folder name
-    for folder in /sys/class/net/*; do
+    for folder in /sys/class/net/*/; do
+        folder="${folder%/}"
         name="${folder##*/}"
         if [ "$(cat "$folder/address")" = "$1" ]; then
             [ "$name" = "$2" ] && return
@@ -99,15 +100,19 @@ in_outside()
     ip netns exec outside "$@"
 }
 
-# The appliance's addresses as its files give them, one a line: FAMILY ADDRESS PORT.
+# The appliance's addresses as its files give them, one a line: FAMILY ADDRESS.
 topology_addresses()
 {
-    local file port
-    for file in /lab/topology/host/etc/sysconfig/network-scripts/ifcfg-*; do
-        port="${file##*/ifcfg-}"
-        sed -n -e "s|^IPADDR=\"\\{0,1\\}\\([0-9.]*\\).*|4 \\1 $port|p" \
-            -e "s|^IPV6ADDR=\"\\{0,1\\}\\([0-9a-f:]*\\).*|6 \\1 $port|p" "$file"
-    done
+    cat /lab/topology/host/etc/sysconfig/network-scripts/ifcfg-* | tr -d '"' |
+        awk -F = '
+            $1 ~ /^IPADDR[0-9]*$/ && $2 != "" { print 4, $2 }
+            $1 ~ /^IPV6ADDR(_SECONDARIES)?$/ {
+                count = split($2, words, " ")
+                for (i = 1; i <= count; i++) {
+                    sub("/.*", "", words[i])
+                    print 6, words[i]
+                }
+            }' | sort -u
 }
 
 # What the appliance can probe: the outside's address on every port, and the far host, which is
@@ -121,9 +126,9 @@ topology_outside_addresses()
 # Waits until every address of the appliance answers the outside.
 topology_ready()
 {
-    local family address port
+    local family address
     topology_addresses >"$lab_out/addresses"
-    while read -r family address port; do
+    while read -r family address; do
         wait_until 30 in_outside fping "-$family" -q -r 0 -t 200 "$address"
     done <"$lab_out/addresses"
 }

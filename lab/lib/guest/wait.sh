@@ -1,4 +1,4 @@
-# shellcheck shell=bash
+# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
 # Waiting for conditions. Deadlines are of the guest's clock; an idle guest costs no real time.
 
 # A descriptor on which nothing ever comes.

@@ -145,18 +145,23 @@ lab_make_product()
     done < <(find "$root" -type f \( -perm -u+x -o -name '*.so*' \))
 }
 
-# The lab's own client programs, one source file each, linked to the installed library.
+# The lab's own clients, one source file each: lib*.cpp are loaded into other programs, the others
+# are programs that are linked to the installed library.
 lab_build_clients()
 {
-    local root=$1 source folder
+    local root=$1 source name folder
     folder=$(dirname "$(find "$root/usr/lib" -name libvornovs.so -print -quit)")
     mkdir -p "$root/lab/clients"
     for source in "$lab_source"/clients/*.cpp; do
-        [[ -e $source ]] || continue
-        "${CXX:-c++}" -std=c++20 -O1 -Wall -Wextra -Werror -I "$lab_root/include" \
-            -I "$lab_root/src/platform" "$source" -o "$root/lab/clients/$(basename "$source" .cpp)" \
-            -L "$folder" -Wl,-rpath-link,"$folder" -lvornovs ||
-            die "the client $source does not build"
+        name=$(basename "$source" .cpp)
+        set -- -std=c++20 -O1 -fcf-protection=full -Wall -Wextra -Werror \
+            -I "$lab_root/include" -I "$lab_root/src/platform" "$source"
+        if [[ $name == lib* ]]; then
+            set -- "$@" -shared -fPIC -o "$root/lab/clients/$name.so" -ldl
+        else
+            set -- "$@" -o "$root/lab/clients/$name" -L "$folder" -Wl,-rpath-link,"$folder" -lvornovs
+        fi
+        "${CXX:-c++}" "$@" || die "the client $source does not build"
     done
 }
 

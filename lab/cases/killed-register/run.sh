@@ -1,0 +1,23 @@
+# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
+
+remember_plain
+
+step "Learn the steps"
+killed_at 0 vornovsctl register alpha
+last="$(steps_taken)"
+sed 's/^/step /' "$lab_steps" | show
+expect_success vornovsctl unregister alpha
+expect_plain learned
+
+step "Be killed before each of $last steps"
+probes_start
+for ((number = 1; number <= last; number++)); do
+    killed_at "$number" vornovsctl register alpha
+    step "Killed before step $number, $(step_name)"
+    expect_safe_after_kill
+    bring_home >"$lab_out/way-home" 2>&1
+    expect_registered
+    expect_plain "after-$number"
+done
+lab_probe_after=2 probes_finish "killed clients" 100
+figure "steps" "$last" "kills"

@@ -1,0 +1,19 @@
+# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
+
+remember_plain
+
+step "Register"
+probes_start
+timed Register vornovsctl register alpha
+expect_registered alpha
+expect_on_switch
+probes_finish Register 100
+expect_lock_free
+
+step "Unregister"
+probes_start
+timed UnRegister vornovsctl unregister alpha
+expect_registered
+probes_finish UnRegister 100
+expect_plain
+expect_lock_free

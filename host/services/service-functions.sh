@@ -94,7 +94,10 @@ take_turn()
 {
     make_folder 0700 /run/vornovs
     exec 9>"/run/vornovs/$service.lock"
-    flock -w "$start_limit" 9 2>/dev/null || flock 9
+    if ! wait_until "$start_limit" flock -n 9; then
+        report "another run of this script does not end"
+        return 1
+    fi
 }
 
 # A daemon that was killed leaves its pid file and its sockets.

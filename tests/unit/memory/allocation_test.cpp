@@ -402,7 +402,14 @@ std::vector<Entry> Managers()
          0,
          {0, -1}},
         {"CreateLinuxBond",
-         OnFilledManager([](OVSManager& m) { return m.CreateLinuxBond(); }),
+         [] {
+             OVSManager manager;
+             {
+                 const HarnessAllocations guard;
+                 (void)manager.InitBondOpt("full");
+             }
+             return manager.CreateLinuxBond();
+         },
          0,
          {-1}},
         {"RemoveLinuxBond",

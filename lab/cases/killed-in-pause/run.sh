@@ -1,4 +1,4 @@
-# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
+# shellcheck shell=bash disable=SC2154,SC2034 # variables of the guest's other files
 
 # The step number of the pause in the list of the last run.
 pause_step()

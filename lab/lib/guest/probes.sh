@@ -125,7 +125,7 @@ probes_finish()
         figure "$name $direction" "$worst" ms
     done
     rm -rf "$lab_out/probes-$name"
-    mv "$lab_out/probes" "$lab_out/probes-$name"
+    cp -r "$lab_out/probes" "$lab_out/probes-$name"
     for direction in in out; do
         worst="$(awk -F '\t' -v name="$name $direction" '$1 == name { print $2 }' \
             "$lab_out/figures" | tail -n 1)"

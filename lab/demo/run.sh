@@ -1,0 +1,214 @@
+# shellcheck shell=bash disable=SC2154,SC2034 # variables of the guest's other files
+# The demonstration: the main job, told as it goes. Runs in the guest.
+
+client=demo-service
+limit=100
+
+heading()
+{
+    printf '\n== %s\n' "$*"
+}
+
+# The host's network as somebody would look at it.
+tell_host()
+{
+    echo "interfaces and addresses:"
+    ip -brief address show | grep -v '^lo ' | sed 's/^/    /'
+    echo "routes:"
+    { ip -4 route show; ip -6 route show | grep -v '^fe80'; } | sed 's/^/    /'
+    echo "bridges:"
+    if process_named ovsdb-server && [ -n "$(ovs-vsctl --timeout=10 list-br)" ]; then
+        ovs-vsctl --timeout=10 list-br | sed 's/^/    /'
+    else
+        echo "    none"
+    fi
+    echo "configuration files:"
+    stat -c '    %A %U %s bytes  %n' /etc/sysconfig/network-scripts/*
+}
+
+since_begin()
+{
+    awk -v begin="$begin" -v now="$EPOCHREALTIME" 'BEGIN { printf "%7.3f s", now - begin }'
+}
+
+every_port()
+{
+    local port
+    for port in $(host_ports); do
+        "$@" "$port" || return 1
+    done
+}
+
+bridge_file_written() { [ -e "${lab_ifcfg}ovs_$1" ]; }
+bridge_file_gone() { [ ! -e "${lab_ifcfg}ovs_$1" ]; }
+bridge_made() { [ -e "/sys/class/net/ovs_$1" ]; }
+bridge_gone() { [ ! -e "/sys/class/net/ovs_$1" ]; }
+somebody_registered() { [ -s "$lab_state/ovs_reg.conf" ]; }
+nobody_registered() { [ ! -s "$lab_state/ovs_reg.conf" ]; }
+switch_runs() { [ -e /run/openvswitch/ovs-vswitchd.pid ]; }
+
+# tell_stage TEXT CONDITION...: prints the text once, when the condition first holds.
+tell_stage()
+{
+    local text="$1"
+    shift
+    if [[ $told != *"|$text|"* ]] && "$@"; then
+        told="$told|$text|"
+        printf '    %s  %s\n' "$(since_begin)" "$text"
+    fi
+}
+
+# run_and_tell COMMAND...: runs a client and prints the stages as they are reached.
+run_and_tell()
+{
+    local pid status=0 stages="$1"
+    shift
+    told='|'
+    echo "\$ $*"
+    begin="$EPOCHREALTIME"
+    "$@" >"$lab_out/client-output" 2>&1 &
+    pid=$!
+    while process_runs "$pid"; do
+        "$stages"
+        pause 0.01
+    done
+    wait "$pid" || status=$?
+    end="$EPOCHREALTIME"
+    "$stages"
+    printf '    %s  the client is done\n' "$(since_begin)"
+    sed 's/^/    /' "$lab_out/client-output"
+    [ "$status" -eq 0 ] || fail "'$*' ended with $status"
+}
+
+stages_of_registration()
+{
+    tell_stage "the client's name is recorded" somebody_registered
+    tell_stage "every bridge has its configuration file" every_port bridge_file_written
+    tell_stage "the switch's daemons run" switch_runs
+    tell_stage "every bridge is there" every_port bridge_made
+}
+
+stages_of_withdrawal()
+{
+    tell_stage "nobody is registered any more" nobody_registered
+    tell_stage "every bridge's configuration file is folded back into its port's" \
+        every_port bridge_file_gone
+    tell_stage "every bridge is gone" every_port bridge_gone
+}
+
+# What the probes saw before, during and after the client's run.
+tell_traffic()
+{
+    local direction family
+    printf '    %-27s %15s %15s %15s  %s\n' "echo every 5 ms" before during after \
+        "longest without an answer"
+    for direction in in out; do
+        for family in 4 6; do
+            tell_probe "$direction" "$direction-$family"
+        done
+    done
+}
+
+tell_probe()
+{
+    local arrow target gap before during after
+    if [ "$1" = in ]; then arrow='second host to'; else arrow='host to'; fi
+    while IFS=$'\t' read -r target before during after; do
+        gap="$(probes_table "$2" | awk -F '\t' -v target="$target" '$1 == target { print $2 }')"
+        printf '    %-14s %-18s %9s %15s %15s  %s ms\n' "$arrow" "$target" "$before" "$during" \
+            "$after" "$gap"
+    done < <(probes_phases "$2" "$begin" "$end")
+}
+
+# Probes answered and sent in each phase: a line a target.
+probes_phases()
+{
+    awk -v begin="$2" -v end="$3" '
+        /^\[[0-9.]+\]/ {
+            time = substr($1, 2) + 0
+            phase = time < begin ? 1 : (time < end ? 2 : 3)
+            sent[$2, phase]++
+            targets[$2] = 1
+            if ($0 ~ / bytes, /) {
+                answered[$2, phase]++
+            }
+        }
+        END {
+            for (target in targets) {
+                printf "%s", target
+                for (phase = 1; phase <= 3; phase++) {
+                    printf "\t%d of %d", answered[target, phase], sent[target, phase]
+                }
+                print ""
+            }
+        }' "$lab_out/probes/$1" | sort
+}
+
+# worst NAME: the longer of the outages of both directions.
+worst()
+{
+    awk -F '\t' -v name="$1" '$1 == name " in" || $1 == name " out" {
+        if ($2 > worst) worst = $2 } END { printf "%.1f", worst }' "$lab_out/figures"
+}
+
+# Says of each subject of the comparison whether it is the same.
+tell_comparison()
+{
+    local subject lines
+    for subject in links addresses routes groups sysctls switch file-modes; do
+        lines="$(wc -l <"$lab_out/snapshots/plain/$subject")"
+        if diff -q "$lab_out/snapshots/plain/$subject" "$lab_out/snapshots/home/$subject" \
+            >/dev/null; then
+            printf '    %-12s %5d lines, the same\n' "$subject" "$lines"
+        else
+            printf '    %-12s DIFFERENT\n' "$subject"
+        fi
+    done
+    (cd "$lab_out/snapshots/plain/files" && find . -type f | sed 's|^\.||' | sort) |
+        while read -r file; do
+            if cmp -s "$lab_out/snapshots/plain/files$file" "$lab_out/snapshots/home/files$file"; then
+                printf '    %s: the same, byte for byte\n' "$file"
+            else
+                printf '    %s: DIFFERENT\n' "$file"
+            fi
+        done
+}
+
+heading "The host before"
+tell_host
+remember_plain
+
+heading "A client registers"
+probes_start
+sleep 1
+run_and_tell stages_of_registration vornovsctl register "$client"
+expect_registered "$client"
+probes_finish Register "$limit" >/dev/null
+
+heading "Traffic on the way to the switch"
+tell_traffic
+
+heading "The host on the switch"
+tell_host
+echo "the switch:"
+ovs-vsctl --timeout=10 show | sed 's/^/    /'
+expect_on_switch
+echo "Every bridge has its port's addresses, hardware address, MTU and gateway."
+
+heading "The client unregisters"
+probes_start
+sleep 1
+run_and_tell stages_of_withdrawal vornovsctl unregister "$client"
+expect_registered
+probes_finish UnRegister "$limit" >/dev/null
+
+heading "Traffic on the way back"
+tell_traffic
+
+heading "Before and after"
+snapshot home
+tell_comparison
+expect_unchanged plain home
+
+printf '\nProved: %s ports went on to the switch and came back, the host answered throughout (longest gap %s ms there, %s ms back), and everything is what it was.\n' \
+    "$(host_ports | wc -l)" "$(worst Register)" "$(worst UnRegister)"

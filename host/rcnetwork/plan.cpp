@@ -23,6 +23,7 @@ InterfaceRecord Both(const InterfaceRecord& former, const InterfaceRecord& next)
     InterfaceRecord both = former;
     both.addresses.insert(next.addresses.begin(), next.addresses.end());
     both.routes.insert(next.routes.begin(), next.routes.end());
+    both.unchecked.insert(next.unchecked.begin(), next.unchecked.end());
     both.formerSettings.insert(next.formerSettings.begin(), next.formerSettings.end());
     both.broughtUp = former.broughtUp || next.broughtUp;
     both.formerMtu = former.formerMtu ? former.formerMtu : next.formerMtu;
@@ -37,6 +38,7 @@ void AddRecords(const Inputs& inputs, const Steps& steps, Plan& plan)
     for (const auto& [name, record] : steps.records) {
         plan.recordBefore.interfaces[name] = Both(plan.recordBefore.interfaces[name], record);
         plan.recordAfter.interfaces[name] = record;
+        plan.recordAfter.interfaces[name].unchecked.clear();
     }
 }
 
@@ -44,7 +46,7 @@ void AddRecords(const Inputs& inputs, const Steps& steps, Plan& plan)
  * The order is what keeps the host reachable: addresses stand on both sides while the ports
  * change over, so that each packet finds them wherever it arrives.
  */
-void AddStages(const Inputs& inputs, const Steps& steps, Plan& plan)
+void AddStages(const Steps& steps, Plan& plan)
 {
     if (steps.needsSwitch) {
         AddStage(
@@ -73,7 +75,7 @@ Plan MakePlan(const Inputs& inputs)
         PairPlanner(inputs, pair, steps, plan.remarks).Run();
     }
     RoutePlanner(inputs, pairs, steps).Run();
-    AddStages(inputs, steps, plan);
+    AddStages(steps, plan);
     AddRecords(inputs, steps, plan);
     return plan;
 }

@@ -46,7 +46,7 @@ void AddRecords(const Inputs& inputs, const Steps& steps, Plan& plan)
  */
 void AddStages(const Inputs& inputs, const Steps& steps, Plan& plan)
 {
-    if (steps.needsSwitch && !inputs.switchState.running) {
+    if (steps.needsSwitch) {
         AddStage(
             plan, StageKind::kServices, "start the switch",
             {std::string(kDatabaseService) + " start", std::string(kSwitchService) + " start"});

@@ -74,7 +74,7 @@ ContractLock LockContractFile(const std::string& path, LockDeadline deadline)
 {
     const bool hostile = OthersCanWriteIn(path);
     for (int attempt = 0; attempt < kAttempts; ++attempt) {
-        Descriptor file = OpenOrMake(path, hostile);
+        Descriptor file = AboveStandard(OpenOrMake(path, hostile));
         if (!file && errno != EAGAIN) {
             ::syslog(LOG_WARNING, "%s cannot be locked: %s", path.c_str(), std::strerror(errno));
             return {};

@@ -98,10 +98,8 @@ FILE* OpenDirect(const std::vector<std::string>& argv)
     if (::pipe2(ends, O_CLOEXEC) != 0) {
         return nullptr;
     }
-    Descriptor readEnd(ends[0]);
+    Descriptor stream = AboveStandard(Descriptor(ends[0]));
     Descriptor writeEnd(ends[1]);
-    Descriptor stream(::fcntl(readEnd.Get(), F_DUPFD_CLOEXEC, kFirstOwnDescriptor));
-    readEnd.Reset();
     if (!stream) {
         return nullptr;
     }
@@ -116,11 +114,10 @@ FILE* OpenDirect(const std::vector<std::string>& argv)
 /** The program's whole answer; its status in the report. */
 Descriptor Collect(const std::vector<std::string>& argv, RunnerReport& report)
 {
-    const Descriptor memory(::memfd_create("answer", MFD_CLOEXEC));
-    Descriptor answer(::fcntl(memory.Get(), F_DUPFD_CLOEXEC, kFirstOwnDescriptor));
+    Descriptor answer = AboveStandard(Descriptor(::memfd_create("answer", MFD_CLOEXEC)));
     report.startError = ENOMEM;
     if (answer) {
-        Descriptor output(::fcntl(memory.Get(), F_DUPFD_CLOEXEC, kFirstOwnDescriptor));
+        Descriptor output(::fcntl(answer.Get(), F_DUPFD_CLOEXEC, kFirstOwnDescriptor));
         report = vornhost::RunProgram(Request(argv, std::move(output)));
         (void)::lseek(answer.Get(), 0, SEEK_SET);
     }

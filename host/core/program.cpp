@@ -184,10 +184,8 @@ std::optional<RunningProgram> StartProgram(ProgramRequest request)
     if (::pipe2(ends.data(), O_CLOEXEC | O_NONBLOCK) != 0) {
         return std::nullopt;
     }
-    const Descriptor readEnd(ends[0]);
+    Descriptor report = AboveStandard(Descriptor(ends[0]));
     const Descriptor writeEnd(ends[1]);
-    // The client may have its standard descriptors closed; they are not ours to take.
-    Descriptor report = MoveAbove(readEnd, 3);
     if (!report) {
         return std::nullopt;
     }

@@ -72,8 +72,9 @@ Descriptor TakeRunLock(const std::string& name, LockDeadline deadline)
         if (!folder) {
             return {};
         }
-        Descriptor file(::openat(folder.Get(), name.c_str(),
-                                 O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC | O_NOCTTY, 0600));
+        Descriptor file = AboveStandard(
+            Descriptor(::openat(folder.Get(), name.c_str(),
+                                O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC | O_NOCTTY, 0600)));
         if (!file || !WaitForLock(file.Get(), deadline)) {
             return {};
         }

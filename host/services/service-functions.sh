@@ -16,7 +16,7 @@ pid_file=$run_folder/$daemon.pid
 
 # How long a daemon may take to start, and to leave once asked to, in seconds.
 start_limit=60
-stop_limit=10
+stop_limit=5
 
 report()
 {
@@ -70,9 +70,11 @@ is_running()
     process_is_daemon "$pid"
 }
 
+# A process that has ended but is not yet collected by its parent has no program any more.
 process_is_daemon()
 {
     comm=
+    [ -e "/proc/$1/exe" ] || return 1
     { read -r comm <"/proc/$1/comm"; } 2>/dev/null || return 1
     [ "$comm" = "$daemon" ]
 }
@@ -92,7 +94,10 @@ take_turn()
 {
     make_folder 0700 /run/vornovs
     exec 9>"/run/vornovs/$service.lock"
-    flock -w "$start_limit" 9 2>/dev/null || flock 9
+    if ! wait_until "$start_limit" flock -n 9; then
+        report "another run of this script does not end"
+        return 1
+    fi
 }
 
 # A daemon that was killed leaves its pid file and its sockets.
@@ -136,7 +141,7 @@ stop()
     fi
     stopping=$pid
 
-    ovs-appctl --timeout=5 -t "$run_folder/$daemon.$stopping.ctl" exit >/dev/null 2>&1 || :
+    ovs-appctl --timeout=2 -t "$run_folder/$daemon.$stopping.ctl" exit >/dev/null 2>&1 || :
     for signal in TERM KILL FAIL; do
         if wait_until "$stop_limit" has_stopped "$stopping"; then
             remove_leavings

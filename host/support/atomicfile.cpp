@@ -19,7 +19,8 @@ class TemporaryFile {
 public:
     explicit TemporaryFile(const std::string& folder)
         // The leading dot keeps it away from those who list the folder's files by prefix.
-        : m_path(folder + "/.vornovs-XXXXXX"), m_file(::mkostemp(m_path.data(), O_CLOEXEC))
+        : m_path(folder + "/.vornovs-XXXXXX"),
+          m_file(AboveStandard(Descriptor(::mkostemp(m_path.data(), O_CLOEXEC))))
     {
     }
     TemporaryFile(const TemporaryFile&) = delete;

@@ -6,6 +6,7 @@
 
 #include <utility>
 
+#include <fcntl.h>
 #include <unistd.h>
 
 namespace vornhost {
@@ -39,6 +40,20 @@ public:
 private:
     int m_descriptor = -1;
 };
+
+/**
+ * Moves a descriptor out of the way: where a client has closed its standard descriptors, a file
+ * that we open becomes one of them, and what the client prints would be written into it.
+ * @return the same or a new one, none when there was none or none is left.
+ */
+inline Descriptor AboveStandard(Descriptor descriptor)
+{
+    constexpr int kFirst = 3;
+    if (!descriptor || descriptor.Get() >= kFirst) {
+        return descriptor;
+    }
+    return Descriptor(::fcntl(descriptor.Get(), F_DUPFD_CLOEXEC, kFirst));
+}
 
 } // namespace vornhost
 

@@ -7,14 +7,10 @@
 #include <cerrno>
 #include <cstring>
 
-#include <fcntl.h>
 #include <sys/mman.h>
 
 namespace vornhost {
 namespace {
-
-/** Above what the program's standard descriptors occupy, should ours be closed. */
-constexpr int kFirstOwnDescriptor = 10;
 
 /**
  * A file in memory. Unlike a pipe it never makes the program or us wait, and a daemon that the
@@ -22,8 +18,7 @@ constexpr int kFirstOwnDescriptor = 10;
  */
 Descriptor MemoryFile()
 {
-    const Descriptor file(::memfd_create("standard stream", MFD_CLOEXEC));
-    return Descriptor(file ? ::fcntl(file.Get(), F_DUPFD_CLOEXEC, kFirstOwnDescriptor) : -1);
+    return AboveStandard(Descriptor(::memfd_create("standard stream", MFD_CLOEXEC)));
 }
 
 bool Fill(int file, const std::string& text)

@@ -26,7 +26,7 @@ protected:
     ~Interfaces() override
     {
         for (const std::string& name : m_made) {
-            (void)contract::Run({"ip", "link", "del", name});
+            (void)contract::RunProgram({"ip", "link", "del", name});
         }
     }
 

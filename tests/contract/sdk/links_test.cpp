@@ -25,8 +25,8 @@ protected:
     }
     ~Links() override
     {
-        (void)contract::Run({"ip", "link", "del", "port0"});
-        (void)contract::Run({"ip", "link", "del", "ovs_port0"});
+        (void)contract::RunProgram({"ip", "link", "del", "port0"});
+        (void)contract::RunProgram({"ip", "link", "del", "ovs_port0"});
     }
 
     static void Plug()

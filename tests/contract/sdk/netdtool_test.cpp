@@ -19,7 +19,7 @@ constexpr char kStore[] = "/usr/vorn/etc/vornnetd/gateways.conf";
 Outcome Tool(std::vector<std::string> arguments)
 {
     arguments.insert(arguments.begin(), VORNNETDTOOL);
-    return contract::Run(arguments);
+    return contract::RunProgram(arguments);
 }
 
 const Outcome kSilentSuccess{0, "", ""};

@@ -16,7 +16,7 @@ void PrintTo(const Outcome& outcome, std::ostream* stream)
             << outcome.errors << "'";
 }
 
-Outcome Run(const std::vector<std::string>& argv)
+Outcome RunProgram(const std::vector<std::string>& argv)
 {
     std::vector<std::string> whole = argv;
     if (whole[0].find('/') == std::string::npos) {
@@ -36,7 +36,7 @@ void Ip(const std::string& line)
     for (std::string word; text >> word;) {
         argv.push_back(word);
     }
-    const Outcome outcome = Run(argv);
+    const Outcome outcome = RunProgram(argv);
     EXPECT_EQ(outcome.exitCode, 0) << "ip " << line << ": " << outcome.errors;
 }
 

@@ -21,7 +21,7 @@ struct Outcome {
 void PrintTo(const Outcome& outcome, std::ostream* stream);
 
 /** Runs a program, found as a shell finds it, to its end. */
-Outcome Run(const std::vector<std::string>& argv);
+Outcome RunProgram(const std::vector<std::string>& argv);
 
 /** Runs "ip" with the words of the line; fails the test when that fails. */
 void Ip(const std::string& line);

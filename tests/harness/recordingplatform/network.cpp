@@ -172,7 +172,7 @@ int VORNNetLinkAggrSet(const VORNLINKAGGROPT* opt)
     Recorder& recorder = Recorder::Current("VORNNetLinkAggrSet");
     std::vector<std::string> words{Name("VORNNetLinkAggrSet", opt->szMaster),
                                    "mode=" + std::to_string(static_cast<int>(opt->mode))};
-    for (int i = 0; i < opt->nSlave; ++i) {
+    for (int i = 0; i < std::min(opt->nSlave, VORN_LINK_AGGR_SLAVES); ++i) {
         words.push_back(Name("VORNNetLinkAggrSet", opt->rgszSlave[i]));
     }
     return recorder.Call(CallText("VORNNetLinkAggrSet", words)).value_or(0);

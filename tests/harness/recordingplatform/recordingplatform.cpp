@@ -88,6 +88,11 @@ void RecordingPlatform::Bond(const std::string& name, int mode,
     m_recorder->m_bonds[name] = BondRecord(name, mode, slaves);
 }
 
+void RecordingPlatform::Bond(const std::string& name, const VORNLINKAGGROPT& record)
+{
+    m_recorder->m_bonds[name] = record;
+}
+
 void RecordingPlatform::LinkSpeeds(const std::string& name, const std::vector<int>& speeds)
 {
     m_recorder->m_links[name] = {speeds, 0};

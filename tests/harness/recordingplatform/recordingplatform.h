@@ -79,6 +79,9 @@ public:
     /** Gives a bond its record; without one it cannot be read. */
     void Bond(const std::string& name, int mode, const std::vector<std::string>& slaves);
 
+    /** The same with a record as it stands, whatever it says. */
+    void Bond(const std::string& name, const VORNLINKAGGROPT& record);
+
     /** Link speeds that an interface reports one after the other; the last one stays. */
     void LinkSpeeds(const std::string& name, const std::vector<int>& speeds);
 

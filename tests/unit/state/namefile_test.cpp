@@ -109,7 +109,7 @@ TEST_P(SavedNames, AreWrittenBesideSyncedAndRenamed)
     const FileCalls calls;
     EXPECT_EQ(GetParam().add("eth0"), 0);
     const std::string temporary = GetParam().FileName() + "[^ ]+";
-    EXPECT_THAT(calls.Synced(),
+    EXPECT_THAT(calls.List(),
                 ElementsAre(MatchesRegex("fsync " + temporary),
                             MatchesRegex("rename " + temporary + " " + GetParam().FileName()),
                             "fsync vornovs"));
@@ -378,7 +378,7 @@ TEST_P(SavedNames, LeaveTheFolderSyncedWhenTheLastOneLeaves)
     WriteFile(GetParam().path, "eth0\n");
     const FileCalls calls;
     EXPECT_EQ(GetParam().remove("eth0"), 0);
-    EXPECT_THAT(calls.Synced(), ElementsAre("fsync vornovs"));
+    EXPECT_THAT(calls.List(), ElementsAre("unlink " + GetParam().FileName(), "fsync vornovs"));
     EXPECT_THAT(ListFolder(kStateFolder), IsEmpty());
 }
 

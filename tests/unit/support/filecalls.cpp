@@ -23,7 +23,7 @@ struct Failure {
 
 struct State {
     std::map<std::string, Failure> failures;
-    std::vector<std::string> synced;
+    std::vector<std::string> calls;
     bool singleBytes = false;
 };
 
@@ -101,9 +101,9 @@ void FileCalls::WriteSingleBytes()
     g_state->singleBytes = true;
 }
 
-const std::vector<std::string>& FileCalls::Synced() const
+const std::vector<std::string>& FileCalls::List() const
 {
-    return g_state->synced;
+    return g_state->calls;
 }
 
 ScopedWithoutOverride::ScopedWithoutOverride()
@@ -123,7 +123,7 @@ extern "C" {
 int fsync(int descriptor)
 {
     if (unit::g_state != nullptr) {
-        unit::g_state->synced.push_back("fsync " + unit::NameOfDescriptor(descriptor));
+        unit::g_state->calls.push_back("fsync " + unit::NameOfDescriptor(descriptor));
     }
     return unit::Fails("fsync") ? -1 : unit::Next<int (*)(int)>("fsync")(descriptor);
 }
@@ -131,12 +131,19 @@ int fsync(int descriptor)
 int rename(const char* from, const char* to) noexcept
 {
     if (unit::g_state != nullptr) {
-        unit::g_state->synced.push_back("rename " + unit::BaseName(from) + " " +
-                                        unit::BaseName(to));
+        unit::g_state->calls.push_back("rename " + unit::BaseName(from) + " " + unit::BaseName(to));
     }
     return unit::Fails("rename")
                ? -1
                : unit::Next<int (*)(const char*, const char*)>("rename")(from, to);
+}
+
+int unlink(const char* path) noexcept
+{
+    if (unit::g_state != nullptr) {
+        unit::g_state->calls.push_back("unlink " + unit::BaseName(path));
+    }
+    return unit::Fails("unlink") ? -1 : unit::Next<int (*)(const char*)>("unlink")(path);
 }
 
 int fchown(int descriptor, uid_t user, gid_t group) noexcept

@@ -18,7 +18,7 @@ public:
 
     /**
      * Makes calls fail with that error.
-     * @param function  fsync, rename, fchown, fchmod or write.
+     * @param function  fsync, rename, unlink, fchown, fchmod or write.
      * @param nth       which call of it, counted from 1; 0: every one.
      */
     void Fail(const std::string& function, int error, int nth = 0);
@@ -26,8 +26,8 @@ public:
     /** Makes every write() take a single byte. */
     void WriteSingleBytes();
 
-    /** The calls of fsync and rename, files named without their folder: "fsync vornovs". */
-    const std::vector<std::string>& Synced() const;
+    /** The calls of fsync, rename and unlink, files named without folder: "fsync vornovs". */
+    const std::vector<std::string>& List() const;
 };
 
 /** Takes root's power over file modes from this thread while it lives. */

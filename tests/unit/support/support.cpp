@@ -20,6 +20,13 @@ namespace fs = std::filesystem;
 
 namespace {
 
+void Empty(const fs::path& folder)
+{
+    for (const auto& entry : fs::directory_iterator(folder)) {
+        fs::remove_all(entry.path());
+    }
+}
+
 bool IsInSandbox()
 {
     std::ifstream mounts("/proc/self/mounts");
@@ -39,17 +46,7 @@ class FreshFolders : public testing::EmptyTestEventListener {
             (void)std::fprintf(stderr, "unit tests run in the sandbox only\n");
             std::abort();
         }
-        Empty("/usr/vorn");
-        Empty("/etc/sysconfig");
-        fs::create_directories(kStateFolder);
-        fs::create_directories("/etc/sysconfig/network-scripts");
-    }
-
-    static void Empty(const fs::path& folder)
-    {
-        for (const auto& entry : fs::directory_iterator(folder)) {
-            fs::remove_all(entry.path());
-        }
+        RenewFolders();
     }
 };
 
@@ -66,6 +63,14 @@ void Check(bool succeeded, const std::string& step)
 }
 
 } // namespace
+
+void RenewFolders()
+{
+    Empty("/usr/vorn");
+    Empty("/etc/sysconfig");
+    fs::create_directories(kStateFolder);
+    fs::create_directories("/etc/sysconfig/network-scripts");
+}
 
 const std::string& LongName()
 {

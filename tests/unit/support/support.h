@@ -36,6 +36,9 @@ constexpr int kExitedWith1 = 1 << 8;
 constexpr int kExitedWith77 = 77 << 8;
 constexpr int kKilled = 9;
 
+/** Makes the folders anew in the middle of a test. */
+void RenewFolders();
+
 /** The longest name that every entry point must stand. */
 const std::string& LongName();
 
@@ -68,7 +71,7 @@ Calls Sequence(std::initializer_list<Calls> pieces);
 /** A folder that is a small file system of its own while this lives. */
 class ScopedMount {
 public:
-    /** @param options  such as "size=8k"; @param flags  mount flags. */
+    /** @param options  such as "size=8k". */
     ScopedMount(std::string folder, const std::string& options);
     ~ScopedMount();
     ScopedMount(const ScopedMount&) = delete;

@@ -1,0 +1,222 @@
+#include "apply.h"
+
+#include "inputs.h"
+
+#include "support/process.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <cstring>
+#include <fstream>
+#include <sstream>
+#include <thread>
+
+namespace vornhost {
+namespace {
+
+constexpr char kIpTool[] = "/sbin/ip";
+constexpr std::chrono::seconds kToolDeadline{15};
+constexpr std::chrono::seconds kServiceDeadline{60};
+constexpr std::chrono::seconds kBridgeDeadline{8};
+constexpr std::chrono::milliseconds kBridgePoll{10};
+
+std::vector<std::string> Words(const std::string& line)
+{
+    std::istringstream stream(line);
+    std::vector<std::string> words;
+    for (std::string word; stream >> word;) {
+        words.push_back(word);
+    }
+    return words;
+}
+
+/** What a program said, on one line of the log. */
+std::string OneLine(std::string text)
+{
+    while (!text.empty() && text.back() == '\n') {
+        text.pop_back();
+    }
+    for (std::string::size_type at = 0; (at = text.find('\n', at)) != std::string::npos;) {
+        text.replace(at, 1, "; ");
+    }
+    return text;
+}
+
+class Applier {
+public:
+    Applier(const Plan& plan, std::vector<Remark>& remarks) : m_plan(plan), m_remarks(remarks) {}
+    bool Run(const Stage& stage);
+
+private:
+    bool Fail(const std::string& text);
+    bool Program(const std::vector<std::string>& command, std::chrono::milliseconds deadline,
+                 const std::string& input, ProcessResult& result) const;
+    bool RunServices(const Stage& stage);
+    bool RunSwitch(const Stage& stage);
+    bool RunBatch(const Stage& stage);
+    void RunAdditions(const Stage& stage) const;
+    bool WaitForBridges(const Stage& stage);
+    bool WriteSettings(const Stage& stage);
+    bool ForgetGateways(const Stage& stage);
+
+    const Plan& m_plan;
+    std::vector<Remark>& m_remarks;
+};
+
+bool Applier::Fail(const std::string& text)
+{
+    m_remarks.push_back({Severity::kWarning, text});
+    return false;
+}
+
+bool Applier::Program(const std::vector<std::string>& command, std::chrono::milliseconds deadline,
+                      const std::string& input, ProcessResult& result) const
+{
+    ProcessOptions options;
+    options.deadline = deadline;
+    options.environment = ToolEnvironment();
+    options.input = input;
+    result = RunProcess(command, options);
+    return result.Succeeded();
+}
+
+bool Applier::RunServices(const Stage& stage)
+{
+    ProcessResult result;
+    return std::all_of(stage.lines.begin(), stage.lines.end(), [&](const std::string& line) {
+        return Program(Words(line), kServiceDeadline, "", result) ||
+               Fail(line + " failed: " + OneLine(result.errors));
+    });
+}
+
+bool Applier::RunSwitch(const Stage& stage)
+{
+    std::vector<std::string> command{kSwitchTool};
+    if (!m_plan.waitForSwitch) {
+        command.emplace_back("--no-wait");
+    }
+    for (const std::string& line : stage.lines) {
+        const auto words = Words(line);
+        command.emplace_back("--");
+        command.insert(command.end(), words.begin(), words.end());
+    }
+    ProcessResult result;
+    return Program(command, kToolDeadline, "", result) ||
+           Fail(stage.title + ": ovs-vsctl failed: " + OneLine(result.errors));
+}
+
+bool Applier::RunBatch(const Stage& stage)
+{
+    std::string input;
+    for (const std::string& line : stage.lines) {
+        input += line + "\n";
+    }
+    ProcessResult result;
+    if (Program({kIpTool, "-batch", "-"}, kToolDeadline, input, result)) {
+        return true;
+    }
+    RunAdditions(stage);
+    return Fail(stage.title + ": ip failed: " + OneLine(result.errors));
+}
+
+/** After a line that failed nothing may be taken away any more, but all else is still made. */
+void Applier::RunAdditions(const Stage& stage) const
+{
+    std::string input;
+    for (const std::string& line : stage.lines) {
+        const auto words = Words(line);
+        const bool removes = words.size() > 1 && (words[1] == "del" || words.back() == "down");
+        input += removes ? "" : line + "\n";
+    }
+    ProcessResult result;
+    (void)Program({kIpTool, "-force", "-batch", "-"}, kToolDeadline, input, result);
+}
+
+bool Applier::WaitForBridges(const Stage& stage)
+{
+    const auto deadline = std::chrono::steady_clock::now() + kBridgeDeadline;
+    for (const std::string& line : stage.lines) {
+        const auto words = Words(line);
+        const auto stands = [&] {
+            const auto links = ReadLinks();
+            return std::any_of(links.begin(), links.end(), [&](const Link& link) {
+                return link.name == words.at(0) && link.mac == words.at(1);
+            });
+        };
+        while (!stands()) {
+            if (std::chrono::steady_clock::now() > deadline) {
+                return Fail("the switch did not make " + words.at(0) + " with the address " +
+                            words.at(1));
+            }
+            std::this_thread::sleep_for(kBridgePoll);
+        }
+    }
+    return true;
+}
+
+/** A setting that the kernel refuses is said and passed over: the host is reachable without it. */
+bool Applier::WriteSettings(const Stage& stage)
+{
+    for (const std::string& line : stage.lines) {
+        const auto words = Words(line);
+        const std::string path = SettingPath(words.at(0), words.at(1));
+        const std::string value = line.substr(words.at(0).size() + words.at(1).size() + 2);
+        std::ofstream file(path);
+        file << value << "\n" << std::flush;
+        if (!file) {
+            (void)Fail("cannot write " + value + " to " + path);
+        }
+    }
+    return true;
+}
+
+bool Applier::ForgetGateways(const Stage& stage)
+{
+    const GatewayStoreLock lock;
+    auto store = GatewayStore::Load();
+    if (!lock.Held() || !store) {
+        return Fail("cannot change the gateway records");
+    }
+    for (const std::string& interface : stage.lines) {
+        (void)store->Remove(interface, AddressFamily::kIPv4);
+        (void)store->Remove(interface, AddressFamily::kIPv6);
+    }
+    return store->Save() || Fail("cannot write the gateway records");
+}
+
+bool Applier::Run(const Stage& stage)
+{
+    switch (stage.kind) {
+    case StageKind::kServices:
+        return RunServices(stage);
+    case StageKind::kSwitch:
+        return RunSwitch(stage);
+    case StageKind::kWait:
+        return WaitForBridges(stage);
+    case StageKind::kSettings:
+        return WriteSettings(stage);
+    case StageKind::kBatch:
+        return RunBatch(stage);
+    case StageKind::kGateways:
+        break;
+    }
+    return ForgetGateways(stage);
+}
+
+} // namespace
+
+bool ApplyPlan(const Plan& plan, std::vector<Remark>& remarks)
+{
+    Applier applier(plan, remarks);
+    for (const Stage& stage : plan.stages) {
+        if (!applier.Run(stage)) {
+            return false;
+        }
+        if (stage.kind == StageKind::kServices) {
+            break; // what the switch knows from before decides about the rest
+        }
+    }
+    return true;
+}
+
+} // namespace vornhost

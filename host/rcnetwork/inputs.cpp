@@ -1,0 +1,167 @@
+#include "inputs.h"
+
+#include "support/keyvaluefile.h"
+#include "support/process.h"
+
+#include <cerrno>
+#include <cstring>
+#include <filesystem>
+#include <fstream>
+#include <sstream>
+
+namespace vornhost {
+namespace {
+
+constexpr std::chrono::seconds kToolDeadline{15};
+
+std::string FirstLine(const std::string& path)
+{
+    std::ifstream file(path);
+    std::string line;
+    std::getline(file, line);
+    return line;
+}
+
+/** A service script says in comments which process it runs. */
+std::string CommentValue(const std::string& script, const std::string& key)
+{
+    std::ifstream file(script);
+    const std::string beginning = "# " + key + ":";
+    for (std::string line; std::getline(file, line);) {
+        if (line.rfind(beginning, 0) == 0) {
+            const auto first = line.find_first_not_of(" \t", beginning.size());
+            return first == std::string::npos ? "" : line.substr(first);
+        }
+    }
+    return {};
+}
+
+bool ServiceRuns(const std::string& script)
+{
+    const std::string process = FirstLine(CommentValue(script, "pidfile"));
+    const bool isNumber =
+        !process.empty() && process.find_first_not_of("0123456789") == std::string::npos;
+    return isNumber &&
+           FirstLine("/proc/" + process + "/comm") == CommentValue(script, "processname");
+}
+
+ParsedFile ReadInterfaceFile(const std::string& name, const std::filesystem::path& path)
+{
+    const auto values = KeyValueFile::Load(path);
+    if (values) {
+        return ParseInterfaceFile(name, values->Text());
+    }
+    ParsedFile parsed;
+    parsed.file.name = name;
+    parsed.file.use = FileUse::kLeaveAlone;
+    parsed.remarks.push_back({Severity::kError, "cannot read " + path.string() + ": " +
+                                                    std::strerror(errno) +
+                                                    "; the interface is left as it is"});
+    return parsed;
+}
+
+bool ReadFiles(Inputs& inputs, std::vector<Remark>& remarks)
+{
+    std::error_code error;
+    std::filesystem::directory_iterator entries(kConfigurationFolder, error);
+    for (; !error && entries != std::filesystem::directory_iterator(); entries.increment(error)) {
+        const std::string name = InterfaceOfFileName(entries->path().filename());
+        if (name.empty()) {
+            continue;
+        }
+        ParsedFile parsed = ReadInterfaceFile(name, entries->path());
+        remarks.insert(remarks.end(), parsed.remarks.begin(), parsed.remarks.end());
+        inputs.files[name] = std::move(parsed.file);
+    }
+    if (error) {
+        remarks.push_back({Severity::kError, std::string("cannot read ") + kConfigurationFolder +
+                                                 ": " + error.message()});
+    }
+    return !error;
+}
+
+void ReadGateways(Inputs& inputs, std::vector<Remark>& remarks)
+{
+    const auto store = GatewayStore::Load();
+    if (store) {
+        inputs.gateways = store->Records();
+        return;
+    }
+    remarks.push_back(
+        {Severity::kError, std::string("cannot read ") + kGatewayStorePath + "; routes stay"});
+    for (auto& [name, file] : inputs.files) {
+        file.whole = false;
+    }
+}
+
+void ReadSwitch(Inputs& inputs, std::vector<Remark>& remarks)
+{
+    if (!ServiceRuns(kDatabaseService) || !ServiceRuns(kSwitchService)) {
+        return;
+    }
+    std::vector<std::string> command{kSwitchTool};
+    const auto arguments = SwitchTablesArguments();
+    command.insert(command.end(), arguments.begin(), arguments.end());
+    ProcessOptions options;
+    options.deadline = kToolDeadline;
+    options.environment = ToolEnvironment();
+    const ProcessResult result = RunProcess(command, options);
+    const auto state = result.Succeeded() ? ParseSwitchTables(result.output) : std::nullopt;
+    if (state) {
+        inputs.switchState = *state;
+    } else {
+        remarks.push_back(
+            {Severity::kError, "the switch's database does not answer: " + result.errors});
+    }
+}
+
+void ReadRunState(Inputs& inputs)
+{
+    std::ifstream file(kRunStatePath);
+    std::ostringstream text;
+    text << file.rdbuf();
+    inputs.runState = ParseRunState(text.str());
+}
+
+void ReadAllSettings(Inputs& inputs)
+{
+    ReadSettings(kNewInterface, inputs.live);
+    for (const Link& link : inputs.live.links) {
+        const std::string plain = PlainOf(link.name);
+        if (inputs.files.contains(plain) || inputs.files.contains(BridgeOf(plain)) ||
+            inputs.runState.interfaces.contains(plain) || plain != link.name ||
+            inputs.live.FindLink(BridgeOf(plain)) != nullptr) {
+            ReadSettings(link.name, inputs.live);
+        }
+    }
+}
+
+} // namespace
+
+std::vector<std::string> ToolEnvironment()
+{
+    return {"PATH=/usr/local/sbin:/usr/local/bin:/usr/sbin:/usr/bin:/sbin:/bin", "LC_ALL=C",
+            "OVS_CTL_TIMEOUT=10"};
+}
+
+std::optional<Inputs> ReadInputs(const Request& request, std::vector<Remark>& remarks)
+{
+    Inputs inputs;
+    inputs.request = request;
+    if (!ReadFiles(inputs, remarks)) {
+        return std::nullopt;
+    }
+    ReadGateways(inputs, remarks);
+    ReadSwitch(inputs, remarks);
+    ReadRunState(inputs);
+    auto live = ReadLiveState();
+    if (!live) {
+        remarks.push_back({Severity::kError, "cannot read the kernel's network"});
+        return std::nullopt;
+    }
+    inputs.live = std::move(*live);
+    ReadAllSettings(inputs);
+    return inputs;
+}
+
+} // namespace vornhost

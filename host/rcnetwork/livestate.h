@@ -1,0 +1,48 @@
+/**
+ * The kernel's network as a plan sees it.
+ */
+#ifndef VORNHOST_RCNETWORK_LIVESTATE_H
+#define VORNHOST_RCNETWORK_LIVESTATE_H
+
+#include "support/netlink.h"
+
+#include <map>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace vornhost {
+
+/** Settings of one interface by name: "ipv4.conf.rp_filter", "ipv6.neigh.retrans_time_ms"... */
+using Settings = std::map<std::string, std::string>;
+
+/** Stands for the settings that a new interface begins with. */
+constexpr char kNewInterface[] = "default";
+
+struct LiveState {
+    std::vector<Link> links;
+    std::vector<Address> addresses;
+    std::vector<Route> routes;
+    std::vector<Neighbour> neighbours;
+    std::map<std::string, Settings> settings; ///< By interface, for those that a plan may concern.
+
+    const Link* FindLink(const std::string& name) const;
+    const Link* FindLink(int index) const;
+    /** @return  the interface's name, empty when there is none of that index. */
+    std::string NameOf(int index) const;
+    /** @return  the setting, empty when the interface or the setting does not exist. */
+    std::string Setting(const std::string& interface, const std::string& name) const;
+};
+
+/** Reads the kernel's links, addresses, routes and neighbours. @return  nullopt on failure. */
+std::optional<LiveState> ReadLiveState();
+
+/** Adds the settings of one interface to the state. */
+void ReadSettings(const std::string& interface, LiveState& live);
+
+/** @return  the file of a setting: "ipv4.conf.rp_filter" of "eth0". */
+std::string SettingPath(const std::string& interface, const std::string& name);
+
+} // namespace vornhost
+
+#endif

@@ -1,0 +1,178 @@
+#include "hold.h"
+#include "reconcile.h"
+#include "report.h"
+
+#include "support/interfacename.h"
+
+#include <cerrno>
+#include <chrono>
+#include <csignal>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <thread>
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <syslog.h>
+#include <unistd.h>
+
+namespace vornhost {
+namespace {
+
+constexpr char kLockPath[] = "/run/vornovs/network.lock";
+constexpr std::chrono::seconds kLockWait{90};
+constexpr std::chrono::milliseconds kLockPoll{50};
+constexpr int kUsageError = 2;
+
+constexpr char kUsage[] =
+    "Usage: rc.network [--dry-run] start|stop [interface...]\n"
+    "Brings the network to what the files in /etc/sysconfig/network-scripts ask for (start),\n"
+    "or takes down what start made (stop); without interfaces, all of them.\n"
+    "  --dry-run   print what would be done and change nothing\n"
+    "Exit status: 0 all of it is so now, 1 something is not (it says what), 2 wrong usage.\n";
+
+/** Lets one run at a time change the network; free again when its owner dies. */
+class NetworkLock {
+public:
+    NetworkLock();
+    ~NetworkLock();
+    NetworkLock(const NetworkLock&) = delete;
+    NetworkLock& operator=(const NetworkLock&) = delete;
+
+    bool Held() const { return m_held; }
+
+private:
+    int m_file = -1;
+    bool m_held = false;
+};
+
+NetworkLock::NetworkLock()
+{
+    (void)mkdir(kRunFolder, 0700);
+    m_file = open(kLockPath, O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0600);
+    const auto deadline = std::chrono::steady_clock::now() + kLockWait;
+    while (m_file >= 0 && !m_held && std::chrono::steady_clock::now() < deadline) {
+        m_held = flock(m_file, LOCK_EX | LOCK_NB) == 0;
+        if (!m_held) {
+            std::this_thread::sleep_for(kLockPoll);
+        }
+    }
+}
+
+NetworkLock::~NetworkLock()
+{
+    if (m_file >= 0) {
+        (void)close(m_file);
+    }
+}
+
+struct CommandLine {
+    std::string verb;
+    Request request;
+    std::string token; ///< Of the holder.
+    bool dryRun = false;
+};
+
+bool ParseCommandLine(int count, char** arguments, CommandLine& line)
+{
+    for (int i = 1; i < count; ++i) {
+        const std::string argument = arguments[i];
+        if (argument == "--dry-run") {
+            line.dryRun = true;
+        } else if (line.verb.empty()) {
+            line.verb = argument;
+        } else if (line.verb == kHolderVerb) {
+            line.token = argument;
+        } else if (IsInterfaceName(argument)) {
+            line.request.names.insert(PlainOf(argument));
+        } else {
+            (void)std::fprintf(stderr, "rc.network: \"%s\" is no interface name\n", arguments[i]);
+            return false;
+        }
+    }
+    line.request.verb = line.verb == "stop" ? Verb::kStop : Verb::kStart;
+    return line.verb == "start" || line.verb == "stop" ||
+           (line.verb == kHolderVerb && !line.token.empty());
+}
+
+int Fail(const std::string& text)
+{
+    Say({Severity::kError, text});
+    return EXIT_FAILURE;
+}
+
+int Start(const Request& request)
+{
+    // The hold lasts until all is done: if this run is killed, its holder finishes the work.
+    if (!Reconcile(request)) {
+        return EXIT_FAILURE;
+    }
+    EndHold(request.names);
+    return EXIT_SUCCESS;
+}
+
+int Stop(const Request& request)
+{
+    if (std::getenv(kHoldMark) != nullptr) {
+        return BeginHold(request)
+                   ? EXIT_SUCCESS
+                   : Fail(std::string("cannot hold the network: ") + std::strerror(errno));
+    }
+    EndHold(request.names);
+    return Reconcile(request) ? EXIT_SUCCESS : EXIT_FAILURE;
+}
+
+int RunHolder(const std::string& token)
+{
+    WaitForStart(HoldTime());
+    const NetworkLock lock;
+    if (!lock.Held()) {
+        return Fail(std::string("cannot get the lock ") + kLockPath);
+    }
+    const auto request = HeldBy(token);
+    if (!request) {
+        return EXIT_SUCCESS;
+    }
+    Say({Severity::kWarning, "no start followed a stop; the network is brought to its files"});
+    const bool done = Reconcile(*request);
+    EndHold(request->names);
+    return done ? EXIT_SUCCESS : EXIT_FAILURE;
+}
+
+int Run(const CommandLine& line)
+{
+    if (line.dryRun) {
+        return PrintPlan(line.request) ? EXIT_SUCCESS : EXIT_FAILURE;
+    }
+    if (line.verb == kHolderVerb) {
+        return RunHolder(line.token);
+    }
+    const NetworkLock lock;
+    if (!lock.Held()) {
+        return Fail(std::string("cannot get the lock ") + kLockPath);
+    }
+    return line.request.verb == Verb::kStop ? Stop(line.request) : Start(line.request);
+}
+
+} // namespace
+} // namespace vornhost
+
+int main(int count, char** arguments)
+{
+    // A terminal or a pipe that goes away must not end a change of the network half-way.
+    (void)std::signal(SIGHUP, SIG_IGN);
+    (void)std::signal(SIGPIPE, SIG_IGN);
+    ::openlog("rc.network", LOG_PID, LOG_DAEMON);
+    try {
+        vornhost::CommandLine line;
+        if (!vornhost::ParseCommandLine(count, arguments, line)) {
+            (void)std::fputs(vornhost::kUsage, stderr);
+            return vornhost::kUsageError;
+        }
+        return vornhost::Run(line);
+    } catch (const std::exception& exception) {
+        return vornhost::Fail(exception.what());
+    }
+}

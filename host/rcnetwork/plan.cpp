@@ -1,0 +1,93 @@
+#include "plan.h"
+
+#include "decision.h"
+#include "inputs.h"
+#include "pairplan.h"
+#include "routeplan.h"
+
+#include <sstream>
+
+namespace vornhost {
+namespace {
+
+void AddStage(Plan& plan, StageKind kind, const std::string& title, std::vector<std::string> lines)
+{
+    if (!lines.empty()) {
+        plan.stages.push_back({kind, title, std::move(lines)});
+    }
+}
+
+/** What is on disk while the plan runs: it may be cut short after any step. */
+InterfaceRecord Both(const InterfaceRecord& former, const InterfaceRecord& next)
+{
+    InterfaceRecord both = former;
+    both.addresses.insert(next.addresses.begin(), next.addresses.end());
+    both.routes.insert(next.routes.begin(), next.routes.end());
+    both.formerSettings.insert(next.formerSettings.begin(), next.formerSettings.end());
+    both.broughtUp = former.broughtUp || next.broughtUp;
+    both.formerMtu = former.formerMtu ? former.formerMtu : next.formerMtu;
+    both.tag = next.tag ? next.tag : former.tag;
+    return both;
+}
+
+void AddRecords(const Inputs& inputs, const Steps& steps, Plan& plan)
+{
+    plan.recordBefore = inputs.runState;
+    plan.recordAfter = inputs.runState;
+    for (const auto& [name, record] : steps.records) {
+        plan.recordBefore.interfaces[name] = Both(plan.recordBefore.interfaces[name], record);
+        plan.recordAfter.interfaces[name] = record;
+    }
+}
+
+/**
+ * The order is what keeps the host reachable: addresses stand on both sides while the ports
+ * change over, so that each packet finds them wherever it arrives.
+ */
+void AddStages(const Inputs& inputs, const Steps& steps, Plan& plan)
+{
+    if (steps.needsSwitch && !inputs.switchState.running) {
+        AddStage(
+            plan, StageKind::kServices, "start the switch",
+            {std::string(kDatabaseService) + " start", std::string(kSwitchService) + " start"});
+    }
+    AddStage(plan, StageKind::kSwitch, "make bridges", steps.makeBridges);
+    AddStage(plan, StageKind::kWait, "wait for bridges", steps.waitFor);
+    AddStage(plan, StageKind::kSettings, "settings before", steps.settingsBefore);
+    AddStage(plan, StageKind::kBatch, "build beside", steps.beside.Lines());
+    AddStage(plan, StageKind::kSwitch, "join and leave", steps.joinAndLeave);
+    AddStage(plan, StageKind::kBatch, "move", steps.move.Lines());
+    AddStage(plan, StageKind::kSettings, "settings after", steps.settingsAfter);
+    AddStage(plan, StageKind::kGateways, "forget gateways", steps.forgetGateways);
+}
+
+} // namespace
+
+Plan MakePlan(const Inputs& inputs)
+{
+    Plan plan;
+    plan.waitForSwitch = inputs.request.withoutSwitch.empty();
+    const std::vector<Pair> pairs = DecidePairs(inputs, plan.remarks);
+    Steps steps;
+    for (const Pair& pair : pairs) {
+        PairPlanner(inputs, pair, steps, plan.remarks).Run();
+    }
+    RoutePlanner(inputs, pairs, steps).Run();
+    AddStages(inputs, steps, plan);
+    AddRecords(inputs, steps, plan);
+    return plan;
+}
+
+std::string Plan::Text() const
+{
+    std::ostringstream text;
+    for (const Stage& stage : stages) {
+        text << stage.title << ":\n";
+        for (const std::string& line : stage.lines) {
+            text << "  " << line << "\n";
+        }
+    }
+    return text.str();
+}
+
+} // namespace vornhost

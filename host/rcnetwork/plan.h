@@ -1,0 +1,79 @@
+/**
+ * What has to be done to bring the live network to what the files ask for. A pure function of
+ * what was read: nothing here asks or changes the host.
+ */
+#ifndef VORNHOST_RCNETWORK_PLAN_H
+#define VORNHOST_RCNETWORK_PLAN_H
+
+#include "interfacefile.h"
+#include "livestate.h"
+#include "report.h"
+#include "runstate.h"
+#include "switchstate.h"
+
+#include "support/gatewaystore.h"
+
+#include <map>
+#include <set>
+#include <string>
+#include <vector>
+
+namespace vornhost {
+
+enum class Verb { kStart, kStop };
+
+struct Request {
+    Verb verb = Verb::kStart;
+    std::set<std::string> names; ///< Plain interfaces; none: everything.
+    /** Interfaces that the switch could not be made to carry: they stay reachable without it. */
+    std::set<std::string> withoutSwitch;
+};
+
+/** All that a plan depends on. */
+struct Inputs {
+    Request request;
+    std::map<std::string, InterfaceFile> files; ///< By interface.
+    std::vector<GatewayRecord> gateways;
+    LiveState live;
+    SwitchState switchState;
+    RunState runState;
+};
+
+/** How the lines of a stage are carried out. */
+enum class StageKind {
+    kServices, ///< Start scripts; what follows is planned anew once they ran.
+    kSwitch,   ///< Commands of one transaction of the switch's database.
+    kWait,     ///< "INTERFACE MAC" that must exist before anything goes on.
+    kSettings, ///< "INTERFACE SETTING VALUE"
+    kBatch,    ///< Lines of one "ip -batch".
+    kGateways  ///< "INTERFACE" whose gateway records are dropped.
+};
+
+struct Stage {
+    StageKind kind;
+    std::string title;
+    std::vector<std::string> lines;
+};
+
+struct Plan {
+    std::vector<Stage> stages; ///< In the order in which they are carried out; none is empty.
+    std::vector<Remark> remarks;
+    RunState recordBefore; ///< To be on disk before the first change...
+    RunState recordAfter;  ///< ...and after the last one.
+    bool waitForSwitch = true;
+
+    bool Empty() const { return stages.empty(); }
+    std::string Text() const;
+};
+
+Plan MakePlan(const Inputs& inputs);
+
+/** @return  "ovs_eth0" for "eth0". */
+std::string BridgeOf(const std::string& plainName);
+
+/** @return  "eth0" for "ovs_eth0" and for "eth0". */
+std::string PlainOf(const std::string& name);
+
+} // namespace vornhost
+
+#endif

@@ -24,8 +24,7 @@ topology_build()
     # Each of the outside's segments keeps to itself.
     in_outside sysctl -q -w net.ipv4.conf.all.arp_ignore=1 net.ipv4.conf.all.arp_announce=2 \
         net.ipv4.conf.default.rp_filter=0 net.ipv6.conf.default.accept_dad=0 \
-        net.ipv6.conf.all.accept_dad=0 net.ipv6.conf.all.keep_addr_on_down=1 \
-        net.ipv4.ping_group_range='0 2147483647'
+        net.ipv6.conf.all.accept_dad=0 net.ipv6.conf.all.keep_addr_on_down=1
 
     while read -r word name kind mac rest; do
         if [ "$word" = port ]; then
@@ -112,7 +111,7 @@ topology_addresses()
                     sub("/.*", "", words[i])
                     print 6, words[i]
                 }
-            }' | sort -u
+            }'
 }
 
 # What the appliance can probe: the outside's address on every port, and the far host, which is
@@ -120,7 +119,14 @@ topology_addresses()
 topology_outside_addresses()
 {
     sed -n -e 's/^outside [^ ]* //p' -e 's/^far //p' /lab/topology/topology | tr ' ' '\n' |
-        sed 's|/.*||' | if [ "$1" = 4 ]; then grep '\.'; else grep ':'; fi
+        sed 's|/.*||' | if [ "$1" = 4 ]; then grep '\.'; else grep ':'; fi || true
+}
+
+# The address of the far host; $1 is 4 or 6.
+topology_far_address()
+{
+    sed -n 's/^far //p' /lab/topology/topology | tr ' ' '\n' | sed 's|/.*||' |
+        if [ "$1" = 4 ]; then grep '\.'; else grep ':'; fi || true
 }
 
 # Waits until every address of the appliance answers the outside.

@@ -33,7 +33,7 @@ constexpr char kRegisterMore[] =
     "changes. The command goes on when the terminal is closed or interrupted.\n"
     "\n"
     "A bond's mode on the switch is ovs-active-backup, ovs-balance-slb or ovs-balance-tcp. It\n"
-    "only counts for the first client.\n"
+    "only counts for the first client, and not where the platform carries bonds as they are.\n"
     "\n"
     "Examples:\n"
     "  vornovsctl register vmhost\n"

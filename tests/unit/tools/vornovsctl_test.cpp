@@ -32,6 +32,7 @@ Outcome Ctl(std::vector<std::string> words)
 {
     words.insert(words.begin(), "vornovsctl");
     std::vector<const char*> argv;
+    argv.reserve(words.size());
     for (const std::string& word : words) {
         argv.push_back(word.c_str());
     }

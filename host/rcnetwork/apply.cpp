@@ -14,7 +14,7 @@
 namespace vornhost {
 namespace {
 
-constexpr char kIpTool[] = "/sbin/ip";
+constexpr char kIpTool[] = "/bin/ip";
 constexpr std::chrono::seconds kToolDeadline{15};
 constexpr std::chrono::seconds kServiceDeadline{60};
 constexpr std::chrono::seconds kBridgeDeadline{8};

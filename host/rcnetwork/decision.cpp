@@ -28,6 +28,7 @@ private:
     void CheckPort();
     void CheckMaster();
     void RespectOnBoot();
+    void CheckSwitch();
 
     const Inputs& m_inputs;
     std::vector<Remark>& m_remarks;
@@ -203,6 +204,26 @@ void Decider::RespectOnBoot()
     }
 }
 
+/** A switch that does not answer is asked for nothing, and what it carries stays on it. */
+void Decider::CheckSwitch()
+{
+    const SwitchState& state = m_inputs.switchState;
+    if (m_pair.target == Target::kLeaveAlone || state.running) {
+        return;
+    }
+    const bool isLive = m_pair.bridgeLink != nullptr;
+    if (!state.hung) {
+        m_pair.waitsForSwitch = isLive || m_pair.target == Target::kSwitch;
+    } else if (isLive) {
+        Say(Severity::kError, "the switch does not answer; " + m_pair.bridge + " is left as it is");
+        m_pair.target = Target::kLeaveAlone;
+    } else if (m_pair.target == Target::kSwitch) {
+        Say(Severity::kError, "the switch does not answer; the addresses of " + m_pair.name +
+                                  " stay on the plain interface");
+        m_pair.target = Target::kPlain;
+    }
+}
+
 Pair Decider::Decide()
 {
     if (m_inputs.request.verb == Verb::kStop) {
@@ -213,6 +234,7 @@ Pair Decider::Decide()
     GiveUpOnForeignBridge();
     CheckPort();
     RespectOnBoot();
+    CheckSwitch();
     return m_pair;
 }
 

@@ -23,6 +23,7 @@ struct Pair {
     const InterfaceFile* file = nullptr; ///< What is asked for; null: nothing is known of it.
     bool addWanted = false;              ///< What the file asks for and is missing is made.
     bool removeUnwanted = false;         ///< What earlier runs made and nothing asks for goes.
+    bool waitsForSwitch = false;         ///< Nothing can be planned until the switch was asked.
     bool takeDown = false;               ///< A stop: the link goes back to what it was, too.
 
     /** The interface that shall carry addresses and routes... */

@@ -70,7 +70,9 @@ std::string NewToken()
 void Detach()
 {
     (void)setsid();
-    (void)chdir("/");
+    if (chdir("/") != 0) {
+        _exit(1);
+    }
     const int null = open("/dev/null", O_RDWR | O_CLOEXEC);
     for (const int descriptor : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
         (void)dup2(null, descriptor);

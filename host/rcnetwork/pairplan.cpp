@@ -38,6 +38,9 @@ std::string PairPlanner::Live(const std::string& interface, const std::string& s
 
 void PairPlanner::Run()
 {
+    if (m_pair.waitsForSwitch) {
+        m_steps.needsSwitch = true;
+    }
     PlanBridge();
     PlanLinks();
     if (m_moves) {

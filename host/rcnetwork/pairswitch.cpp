@@ -29,7 +29,6 @@ void PairPlanner::PlanBridge()
         LeaveBridge();
         return;
     }
-    m_steps.needsSwitch = true;
     m_moves = !m_pair.joined;
     if (m_pair.switchBridge == nullptr) {
         MakeBridge();

@@ -44,9 +44,9 @@ void AddRecords(const Inputs& inputs, const Steps& steps, Plan& plan)
  * The order is what keeps the host reachable: addresses stand on both sides while the ports
  * change over, so that each packet finds them wherever it arrives.
  */
-void AddStages(const Inputs& inputs, const Steps& steps, Plan& plan)
+void AddStages(const Steps& steps, Plan& plan)
 {
-    if (steps.needsSwitch && !inputs.switchState.running) {
+    if (steps.needsSwitch) {
         AddStage(
             plan, StageKind::kServices, "start the switch",
             {std::string(kDatabaseService) + " start", std::string(kSwitchService) + " start"});
@@ -73,7 +73,7 @@ Plan MakePlan(const Inputs& inputs)
         PairPlanner(inputs, pair, steps, plan.remarks).Run();
     }
     RoutePlanner(inputs, pairs, steps).Run();
-    AddStages(inputs, steps, plan);
+    AddStages(steps, plan);
     AddRecords(inputs, steps, plan);
     return plan;
 }

@@ -25,7 +25,7 @@ public:
 private:
     void SayOnce(const std::vector<Remark>& remarks);
     std::optional<Inputs> Read();
-    bool StartServices();
+    void StartServices();
     bool Attempt();
     void Save(const RunState& former, const RunState& state);
     void StayWithoutSwitch();
@@ -55,6 +55,7 @@ std::optional<Inputs> Reconciler::Read()
     auto inputs = ReadInputs(m_request, remarks);
     SayOnce(remarks);
     m_canGoOn = inputs.has_value();
+    m_request.switchHung = inputs && inputs->switchState.hung;
     return inputs;
 }
 
@@ -86,21 +87,20 @@ bool Reconciler::Attempt()
     return false;
 }
 
-/** Starts the switch if the plan begins with that. @return  false when it did not start. */
-bool Reconciler::StartServices()
+/** Starts the switch if the plan begins with that. One that does not start is asked no more. */
+void Reconciler::StartServices()
 {
     const auto inputs = Read();
     if (!inputs) {
-        return false;
+        return;
     }
     const Plan plan = MakePlan(*inputs);
     if (plan.Empty() || plan.stages.front().kind != StageKind::kServices) {
-        return true;
+        return;
     }
     std::vector<Remark> remarks;
-    const bool started = ApplyPlan(plan, remarks);
+    m_request.switchHung = !ApplyPlan(plan, remarks);
     SayOnce(remarks);
-    return started;
 }
 
 /** A host that cannot have the switch is to be reachable all the same. */
@@ -143,11 +143,10 @@ bool Reconciler::ReportRest()
 
 bool Reconciler::Run()
 {
-    if (StartServices()) {
-        for (int i = 0; i < kTries && m_canGoOn; ++i) {
-            if (Attempt()) {
-                return !m_failed;
-            }
+    StartServices();
+    for (int i = 0; i < kTries && m_canGoOn; ++i) {
+        if (Attempt()) {
+            return !m_failed;
         }
     }
     if (m_canGoOn) {

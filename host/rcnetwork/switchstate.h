@@ -35,6 +35,7 @@ struct SwitchBridge {
 
 struct SwitchState {
     bool running = false; ///< Both daemons run and the database answered.
+    bool hung = false;    ///< Both daemons run and the database did not answer.
     std::map<std::string, SwitchBridge> bridges;
 
     const SwitchBridge* Find(const std::string& bridge) const;

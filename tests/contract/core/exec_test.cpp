@@ -40,7 +40,7 @@ protected:
     static std::string Program()
     {
         const Failure& failure = GetParam();
-        const std::string path = "/tmp/program";
+        std::string path = "/tmp/program";
         if (failure.body != nullptr) {
             WriteFile(path, failure.body);
             EXPECT_EQ(::chmod(path.c_str(), failure.mode), 0);

@@ -82,6 +82,11 @@ void RecordingPlatform::Vlan(const std::string& name, const std::string& parent,
     m_recorder->m_vlans[name] = vlan;
 }
 
+void RecordingPlatform::Vlan(const std::string& name, const _tag_VLIB_VLAN& record)
+{
+    m_recorder->m_vlans[name] = record;
+}
+
 void RecordingPlatform::Bond(const std::string& name, int mode,
                              const std::vector<std::string>& slaves)
 {

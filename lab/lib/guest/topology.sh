@@ -26,6 +26,7 @@ topology_build()
         net.ipv4.conf.default.rp_filter=0 net.ipv6.conf.default.accept_dad=0 \
         net.ipv6.conf.all.accept_dad=0 net.ipv6.conf.all.keep_addr_on_down=1
 
+    topology_set_cards_aside
     while read -r word name kind mac rest; do
         if [ "$word" = port ]; then
             topology_port "$name" "$kind" "$mac"
@@ -51,7 +52,7 @@ topology_port()
         ip link add "$name" address "$mac" type veth peer name "out-$name" address "$peer_mac" \
             netns outside
     else
-        # The kernel numbers cards as it finds them; the MAC tells which one is meant.
+        # The hardware address tells which of the cards is meant.
         topology_rename "$mac" "$name"
         topology_rename "$peer_mac" "out-$name"
         ip link set "out-$name" netns outside
@@ -59,19 +60,24 @@ topology_port()
     in_outside ip link set "out-$name" up
 }
 
+# The kernel numbers cards as it finds them, which takes names that ports want.
+topology_set_cards_aside()
+{
+    local folder number=0
+    for folder in /sys/class/net/eth*/; do
+        [ -d "$folder" ] || continue
+        ip link set "$(basename "$folder")" name "card$number"
+        number=$((number + 1))
+    done
+}
+
+# topology_rename MAC NAME
 topology_rename()
 {
-    local folder name
-    for folder in /sys/class/net/*/; do
-        folder="${folder%/}"
-        name="${folder##*/}"
+    local folder
+    for folder in /sys/class/net/card*/; do
         if [ "$(cat "$folder/address")" = "$1" ]; then
-            [ "$name" = "$2" ] && return
-            # The wanted name may still be another card's.
-            if [ -e "/sys/class/net/$2" ]; then
-                ip link set "$2" name "was-$2"
-            fi
-            ip link set "$name" name "$2"
+            ip link set "$(basename "$folder")" name "$2"
             return
         fi
     done

@@ -27,7 +27,7 @@ BaseHook::BaseHook(const std::string& category, const std::string& name) : m_sta
         throw std::bad_alloc();
     }
     m_state = new State{category, name, {}};
-    recorder.Open(m_state, "a hook");
+    recorder.Open(m_state, "a hook", [state = m_state] { delete state; });
 }
 
 int BaseHook::SetEnv(const std::string& key, const std::string& value)

@@ -9,6 +9,7 @@
 #include <cerrno>
 #include <filesystem>
 #include <functional>
+#include <ostream>
 
 #include <fcntl.h>
 #include <sys/mount.h>
@@ -58,6 +59,8 @@ struct Store {
         }
         return lines;
     }
+
+    friend void PrintTo(const Store& store, std::ostream* out) { *out << store.name; }
 };
 
 int AddToRegistry(const std::string& name)

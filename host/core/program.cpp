@@ -31,7 +31,7 @@ std::array<char, PATH_MAX> g_runnerPath;
         return;
     }
     char* const slash = std::strrchr(path.data(), '/');
-    const size_t folder = static_cast<size_t>(slash - path.data());
+    const auto folder = static_cast<size_t>(slash - path.data());
     if (folder + sizeof kRunnerBesideLibrary <= path.size()) {
         std::memcpy(slash, kRunnerBesideLibrary, sizeof kRunnerBesideLibrary);
         g_runnerPath = path;

@@ -18,7 +18,6 @@ namespace {
 
 using vornhost::Guarded;
 using vornhost::HookProgram;
-using vornhost::HookPrograms;
 
 /** A conversion waits for its hooks, so a hung one gets no longer. */
 constexpr std::chrono::milliseconds kHookDeadline{30000};
@@ -49,7 +48,8 @@ Environment(const std::vector<std::pair<std::string, std::string>>& variables,
     environment.push_back("HOOK_NAME=" + name);
     environment.push_back("HOOK_ACTION=" + std::to_string(action));
     for (const auto& [key, value] : variables) {
-        environment.push_back(key + "=" + value);
+        environment.push_back(key);
+        environment.back().append("=").append(value);
     }
     return environment;
 }

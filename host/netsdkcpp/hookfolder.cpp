@@ -95,7 +95,7 @@ std::optional<HookPrograms> OpenHookPrograms(const std::string& name)
     HookPrograms found;
     for (const std::string& file : SortedNames(folder)) {
         HookProgram program{
-            path + "/" + file,
+            std::string(path).append("/").append(file),
             Descriptor(::openat(folder.Get(), file.c_str(),
                                 O_RDONLY | O_NOFOLLOW | O_CLOEXEC | O_NONBLOCK | O_NOCTTY))};
         struct stat status {};

@@ -7,10 +7,10 @@
 #include "descriptor.h"
 
 #include <chrono>
+#include <csignal>
 #include <string>
 #include <vector>
 
-#include <signal.h>
 #include <spawn.h>
 #include <sys/types.h>
 

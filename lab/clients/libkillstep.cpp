@@ -1,7 +1,7 @@
 // Kills the program that it is loaded into (LD_PRELOAD) right before a chosen step of the library.
 //
-// A step is a call of one of the platform's functions below, counted from 1. KILL_AT is the number of
-// the step (0: none), KILL_LOG a file that receives the name of every step before it is taken.
+// A step is a call of one of the platform's functions below, counted from 1. KILL_AT is the number
+// of the step (0: none), KILL_LOG a file that receives the name of every step before it is taken.
 #include <csignal>
 #include <cstdlib>
 #include <dlfcn.h>
@@ -51,7 +51,7 @@ extern "C" void* LabStep(const char* name)
         ".globl " name "\n"                                                                        \
         ".type " name ", @function\n" name ":\n"                                                   \
         "endbr64\n"                                                                                \
-        "push %rdi\n push %rsi\n push %rdx\n push %rcx\n push %r8\n push %r9\n push %rax\n"         \
+        "push %rdi\n push %rsi\n push %rdx\n push %rcx\n push %r8\n push %r9\n push %rax\n"        \
         "lea 0b(%rip), %rdi\n"                                                                     \
         "call LabStep@PLT\n"                                                                       \
         "mov %rax, %r11\n"                                                                         \

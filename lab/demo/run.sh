@@ -65,6 +65,7 @@ run_and_tell()
     shift
     told='|'
     echo "\$ $*"
+    probes_next_phase
     begin="$EPOCHREALTIME"
     "$@" >"$lab_out/client-output" 2>&1 &
     pid=$!
@@ -73,7 +74,7 @@ run_and_tell()
         pause 0.01
     done
     wait "$pid" || status=$?
-    end="$EPOCHREALTIME"
+    probes_next_phase
     "$stages"
     printf '    %s  the client is done\n' "$(since_begin)"
     sed 's/^/    /' "$lab_out/client-output"
@@ -99,49 +100,19 @@ stages_of_withdrawal()
 # What the probes saw before, during and after the client's run.
 tell_traffic()
 {
-    local direction family
-    printf '    %-27s %15s %15s %15s  %s\n' "echo every 5 ms" before during after \
+    printf '    %-40s %13s %13s %13s  %s\n' "echo every 5 ms, answered" before during after \
         "longest without an answer"
-    for direction in in out; do
-        for family in 4 6; do
-            tell_probe "$direction" "$direction-$family"
-        done
-    done
-}
-
-tell_probe()
-{
-    local arrow target gap before during after
-    if [ "$1" = in ]; then arrow='second host to'; else arrow='host to'; fi
-    while IFS=$'\t' read -r target before during after; do
-        gap="$(probes_table "$2" | awk -F '\t' -v target="$target" '$1 == target { print $2 }')"
-        printf '    %-14s %-18s %9s %15s %15s  %s ms\n' "$arrow" "$target" "$before" "$during" \
-            "$after" "$gap"
-    done < <(probes_phases "$2" "$begin" "$end")
-}
-
-# Probes answered and sent in each phase: a line a target.
-probes_phases()
-{
-    awk -v begin="$2" -v end="$3" '
-        /^\[[0-9.]+\]/ {
-            time = substr($1, 2) + 0
-            phase = time < begin ? 1 : (time < end ? 2 : 3)
-            sent[$2, phase]++
-            targets[$2] = 1
-            if ($0 ~ / bytes, /) {
-                answered[$2, phase]++
-            }
+    awk -F '\t' '{
+        split($2, ends, "@")
+        if ($1 == "out") {
+            what = "host to " ends[1]
+        } else if (2 in ends) {
+            what = ends[2] " to " ends[1]
+        } else {
+            what = "second host to " ends[1]
         }
-        END {
-            for (target in targets) {
-                printf "%s", target
-                for (phase = 1; phase <= 3; phase++) {
-                    printf "\t%d of %d", answered[target, phase], sent[target, phase]
-                }
-                print ""
-            }
-        }' "$lab_out/probes/$1" | sort
+        printf "    %-40s %13s %13s %13s  %s ms\n", what, $5 " of " $6, $7 " of " $8, $9 " of " $10, $3
+    }' "$lab_out/probes"
 }
 
 # worst NAME: the longer of the outages of both directions.

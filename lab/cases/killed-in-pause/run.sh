@@ -3,7 +3,7 @@
 # The step number of the pause in the list of the last run.
 pause_step()
 {
-    awk '$2 == "sleep" { print $1; exit }' "$lab_steps"
+    awk '$2 == "sleep" && !seen++ { print $1 }' "$lab_steps"
 }
 
 holder_is_gone()

@@ -48,13 +48,15 @@ lab_run_case()
     probes_stop >/dev/null 2>&1
 }
 
-# Brings the appliance's own network up as its boot does.
+# Brings the appliance's own network up as its boot does, unless the case does without it.
 lab_boot()
 {
-    if [ -x /etc/rc.network ] && [ ! -e /lab/case/no-boot ]; then
-        /etc/rc.network start || fail "the appliance's network did not start"
-        topology_ready
+    if [ -e /lab/case/no-boot ]; then
+        return
     fi
+    [ -x /etc/rc.network ] || fail "the appliance has no /etc/rc.network"
+    /etc/rc.network start || fail "the appliance's network did not start"
+    topology_ready
 }
 
 lab_send_results()

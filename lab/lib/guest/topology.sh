@@ -24,9 +24,9 @@ topology_build()
     # Each of the outside's segments keeps to itself.
     in_outside sysctl -q -w net.ipv4.conf.all.arp_ignore=1 net.ipv4.conf.all.arp_announce=2 \
         net.ipv4.conf.default.rp_filter=0 net.ipv6.conf.default.accept_dad=0 \
-        net.ipv6.conf.all.accept_dad=0 net.ipv6.conf.all.keep_addr_on_down=1 \
-        net.ipv4.ping_group_range='0 2147483647'
+        net.ipv6.conf.all.accept_dad=0 net.ipv6.conf.all.keep_addr_on_down=1
 
+    topology_set_cards_aside
     while read -r word name kind mac rest; do
         if [ "$word" = port ]; then
             topology_port "$name" "$kind" "$mac"
@@ -52,7 +52,7 @@ topology_port()
         ip link add "$name" address "$mac" type veth peer name "out-$name" address "$peer_mac" \
             netns outside
     else
-        # The kernel numbers cards as it finds them; the MAC tells which one is meant.
+        # The hardware address tells which of the cards is meant.
         topology_rename "$mac" "$name"
         topology_rename "$peer_mac" "out-$name"
         ip link set "out-$name" netns outside
@@ -60,19 +60,24 @@ topology_port()
     in_outside ip link set "out-$name" up
 }
 
+# The kernel numbers cards as it finds them, which takes names that ports want.
+topology_set_cards_aside()
+{
+    local folder number=0
+    for folder in /sys/class/net/eth*/; do
+        [ -d "$folder" ] || continue
+        ip link set "$(basename "$folder")" name "card$number"
+        number=$((number + 1))
+    done
+}
+
+# topology_rename MAC NAME
 topology_rename()
 {
-    local folder name
-    for folder in /sys/class/net/*/; do
-        folder="${folder%/}"
-        name="${folder##*/}"
+    local folder
+    for folder in /sys/class/net/card*/; do
         if [ "$(cat "$folder/address")" = "$1" ]; then
-            [ "$name" = "$2" ] && return
-            # The wanted name may still be another card's.
-            if [ -e "/sys/class/net/$2" ]; then
-                ip link set "$2" name "was-$2"
-            fi
-            ip link set "$name" name "$2"
+            ip link set "$(basename "$folder")" name "$2"
             return
         fi
     done
@@ -112,7 +117,7 @@ topology_addresses()
                     sub("/.*", "", words[i])
                     print 6, words[i]
                 }
-            }' | sort -u
+            }'
 }
 
 # What the appliance can probe: the outside's address on every port, and the far host, which is
@@ -120,7 +125,14 @@ topology_addresses()
 topology_outside_addresses()
 {
     sed -n -e 's/^outside [^ ]* //p' -e 's/^far //p' /lab/topology/topology | tr ' ' '\n' |
-        sed 's|/.*||' | if [ "$1" = 4 ]; then grep '\.'; else grep ':'; fi
+        sed 's|/.*||' | if [ "$1" = 4 ]; then grep '\.'; else grep ':'; fi || true
+}
+
+# The address of the far host; $1 is 4 or 6.
+topology_far_address()
+{
+    sed -n 's/^far //p' /lab/topology/topology | tr ' ' '\n' | sed 's|/.*||' |
+        if [ "$1" = 4 ]; then grep '\.'; else grep ':'; fi || true
 }
 
 # Waits until every address of the appliance answers the outside.

@@ -7,7 +7,7 @@
 
 # What the guest runs of Debian's, besides busybox.
 lab_programs=(
-    bin/bash bin/dash bin/cp bin/ip sbin/bridge sbin/tc bin/ss usr/bin/chrt usr/bin/fping
+    bin/bash bin/dash bin/cp bin/ip sbin/bridge sbin/tc bin/ss usr/bin/chrt usr/bin/flock usr/bin/fping
     usr/bin/tcpdump usr/bin/uuidgen sbin/ldconfig usr/bin/getconf
     usr/bin/ovs-vsctl usr/bin/ovs-appctl usr/bin/ovs-ofctl usr/bin/ovs-dpctl
     usr/bin/ovsdb-tool usr/bin/ovsdb-client usr/sbin/ovsdb-server
@@ -114,6 +114,7 @@ lab_make_system()
         lab_copy_libraries "$root" "$place"
     done
     ln -sf dash "$root/usr/bin/sh"
+    ln -s ../bin/ip "$root/usr/sbin/ip"
     ln -s ../lib/openvswitch-switch/ovs-vswitchd "$root/usr/sbin/ovs-vswitchd"
     cp -r "$lab_debian/usr/share/openvswitch" "$root/usr/share/"
     mkdir -p "$root/etc/default" "$root/etc/iproute2"
@@ -159,7 +160,8 @@ lab_build_clients()
         if [[ $name == lib* ]]; then
             set -- "$@" -shared -fPIC -o "$root/lab/clients/$name.so" -ldl
         else
-            set -- "$@" -o "$root/lab/clients/$name" -L "$folder" -Wl,-rpath-link,"$folder" -lvornovs
+            set -- "$@" -o "$root/lab/clients/$name" -L "$folder" -Wl,-rpath-link,"$folder" \
+                -Wl,--as-needed -lvornovs
         fi
         "${CXX:-c++}" "$@" || die "the client $source does not build"
     done

@@ -26,6 +26,7 @@ public:
     std::vector<std::string> Items()
     {
         std::vector<std::string> items;
+        items.reserve(static_cast<size_t>(m_list->nItem));
         for (int index = 0; index < m_list->nItem; ++index) {
             items.emplace_back(VLIBCSzListGet(m_list, index));
         }

@@ -23,7 +23,6 @@ namespace {
 using scene::ReadFile;
 using scene::WriteFile;
 using testing::ElementsAre;
-using testing::IsEmpty;
 using vornhost::KeyValueFile;
 
 constexpr char kFolder[] = "/etc/sysconfig/network-scripts";
@@ -183,8 +182,8 @@ INSTANTIATE_TEST_SUITE_P(
         TextEdit{"AFileWithTheKeyInAnOpenLastLine", "A=1\nKEY=old", "A=1\nKEY=new"},
         TextEdit{"AFileOfCarriageReturns", "A=1\r\nKEY=old\r\n", "A=1\r\nKEY=new\r\n"},
         TextEdit{"AFileOfCarriageReturnsWithoutTheKey", "A=1\r\n", "A=1\r\nKEY=new\r\n"},
-        TextEdit{"AFileWithNulBytes", std::string("A=\0x\n\0\nKEY=old\n", 16),
-                 std::string("A=\0x\n\0\nKEY=new\n", 16)},
+        TextEdit{"AFileWithNulBytes", std::string("A=\0x\n\0\nKEY=old\n", 15),
+                 std::string("A=\0x\n\0\nKEY=new\n", 15)},
         TextEdit{"AFileWithBytesThatAreNoText", "A=\xff\xfe\nKEY=\xe4\n", "A=\xff\xfe\nKEY=new\n"}),
     [](const auto& row) { return row.param.name; });
 
@@ -340,6 +339,7 @@ TEST_F(KeyValue, IsKeptByEveryOneOfManyWritersAtOnce)
 {
     WriteFile(kPath, "# shared\n");
     std::vector<std::unique_ptr<scene::Child>> writers;
+    writers.reserve(8);
     for (int writer = 0; writer < 8; ++writer) {
         writers.push_back(std::make_unique<scene::Child>([writer] {
             int failures = 0;

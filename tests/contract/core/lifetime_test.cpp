@@ -7,13 +7,13 @@
 #include "sandbox/systemlog.h"
 
 #include <chrono>
+#include <csignal>
 #include <string>
 #include <thread>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include <signal.h>
 #include <sys/wait.h>
 #include <vornplatform/core.h>
 

@@ -107,6 +107,7 @@ TEST(FileLock, KeepsThreadsApart)
     std::atomic<int> together{0};
     std::atomic<int> taken{0};
     std::vector<std::thread> threads;
+    threads.reserve(8);
     for (int index = 0; index < 8; ++index) {
         threads.emplace_back([&] {
             for (int round = 0; round < 4; ++round) {

@@ -1,12 +1,12 @@
 #include "scene.h"
 
+#include <csignal>
 #include <cstdio>
 #include <string>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include <signal.h>
 #include <sys/wait.h>
 #include <unistd.h>
 #include <vornplatform/core.h>

@@ -3,13 +3,13 @@
 #include "support/process.h"
 
 #include <chrono>
+#include <csignal>
 #include <string>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <fcntl.h>
-#include <signal.h>
 #include <unistd.h>
 
 namespace {

@@ -6,6 +6,7 @@
 
 #include <array>
 #include <atomic>
+#include <csignal>
 #include <cstdlib>
 #include <functional>
 #include <string>
@@ -15,7 +16,6 @@
 #include <gtest/gtest.h>
 
 #include <fcntl.h>
-#include <signal.h>
 #include <sys/stat.h>
 #include <sys/time.h>
 #include <sys/wait.h>

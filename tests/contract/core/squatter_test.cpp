@@ -21,7 +21,6 @@
 namespace {
 
 using namespace std::chrono_literals;
-using scene::Child;
 using scene::IsLockFree;
 using scene::kLockPath;
 using scene::WriteFile;

@@ -5,6 +5,8 @@
 
 #include <gtest/gtest.h>
 
+#include <new>
+
 using harness::CallText;
 using harness::HarnessAllocations;
 using harness::Recorder;
@@ -21,9 +23,11 @@ BaseHook::BaseHook(const std::string& category, const std::string& name) : m_sta
 {
     const HarnessAllocations guard;
     Recorder& recorder = Recorder::Current("BaseHook");
+    if (recorder.Housekeeping(CallText("BaseHook", {category, name})).value_or(1) == 0) {
+        throw std::bad_alloc();
+    }
     m_state = new State{category, name, {}};
-    recorder.Open(m_state, "a hook");
-    (void)recorder.Housekeeping(CallText("BaseHook", {category, name}));
+    recorder.Open(m_state, "a hook", [state = m_state] { delete state; });
 }
 
 int BaseHook::SetEnv(const std::string& key, const std::string& value)

@@ -60,7 +60,8 @@ public:
 
     /**
      * Answers every call that is, or begins with, these words. The latest matching answer counts.
-     * For a function that gives a pointer, 0 stands for null; for `sleep`, the seconds not slept.
+     * For a function that gives a pointer, 0 stands for null; for `sleep`, the seconds not slept;
+     * for the making of a hook ("BaseHook"), 0 has memory run out.
      */
     void Answer(const std::string& call, int result);
 
@@ -75,6 +76,9 @@ public:
 
     /** Makes the interface a VLAN. */
     void Vlan(const std::string& name, const std::string& parent, int id);
+
+    /** The same with a record as it stands, whatever it says. */
+    void Vlan(const std::string& name, const _tag_VLIB_VLAN& record);
 
     /** Gives a bond its record; without one it cannot be read. */
     void Bond(const std::string& name, int mode, const std::vector<std::string>& slaves);

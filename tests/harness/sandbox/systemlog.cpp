@@ -36,7 +36,7 @@ std::string Readable(const std::string& datagram)
     if (stamp == 0 || text == std::string::npos) {
         return datagram;
     }
-    const int priority = std::atoi(datagram.c_str() + 1) & LOG_PRIMASK;
+    const long priority = std::strtol(datagram.c_str() + 1, nullptr, 10) & LOG_PRIMASK;
     return std::to_string(priority) + " " + datagram.substr(text + 2);
 }
 

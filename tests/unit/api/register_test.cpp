@@ -195,6 +195,16 @@ TEST(Register, TakesTheNameBackWhenTheConversionFails)
     EXPECT_EQ(ReadFile(kRegistry), std::nullopt);
 }
 
+TEST(Register, TakesTheNameBackWithoutMemoryForTheHook)
+{
+    RecordingPlatform platform;
+    platform.Answer("BaseHook", 0);
+    EXPECT_EQ(Register("a", {}), 0);
+    EXPECT_EQ(platform.Calls(), Sequence({{kLock}, kLoaded, kSaved, kSaved, {kUnlock}}));
+    EXPECT_THAT(platform.Log(), ElementsAre(Err(kFile, "Failed to CreateAll")));
+    EXPECT_EQ(ReadFile(kRegistry), std::nullopt);
+}
+
 TEST(Register, ConvertsAgainAfterAConversionThatFailed)
 {
     RecordingPlatform platform;

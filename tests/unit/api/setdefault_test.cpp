@@ -98,6 +98,17 @@ TEST(OVSSetDefault, DeletesARegistryThatCannotBeReadWithoutTheHook)
                             Err("libvornovs.cpp", "Failed to load the ovs config")));
 }
 
+TEST(OVSSetDefault, DoesNothingWithoutMemoryForTheHook)
+{
+    RecordingPlatform platform;
+    platform.Answer("BaseHook", 0);
+    WriteFile(kRegistry, "a\n");
+    OVSSetDefault();
+    EXPECT_THAT(ListFolder(kStateFolder), ElementsAre("ovs_reg.conf"));
+    EXPECT_THAT(platform.Calls(), IsEmpty());
+    EXPECT_THAT(platform.Log(), ElementsAre(Err("libvornovs.cpp", "Failed to set the default")));
+}
+
 TEST(OVSSetDefault, DoesNotMindAHookThatFails)
 {
     RecordingPlatform platform;

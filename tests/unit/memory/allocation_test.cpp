@@ -52,7 +52,8 @@ void* Allocate(std::size_t size)
 
 } // namespace
 
-void* operator new(std::size_t size)
+// Not inlined: the compiler would see memory from `new` go to `free` and warn of a mismatch.
+[[gnu::noinline]] void* operator new(std::size_t size)
 {
     void* const memory = Allocate(size);
     if (memory == nullptr) {
@@ -61,32 +62,32 @@ void* operator new(std::size_t size)
     return memory;
 }
 
-void* operator new[](std::size_t size)
+[[gnu::noinline]] void* operator new[](std::size_t size)
 {
     return operator new(size);
 }
 
-void* operator new(std::size_t size, const std::nothrow_t& /*tag*/) noexcept
+[[gnu::noinline]] void* operator new(std::size_t size, const std::nothrow_t& /*tag*/) noexcept
 {
     return Allocate(size);
 }
 
-void operator delete(void* memory) noexcept
+[[gnu::noinline]] void operator delete(void* memory) noexcept
 {
     std::free(memory);
 }
 
-void operator delete(void* memory, std::size_t /*size*/) noexcept
+[[gnu::noinline]] void operator delete(void* memory, std::size_t /*size*/) noexcept
 {
     std::free(memory);
 }
 
-void operator delete[](void* memory) noexcept
+[[gnu::noinline]] void operator delete[](void* memory) noexcept
 {
     std::free(memory);
 }
 
-void operator delete[](void* memory, std::size_t /*size*/) noexcept
+[[gnu::noinline]] void operator delete[](void* memory, std::size_t /*size*/) noexcept
 {
     std::free(memory);
 }
@@ -103,6 +104,8 @@ struct Entry {
     std::function<int()> run;
     int success;
     std::vector<int> failures;
+    /** The host is in bridge topology. */
+    bool topology = false;
 
     friend void PrintTo(const Entry& entry, std::ostream* out) { *out << entry.name; }
 };
@@ -133,7 +136,7 @@ int RunFailing(long nth, bool allThatFollow, const std::function<int()>& run)
 void PrepareHost(RecordingPlatform& platform)
 {
     platform.CarryOutFileEdits();
-    platform.Interfaces({"eth0", "eth1", "bond0", "eth0.10"});
+    platform.Interfaces({"eth0", "eth1", "bond0", "eth0.10", "full"});
     platform.Vlan("eth0.10", "eth0", 10);
     platform.Bond("bond0", 1, {"eth2", "eth3"});
     platform.Bond("ovs_bond0", 7, {"eth2", "eth3"});
@@ -144,6 +147,10 @@ void PrepareHost(RecordingPlatform& platform)
     VORNLINKAGGROPT unterminated = harness::BondRecord("", 7, {"eth2", "eth3"});
     std::memcpy(unterminated.szMaster, "ovs_bond-is-full", sizeof(unterminated.szMaster));
     platform.Bond("full", unterminated);
+    _tag_VLIB_VLAN unterminatedVlan{};
+    std::memcpy(unterminatedVlan.szIfName, "eth1.0123456789a", sizeof(unterminatedVlan.szIfName));
+    std::memcpy(unterminatedVlan.szRealName, "ovs_parent-eth1x", sizeof(unterminatedVlan.szIfName));
+    platform.Vlan("full", unterminatedVlan);
     for (const char* name : {"eth0", "eth1", "eth2", "eth3", "ovs_eth0", "ovs_eth1"}) {
         WriteFile(std::string(unit::kIfcfg) + name, "DEVICE=" + std::string(name) + "\n");
     }
@@ -176,6 +183,7 @@ TEST_P(WithoutMemory, AnswersItsFailureAndLeavesNothingOpen)
         unit::RenewFolders();
         RecordingPlatform platform;
         PrepareHost(platform);
+        platform.Answer("VLIBCFileCheckKeyValue", entry.topology ? 1 : 0);
         const int result = RunFailing(nth, allThatFollow, entry.run);
         EXPECT_THAT(platform.OpenHandles(), IsEmpty()) << "at allocation " << nth;
         EXPECT_EQ(CountCalls(platform, "VLIBCFileLockTimeByFile"),
@@ -397,6 +405,19 @@ std::vector<Entry> Managers()
          On<OVSManager>([](OVSManager& m) { return m.DestroyOVS("ovs_eth0"); }),
          0,
          {0, -1}},
+        {"CreateAllInBridgeTopology",
+         On<OVSManager>([](OVSManager& m) { return AsInt(m.CreateAll()); }),
+         1,
+         {0, 1},
+         true},
+        {"CreateLinuxVlan",
+         OnFilledManager([](OVSManager& m) { return m.CreateLinuxVlan(); }),
+         0,
+         {-1}},
+        {"RemoveLinuxVlan",
+         OnFilledManager([](OVSManager& m) { return m.RemoveLinuxVlan(); }),
+         0,
+         {-1}},
         {"CreateOVSVlan",
          OnFilledManager([](OVSManager& m) { return m.CreateOVSVlan(); }),
          0,

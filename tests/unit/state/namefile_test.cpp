@@ -9,6 +9,7 @@
 #include <cerrno>
 #include <filesystem>
 #include <functional>
+#include <ostream>
 
 #include <fcntl.h>
 #include <sys/mount.h>
@@ -58,6 +59,8 @@ struct Store {
         }
         return lines;
     }
+
+    friend void PrintTo(const Store& store, std::ostream* out) { *out << store.name; }
 };
 
 int AddToRegistry(const std::string& name)
@@ -219,16 +222,64 @@ TEST_P(SavedNames, StayAsTheyWereWhenSyncOrRenameFails)
     }
 }
 
-TEST_P(SavedNames, AreSavedWhereOwnerModeAndFolderCannotBeKeptOrSynced)
+TEST_P(SavedNames, AreWrittenInPlaceWhereOwnerOrModeCannotBeKept)
+{
+    for (const char* function : {"fchown", "fchmod"}) {
+        const RecordingPlatform platform;
+        fs::remove(GetParam().path);
+        WriteFile(GetParam().path, "eth0\n");
+        const struct stat before = StatusOf(GetParam().path);
+        FileCalls calls;
+        calls.Fail(function, EPERM);
+        EXPECT_EQ(GetParam().add("eth1"), 0) << function;
+        EXPECT_EQ(ReadFile(GetParam().path), "eth0\neth1\n") << function;
+        EXPECT_EQ(StatusOf(GetParam().path).st_ino, before.st_ino) << function;
+        EXPECT_THAT(ListFolder(kStateFolder), ElementsAre(GetParam().FileName())) << function;
+        EXPECT_THAT(platform.Log(), IsEmpty()) << function;
+    }
+}
+
+TEST_P(SavedNames, AreSavedInAFolderThatCannotBeSynced)
+{
+    const RecordingPlatform platform;
+    FileCalls calls;
+    calls.Fail("fsync", EINVAL, 2);
+    EXPECT_EQ(GetParam().add("eth0"), 0);
+    EXPECT_EQ(ReadFile(GetParam().path), "eth0\n");
+    EXPECT_THAT(platform.Log(), IsEmpty());
+}
+
+TEST_P(SavedNames, AreSavedInAFolderThatCannotBeRead)
+{
+    const RecordingPlatform platform;
+    ASSERT_EQ(chmod(kStateFolder, 0333), 0);
+    {
+        const ScopedWithoutOverride unprivileged;
+        EXPECT_EQ(GetParam().add("eth0"), 0);
+    }
+    EXPECT_EQ(ReadFile(GetParam().path), "eth0\n");
+    EXPECT_THAT(platform.Log(), IsEmpty());
+}
+
+TEST_P(SavedNames, AreReadWholeWhateverSignalsCome)
 {
     const RecordingPlatform platform;
     WriteFile(GetParam().path, "eth0\n");
     FileCalls calls;
-    calls.Fail("fchown", EPERM);
-    calls.Fail("fchmod", EPERM);
-    calls.Fail("fsync", EINVAL, 2);
+    calls.Fail("read", EINTR, 1);
     EXPECT_EQ(GetParam().add("eth1"), 0);
     EXPECT_EQ(ReadFile(GetParam().path), "eth0\neth1\n");
+}
+
+TEST_P(SavedNames, AreReadUpToAnError)
+{
+    const RecordingPlatform platform;
+    WriteFile(GetParam().path, "eth0\n");
+    FileCalls calls;
+    calls.Fail("read", EIO, 1);
+    EXPECT_EQ(GetParam().add("eth1"), 0);
+    EXPECT_EQ(ReadFile(GetParam().path), "eth1\n");
+    EXPECT_THAT(platform.Log(), IsEmpty());
 }
 
 TEST_P(SavedNames, AreWrittenInPlaceWhereTheFileIsAMountPoint)
@@ -403,6 +454,18 @@ TEST_P(SavedNames, EmptyALinksTargetAndDeleteTheLinkWhenTheLastOneLeaves)
     EXPECT_EQ(GetParam().remove("eth0"), 0);
     EXPECT_THAT(ListFolder(kStateFolder), IsEmpty());
     EXPECT_EQ(ReadFile("/usr/vorn/target"), "");
+}
+
+TEST(SavedNamesWithoutAFolder, GoIntoTheWorkingFolder)
+{
+    const RecordingPlatform platform;
+    const fs::path before = fs::current_path();
+    fs::current_path("/usr/vorn");
+    const FileCalls calls;
+    EXPECT_EQ(VORN::OVS::OVSIfsConf("names").Write("eth0"), 0);
+    EXPECT_EQ(calls.List().back(), "fsync vorn");
+    EXPECT_EQ(ReadFile("/usr/vorn/names"), "eth0\n");
+    fs::current_path(before);
 }
 
 } // namespace

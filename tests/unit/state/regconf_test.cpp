@@ -261,6 +261,14 @@ TEST(OVSRegConfLoad, FindsNoNameInAnEmptyFile)
     EXPECT_THAT(Loaded(), IsEmpty());
 }
 
+TEST(OVSRegConfLoad, FindsNoNameInAFolderOfThatName)
+{
+    const RecordingPlatform platform;
+    fs::create_directory(kRegistry);
+    EXPECT_THAT(Loaded(), IsEmpty());
+    EXPECT_THAT(platform.Log(), IsEmpty());
+}
+
 TEST(OVSRegConfLoad, FindsTheEmptyNameInALoneNewline)
 {
     const RecordingPlatform platform;

@@ -159,6 +159,13 @@ int fchmod(int descriptor, mode_t mode) noexcept
                                  : unit::Next<int (*)(int, mode_t)>("fchmod")(descriptor, mode);
 }
 
+ssize_t read(int descriptor, void* data, size_t size)
+{
+    return unit::Fails("read")
+               ? -1
+               : unit::Next<ssize_t (*)(int, void*, size_t)>("read")(descriptor, data, size);
+}
+
 ssize_t write(int descriptor, const void* data, size_t size)
 {
     if (unit::Fails("write")) {

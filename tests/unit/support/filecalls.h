@@ -18,7 +18,7 @@ public:
 
     /**
      * Makes calls fail with that error.
-     * @param function  fsync, rename, unlink, fchown, fchmod or write.
+     * @param function  fsync, rename, unlink, fchown, fchmod, read or write.
      * @param nth       which call of it, counted from 1; 0: every one.
      */
     void Fail(const std::string& function, int error, int nth = 0);

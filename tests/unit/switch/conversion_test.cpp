@@ -132,6 +132,14 @@ TEST(CreateAll, DoesNotMindAHookThatFails)
     EXPECT_THAT(platform.Log(), ElementsAre(kSpeed));
 }
 
+TEST(CreateAll, FailsWithoutMemoryForTheHook)
+{
+    RecordingPlatform platform;
+    platform.Answer("BaseHook", 0);
+    EXPECT_FALSE(OVSManager().CreateAll());
+    EXPECT_THAT(platform.Calls(), IsEmpty());
+}
+
 TEST(CreateAll, DoesNotMindGatewaysThatCannotBeCopied)
 {
     RecordingPlatform platform;

@@ -141,6 +141,14 @@ TEST(DeleteAll, FailsWhenTheBridgesCannotBeListed)
                     Err(kFile, "Fail to get all ovs switch list")));
 }
 
+TEST(DeleteAll, FailsWithoutMemoryForTheHook)
+{
+    RecordingPlatform platform;
+    platform.Answer("BaseHook", 0);
+    EXPECT_FALSE(OVSManager().DeleteAll());
+    EXPECT_THAT(platform.Calls(), IsEmpty());
+}
+
 TEST(DeleteAll, DoesNotMindGatewaysThatCannotBeCopied)
 {
     RecordingPlatform platform;

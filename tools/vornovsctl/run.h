@@ -1,0 +1,24 @@
+/**
+ * vornovsctl as a function, for main() and for tests.
+ */
+#ifndef VORNOVSCTL_RUN_H
+#define VORNOVSCTL_RUN_H
+
+#include <iosfwd>
+
+namespace vornovsctl {
+
+enum ExitStatus : int {
+    kHolds = 0,       /**< what was asked for holds now */
+    kDoesNotHold = 1, /**< it does not */
+    kWrongUsage = 2,
+    kNotRoot = 3,
+    kOutOfStep = 4, /**< clients and network do not fit together */
+};
+
+/** @return the exit status. */
+int Run(int argc, const char* const argv[], std::ostream& output, std::ostream& errors);
+
+} // namespace vornovsctl
+
+#endif

@@ -94,6 +94,7 @@ bool StartHolder(const std::string& token)
     std::array<char*, 4> arguments{program.data(), verb.data(), argument.data(), nullptr};
     std::vector<std::string> settings = ToolEnvironment();
     std::vector<char*> environment;
+    environment.reserve(settings.size() + 1);
     for (std::string& setting : settings) {
         environment.push_back(setting.data());
     }

@@ -67,7 +67,10 @@ std::optional<unsigned> MaskLength(const std::string& mask)
     const std::uint32_t bits = ntohl(address.s_addr);
     const auto length = static_cast<unsigned>(__builtin_popcount(bits));
     const std::uint32_t expected = length == 0 ? 0 : ~std::uint32_t{0} << (32U - length);
-    return bits == expected ? std::optional(length) : std::nullopt;
+    if (bits != expected) {
+        return std::nullopt;
+    }
+    return length;
 }
 
 /** Reads the keys of one file and keeps what there is to say about them. */

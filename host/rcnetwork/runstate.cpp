@@ -45,6 +45,12 @@ Json WriteRecord(const InterfaceRecord& record)
 
 } // namespace
 
+bool InterfaceRecord::Empty() const
+{
+    return addresses.empty() && routes.empty() && unchecked.empty() && !broughtUp && !formerMtu &&
+           !tag && formerSettings.empty();
+}
+
 RunState ParseRunState(const std::string& text)
 {
     RunState state;

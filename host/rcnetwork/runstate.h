@@ -27,7 +27,8 @@ struct InterfaceRecord {
     std::map<std::string, std::string> formerSettings;
 
     bool operator==(const InterfaceRecord&) const = default;
-    bool Empty() const { return *this == InterfaceRecord(); }
+    /** Whether nothing was made. */
+    bool Empty() const;
 };
 
 struct RunState {

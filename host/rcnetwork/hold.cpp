@@ -66,10 +66,9 @@ std::string NewToken()
            std::to_string(now.tv_nsec);
 }
 
-/** Gives the holder nothing of its caller's: no descriptors, no signal settings, no session. */
+/** Gives the holder nothing of its caller's: no descriptors, no folder, no signal settings. */
 void Detach()
 {
-    (void)setsid();
     if (chdir("/") != 0) {
         _exit(1);
     }
@@ -102,6 +101,8 @@ bool StartHolder(const std::string& token)
 
     const pid_t child = fork();
     if (child == 0) {
+        // Before the holder exists, so that nothing meant for its caller's group can reach it.
+        (void)setsid();
         const pid_t holder = fork();
         if (holder == 0) {
             Detach();

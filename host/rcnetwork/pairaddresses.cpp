@@ -11,6 +11,8 @@
 namespace vornhost {
 namespace {
 
+constexpr char kPromoteSecondaries[] = "ipv4.conf.promote_secondaries";
+
 bool IsLinkLocal(const Address& address)
 {
     return address.family == AF_INET6 && address.scope == RT_SCOPE_LINK;
@@ -87,10 +89,33 @@ void PairPlanner::CarryAddress(const Address& address)
     const bool settled = ToSwitch() || m_pair.port->carrier;
     m_steps.beside.addresses.push_back("addr add " +
                                        AddressArguments(address, Target(), Source(), settled));
-    if (address.family == AF_INET6 && settled && (address.flags & IFA_F_NODAD) == 0) {
-        // Left out once; from now on the address is like any other.
+    if (address.family != AF_INET6 || !settled) {
+        return;
+    }
+    // The check is left out once; from then on the address is like any other.
+    Address plain = address;
+    if (m_former.unchecked.contains(AddressText(address))) {
+        plain.flags &= ~std::uint32_t{IFA_F_NODAD};
+    }
+    if ((plain.flags & IFA_F_NODAD) == 0) {
         m_steps.move.addresses.push_back("addr change " +
-                                         AddressArguments(address, Target(), Source(), false));
+                                         AddressArguments(plain, Target(), Source(), false));
+        m_record.unchecked.insert(AddressText(address));
+    }
+}
+
+/** Finishes what an earlier run that was cut short had moved. */
+void PairPlanner::SettleAddresses()
+{
+    for (const Address& address : m_inputs.live.addresses) {
+        if (m_pair.TargetLink() != nullptr && address.index == m_pair.TargetLink()->index &&
+            (address.flags & IFA_F_NODAD) != 0 &&
+            m_former.unchecked.contains(AddressText(address)) && !IsUnwanted(address)) {
+            Address plain = address;
+            plain.flags &= ~std::uint32_t{IFA_F_NODAD};
+            m_steps.move.addresses.push_back("addr change " +
+                                             AddressArguments(plain, Target(), Target(), false));
+        }
     }
 }
 
@@ -108,6 +133,7 @@ void PairPlanner::RemoveAddresses()
     const auto& all = m_inputs.live.addresses;
     const Link* source = m_pair.SourceLink();
     const Link* target = m_pair.TargetLink();
+    bool removesFromTarget = false;
     for (auto address = all.rbegin(); address != all.rend(); ++address) {
         if (source != nullptr && address->index == source->index && m_pair.SourceStays()) {
             // A port's link-local address goes with its IPv6 stack.
@@ -116,7 +142,13 @@ void PairPlanner::RemoveAddresses()
             }
         } else if (target != nullptr && address->index == target->index && IsUnwanted(*address)) {
             RemoveAddress(*address, Target());
+            removesFromTarget = removesFromTarget || address->family == AF_INET;
         }
+    }
+    // The other addresses of a subnet stay when its first one goes.
+    if (removesFromTarget && Live(Target(), kPromoteSecondaries) == "0") {
+        Set(m_steps.settingsBefore, Target(), kPromoteSecondaries, "1");
+        Set(m_steps.settingsAfter, Target(), kPromoteSecondaries, "0");
     }
 }
 
@@ -177,6 +209,7 @@ void PairPlanner::PlanAddresses()
             AddWantedAddress(wanted);
         }
     }
+    SettleAddresses();
     RemoveAddresses();
 }
 

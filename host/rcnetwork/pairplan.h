@@ -75,6 +75,7 @@ private:
     // pairaddresses.cpp: addresses and neighbours
     void PlanAddresses();
     void CarryAddress(const Address& address);
+    void SettleAddresses();
     bool IsCarried(const Address& address) const;
     void AddWantedAddress(const WantedAddress& wanted);
     void RemoveAddresses();

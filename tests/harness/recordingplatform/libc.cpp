@@ -67,7 +67,8 @@ void syslog(int priority, const char* format, ...)
     va_end(arguments);
 }
 
-void __syslog_chk(int priority, int flag, const char* format, ...);
+void __syslog_chk(int priority, int flag, const char* format, ...)
+    __attribute__((format(printf, 3, 4)));
 
 void __syslog_chk(int priority, int /*flag*/, const char* format, ...)
 {

@@ -156,6 +156,7 @@ TEST_F(Lifetime, OfTheProgramDoesNotEndWithTheClientsGroup)
     EXPECT_TRUE(IsAlive(IdIn("/tmp/pid")));
     WriteFile("/tmp/gate", "");
     EXPECT_TRUE(Within(10s, [] { return Exists("/tmp/ended"); }));
+    EXPECT_TRUE(Within(10s, IsLockFree));
 }
 
 TEST_F(Lifetime, OfTheLockIsNotThatOfADaemonThatTheProgramLeavesBehind)

@@ -3,6 +3,7 @@
 #include "ipcommand.h"
 
 #include <algorithm>
+#include <iterator>
 
 #include <linux/if_addr.h>
 #include <linux/rtnetlink.h>
@@ -134,15 +135,15 @@ void PairPlanner::RemoveAddresses()
     const Link* source = m_pair.SourceLink();
     const Link* target = m_pair.TargetLink();
     bool removesFromTarget = false;
-    for (auto address = all.rbegin(); address != all.rend(); ++address) {
-        if (source != nullptr && address->index == source->index && m_pair.SourceStays()) {
+    for (const Address& address : std::vector<Address>(all.rbegin(), all.rend())) {
+        if (source != nullptr && address.index == source->index && m_pair.SourceStays()) {
             // A port's link-local address goes with its IPv6 stack.
-            if (!IsLinkLocal(*address)) {
-                RemoveAddress(*address, Source());
+            if (!IsLinkLocal(address)) {
+                RemoveAddress(address, Source());
             }
-        } else if (target != nullptr && address->index == target->index && IsUnwanted(*address)) {
-            RemoveAddress(*address, Target());
-            removesFromTarget = removesFromTarget || address->family == AF_INET;
+        } else if (target != nullptr && address.index == target->index && IsUnwanted(address)) {
+            RemoveAddress(address, Target());
+            removesFromTarget = removesFromTarget || address.family == AF_INET;
         }
     }
     // The other addresses of a subnet stay when its first one goes.
@@ -176,29 +177,32 @@ void PairPlanner::AddWantedAddress(const WantedAddress& wanted)
     m_record.addresses.insert(WantedText(wanted));
 }
 
-void PairPlanner::PlanAddresses()
+/** The kernel lists IPv4 addresses in the order in which they were made, IPv6 ones against it. */
+void PairPlanner::CarryAddresses()
 {
     const auto& all = m_inputs.live.addresses;
+    std::vector<Address> inOrder;
+    for (const Address& address : all) {
+        if (address.family == AF_INET) {
+            inOrder.push_back(address);
+        }
+    }
+    std::copy_if(all.rbegin(), all.rend(), std::back_inserter(inOrder),
+                 [](const Address& address) { return address.family == AF_INET6; });
     const Link* source = m_pair.SourceLink();
-    const auto carry = [&](const Address& address) {
+    for (const Address& address : inOrder) {
         if (source != nullptr && address.index == source->index && IsCarried(address)) {
             CarryAddress(address);
         }
-    };
-    // The kernel lists IPv4 addresses in the order in which they were made, IPv6 ones against it.
-    for (const Address& address : all) {
-        if (address.family == AF_INET) {
-            carry(address);
-        }
     }
-    for (auto address = all.rbegin(); address != all.rend(); ++address) {
-        if (address->family == AF_INET6) {
-            carry(*address);
-        }
-    }
+}
+
+void PairPlanner::PlanAddresses()
+{
+    CarryAddresses();
     if (m_pair.removeUnwanted && m_pair.file != nullptr) {
+        const auto& wanted = m_pair.file->addresses;
         std::erase_if(m_record.addresses, [&](const std::string& text) {
-            const auto& wanted = m_pair.file->addresses;
             return std::none_of(wanted.begin(), wanted.end(), [&](const WantedAddress& each) {
                 return WantedText(each) == text;
             });

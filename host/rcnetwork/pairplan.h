@@ -74,6 +74,7 @@ private:
 
     // pairaddresses.cpp: addresses and neighbours
     void PlanAddresses();
+    void CarryAddresses();
     void CarryAddress(const Address& address);
     void SettleAddresses();
     bool IsCarried(const Address& address) const;

@@ -123,6 +123,7 @@ TEST_F(Hold, TheHolderKeepsNothingOfItsCallersOpen)
     ASSERT_TRUE(WaitUntil([] { return Holders().size() == 1; }));
 
     const std::filesystem::path holder = Holders().at(0);
+    EXPECT_TRUE(WaitUntil([&] { return ReadFile(holder / "comm") == "rc.network\n"; }));
     std::vector<std::string> open;
     for (const auto& descriptor : std::filesystem::directory_iterator(holder / "fd")) {
         open.push_back(std::filesystem::read_symlink(descriptor.path()));

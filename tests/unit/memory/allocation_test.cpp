@@ -18,7 +18,6 @@ using testing::AnyOf;
 using testing::Contains;
 using testing::IsEmpty;
 using unit::BondModes;
-using unit::kIgnoreList;
 using unit::kInterfaceList;
 using unit::kRegistry;
 using unit::Names;

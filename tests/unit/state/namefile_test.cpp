@@ -17,7 +17,6 @@
 #include <unistd.h>
 
 using harness::Err;
-using harness::LogLine;
 using harness::RecordingPlatform;
 using testing::ElementsAre;
 using testing::IsEmpty;

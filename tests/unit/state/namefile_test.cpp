@@ -386,6 +386,20 @@ TEST_P(SavedNames, AreRefusedByAReadOnlyFolderThatHasNoSuchFile)
     EXPECT_THAT(ListFolder(kStateFolder), IsEmpty());
 }
 
+TEST_P(SavedNames, AreWrittenInPlaceInAReadOnlyFolderWhoseFileCanBeWritten)
+{
+    const RecordingPlatform platform;
+    WriteFile(GetParam().path, "eth0\n");
+    ASSERT_EQ(chmod(kStateFolder, 0555), 0);
+    {
+        const ScopedWithoutOverride unprivileged;
+        EXPECT_EQ(GetParam().add("eth1"), 0);
+    }
+    EXPECT_EQ(platform.Log(), LogLines{});
+    EXPECT_EQ(ReadFile(GetParam().path), "eth0\neth1\n");
+    EXPECT_THAT(ListFolder(kStateFolder), ElementsAre(GetParam().FileName()));
+}
+
 TEST_P(SavedNames, AreRefusedByAReadOnlyFileSystem)
 {
     const RecordingPlatform platform;

@@ -164,7 +164,7 @@ bool Applier::WriteSettings(const Stage& stage)
         std::ofstream file(path);
         file << value << "\n" << std::flush;
         if (!file) {
-            (void)Fail("cannot write " + value + " to " + path);
+            (void)Fail("cannot write " + path);
         }
     }
     return true;

@@ -95,12 +95,10 @@ void Decider::ChooseForStop()
 void Decider::ChooseForStart()
 {
     const InterfaceFile* file = File(m_pair.bridge);
-    if (file == nullptr || file->use == FileUse::kNone) {
-        ChooseWithoutBridgeFile();
-    } else if (file->use == FileUse::kBridge) {
+    if (file != nullptr && file->use == FileUse::kBridge) {
         m_pair.target = Target::kSwitch;
         m_pair.file = file;
-    } else if (!BridgeIsLive()) {
+    } else if (file == nullptr || !BridgeIsLive()) {
         ChooseWithoutBridgeFile();
     }
     if (m_pair.target == Target::kSwitch && m_inputs.request.withoutSwitch.contains(m_pair.name)) {

@@ -6,6 +6,7 @@
 #include "support/atomicfile.h"
 #include "support/keyvaluefile.h"
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <charconv>
@@ -13,6 +14,7 @@
 #include <ctime>
 #include <fstream>
 #include <sstream>
+#include <thread>
 
 #include <fcntl.h>
 #include <nlohmann/json.hpp>
@@ -66,10 +68,9 @@ std::string NewToken()
            std::to_string(now.tv_nsec);
 }
 
-/** Gives the holder nothing of its caller's: no descriptors, no signal settings, no session. */
+/** Gives the holder nothing of its caller's: no descriptors, no folder, no signal settings. */
 void Detach()
 {
-    (void)setsid();
     if (chdir("/") != 0) {
         _exit(1);
     }
@@ -95,6 +96,7 @@ bool StartHolder(const std::string& token)
     std::array<char*, 4> arguments{program.data(), verb.data(), argument.data(), nullptr};
     std::vector<std::string> settings = ToolEnvironment();
     std::vector<char*> environment;
+    environment.reserve(settings.size() + 1);
     for (std::string& setting : settings) {
         environment.push_back(setting.data());
     }
@@ -102,6 +104,8 @@ bool StartHolder(const std::string& token)
 
     const pid_t child = fork();
     if (child == 0) {
+        // Before the holder exists, so that nothing meant for its caller's group can reach it.
+        (void)setsid();
         const pid_t holder = fork();
         if (holder == 0) {
             Detach();
@@ -170,13 +174,13 @@ std::optional<Request> HeldBy(const std::string& token)
     return request;
 }
 
-void WaitForStart(std::chrono::seconds time)
+void WaitForStart(const std::string& token, std::chrono::seconds time)
 {
-    timespec until{};
-    // The time that a suspended host sleeps is no time in which a start could have come.
-    (void)clock_gettime(CLOCK_MONOTONIC, &until);
-    until.tv_sec += time.count();
-    while (clock_nanosleep(CLOCK_MONOTONIC, TIMER_ABSTIME, &until, nullptr) == EINTR) {
+    const auto deadline = std::chrono::steady_clock::now() + time;
+    while (std::chrono::steady_clock::now() < deadline && HeldBy(token)) {
+        const auto left = deadline - std::chrono::steady_clock::now();
+        std::this_thread::sleep_for(
+            std::min<std::chrono::steady_clock::duration>(left, std::chrono::seconds(1)));
     }
 }
 

@@ -35,8 +35,8 @@ void EndHold(const std::set<std::string>& names);
 /** @return  what the hold of that token holds; nullopt when it was ended or replaced. */
 std::optional<Request> HeldBy(const std::string& token);
 
-/** Sleeps as long as a start may take to come. */
-void WaitForStart(std::chrono::seconds time);
+/** Sleeps as long as a start may take to come, or until the hold of that token was ended. */
+void WaitForStart(const std::string& token, std::chrono::seconds time);
 
 } // namespace vornhost
 

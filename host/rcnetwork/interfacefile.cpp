@@ -76,6 +76,8 @@ public:
     Parser(const std::string& name, const std::string& text) : m_values(KeyValueFile::Parse(text))
     {
         m_parsed.file.name = name;
+        // A file without its last line break may be one that is being written.
+        m_parsed.file.whole = !text.empty() && text.back() == '\n';
     }
 
     ParsedFile Parse();
@@ -154,6 +156,10 @@ std::optional<unsigned> Parser::Number(const std::string& key, unsigned least, u
 
 bool Parser::IsOwnFile()
 {
+    if (m_values.Text().find('=') == std::string::npos) {
+        Leave("ignored, because it is empty");
+        return false;
+    }
     const std::string device = Value("DEVICE");
     if (!device.empty() && device != m_parsed.file.name) {
         Leave("ignored, because its DEVICE is " + device);

@@ -14,6 +14,7 @@
 
 #include <fcntl.h>
 #include <sys/file.h>
+#include <sys/prctl.h>
 #include <sys/stat.h>
 #include <syslog.h>
 #include <unistd.h>
@@ -126,7 +127,9 @@ int Stop(const Request& request)
 
 int RunHolder(const std::string& token)
 {
-    WaitForStart(HoldTime());
+    // Started through /proc it would be listed as "exe".
+    (void)prctl(PR_SET_NAME, "rc.network");
+    WaitForStart(token, HoldTime());
     const NetworkLock lock;
     if (!lock.Held()) {
         return Fail(std::string("cannot get the lock ") + kLockPath);

@@ -3,6 +3,7 @@
 #include "ipcommand.h"
 
 #include <algorithm>
+#include <iterator>
 
 #include <linux/if_addr.h>
 #include <linux/rtnetlink.h>
@@ -10,6 +11,8 @@
 
 namespace vornhost {
 namespace {
+
+constexpr char kPromoteSecondaries[] = "ipv4.conf.promote_secondaries";
 
 bool IsLinkLocal(const Address& address)
 {
@@ -87,10 +90,33 @@ void PairPlanner::CarryAddress(const Address& address)
     const bool settled = ToSwitch() || m_pair.port->carrier;
     m_steps.beside.addresses.push_back("addr add " +
                                        AddressArguments(address, Target(), Source(), settled));
-    if (address.family == AF_INET6 && settled && (address.flags & IFA_F_NODAD) == 0) {
-        // Left out once; from now on the address is like any other.
+    if (address.family != AF_INET6 || !settled) {
+        return;
+    }
+    // The check is left out once; from then on the address is like any other.
+    Address plain = address;
+    if (m_former.unchecked.contains(AddressText(address))) {
+        plain.flags &= ~std::uint32_t{IFA_F_NODAD};
+    }
+    if ((plain.flags & IFA_F_NODAD) == 0) {
         m_steps.move.addresses.push_back("addr change " +
-                                         AddressArguments(address, Target(), Source(), false));
+                                         AddressArguments(plain, Target(), Source(), false));
+        m_record.unchecked.insert(AddressText(address));
+    }
+}
+
+/** Finishes what an earlier run that was cut short had moved. */
+void PairPlanner::SettleAddresses()
+{
+    for (const Address& address : m_inputs.live.addresses) {
+        if (m_pair.TargetLink() != nullptr && address.index == m_pair.TargetLink()->index &&
+            (address.flags & IFA_F_NODAD) != 0 &&
+            m_former.unchecked.contains(AddressText(address)) && !IsUnwanted(address)) {
+            Address plain = address;
+            plain.flags &= ~std::uint32_t{IFA_F_NODAD};
+            m_steps.move.addresses.push_back("addr change " +
+                                             AddressArguments(plain, Target(), Target(), false));
+        }
     }
 }
 
@@ -108,15 +134,22 @@ void PairPlanner::RemoveAddresses()
     const auto& all = m_inputs.live.addresses;
     const Link* source = m_pair.SourceLink();
     const Link* target = m_pair.TargetLink();
-    for (auto address = all.rbegin(); address != all.rend(); ++address) {
-        if (source != nullptr && address->index == source->index && m_pair.SourceStays()) {
+    bool removesFromTarget = false;
+    for (const Address& address : std::vector<Address>(all.rbegin(), all.rend())) {
+        if (source != nullptr && address.index == source->index && m_pair.SourceStays()) {
             // A port's link-local address goes with its IPv6 stack.
-            if (!IsLinkLocal(*address)) {
-                RemoveAddress(*address, Source());
+            if (!IsLinkLocal(address)) {
+                RemoveAddress(address, Source());
             }
-        } else if (target != nullptr && address->index == target->index && IsUnwanted(*address)) {
-            RemoveAddress(*address, Target());
+        } else if (target != nullptr && address.index == target->index && IsUnwanted(address)) {
+            RemoveAddress(address, Target());
+            removesFromTarget = removesFromTarget || address.family == AF_INET;
         }
+    }
+    // The other addresses of a subnet stay when its first one goes.
+    if (removesFromTarget && Live(Target(), kPromoteSecondaries) == "0") {
+        Set(m_steps.settingsBefore, Target(), kPromoteSecondaries, "1");
+        Set(m_steps.settingsAfter, Target(), kPromoteSecondaries, "0");
     }
 }
 
@@ -144,29 +177,32 @@ void PairPlanner::AddWantedAddress(const WantedAddress& wanted)
     m_record.addresses.insert(WantedText(wanted));
 }
 
-void PairPlanner::PlanAddresses()
+/** The kernel lists IPv4 addresses in the order in which they were made, IPv6 ones against it. */
+void PairPlanner::CarryAddresses()
 {
     const auto& all = m_inputs.live.addresses;
+    std::vector<Address> inOrder;
+    for (const Address& address : all) {
+        if (address.family == AF_INET) {
+            inOrder.push_back(address);
+        }
+    }
+    std::copy_if(all.rbegin(), all.rend(), std::back_inserter(inOrder),
+                 [](const Address& address) { return address.family == AF_INET6; });
     const Link* source = m_pair.SourceLink();
-    const auto carry = [&](const Address& address) {
+    for (const Address& address : inOrder) {
         if (source != nullptr && address.index == source->index && IsCarried(address)) {
             CarryAddress(address);
         }
-    };
-    // The kernel lists IPv4 addresses in the order in which they were made, IPv6 ones against it.
-    for (const Address& address : all) {
-        if (address.family == AF_INET) {
-            carry(address);
-        }
     }
-    for (auto address = all.rbegin(); address != all.rend(); ++address) {
-        if (address->family == AF_INET6) {
-            carry(*address);
-        }
-    }
+}
+
+void PairPlanner::PlanAddresses()
+{
+    CarryAddresses();
     if (m_pair.removeUnwanted && m_pair.file != nullptr) {
+        const auto& wanted = m_pair.file->addresses;
         std::erase_if(m_record.addresses, [&](const std::string& text) {
-            const auto& wanted = m_pair.file->addresses;
             return std::none_of(wanted.begin(), wanted.end(), [&](const WantedAddress& each) {
                 return WantedText(each) == text;
             });
@@ -177,6 +213,7 @@ void PairPlanner::PlanAddresses()
             AddWantedAddress(wanted);
         }
     }
+    SettleAddresses();
     RemoveAddresses();
 }
 

@@ -74,7 +74,9 @@ private:
 
     // pairaddresses.cpp: addresses and neighbours
     void PlanAddresses();
+    void CarryAddresses();
     void CarryAddress(const Address& address);
+    void SettleAddresses();
     bool IsCarried(const Address& address) const;
     void AddWantedAddress(const WantedAddress& wanted);
     void RemoveAddresses();

@@ -23,6 +23,7 @@ InterfaceRecord Both(const InterfaceRecord& former, const InterfaceRecord& next)
     InterfaceRecord both = former;
     both.addresses.insert(next.addresses.begin(), next.addresses.end());
     both.routes.insert(next.routes.begin(), next.routes.end());
+    both.unchecked.insert(next.unchecked.begin(), next.unchecked.end());
     both.formerSettings.insert(next.formerSettings.begin(), next.formerSettings.end());
     both.broughtUp = former.broughtUp || next.broughtUp;
     both.formerMtu = former.formerMtu ? former.formerMtu : next.formerMtu;
@@ -37,6 +38,7 @@ void AddRecords(const Inputs& inputs, const Steps& steps, Plan& plan)
     for (const auto& [name, record] : steps.records) {
         plan.recordBefore.interfaces[name] = Both(plan.recordBefore.interfaces[name], record);
         plan.recordAfter.interfaces[name] = record;
+        plan.recordAfter.interfaces[name].unchecked.clear();
     }
 }
 

@@ -10,6 +10,7 @@
 #include <cerrno>
 #include <cstdio>
 #include <cstring>
+#include <utility>
 
 namespace vornhost {
 namespace {
@@ -19,7 +20,7 @@ constexpr mode_t kPrivate = 0600;
 
 class Reconciler {
 public:
-    explicit Reconciler(const Request& request) : m_request(request) {}
+    explicit Reconciler(Request request) : m_request(std::move(request)) {}
     bool Run();
 
 private:

@@ -19,6 +19,7 @@ InterfaceRecord ReadRecord(const Json& object)
     InterfaceRecord record;
     record.addresses = object.at("addresses").get<std::set<std::string>>();
     record.routes = object.at("routes").get<std::set<std::string>>();
+    record.unchecked = object.at("unchecked").get<std::set<std::string>>();
     record.broughtUp = object.at("broughtUp").get<bool>();
     record.formerMtu = ReadNumber(object, "formerMtu");
     record.tag = ReadNumber(object, "tag");
@@ -30,6 +31,7 @@ Json WriteRecord(const InterfaceRecord& record)
 {
     Json object = {{"addresses", record.addresses},
                    {"routes", record.routes},
+                   {"unchecked", record.unchecked},
                    {"broughtUp", record.broughtUp},
                    {"formerSettings", record.formerSettings}};
     if (record.formerMtu) {

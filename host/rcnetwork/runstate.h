@@ -18,7 +18,9 @@ constexpr char kRunStatePath[] = "/run/vornovs/network.json";
 struct InterfaceRecord {
     std::set<std::string> addresses; ///< "192.0.2.1/24"
     std::set<std::string> routes;    ///< As RouteKeyText() writes them, without the interface.
-    bool broughtUp = false;          ///< The link was down before.
+    /** IPv6 addresses that are being moved without the check for duplicates. */
+    std::set<std::string> unchecked;
+    bool broughtUp = false; ///< The link was down before.
     std::optional<unsigned> formerMtu;
     std::optional<unsigned> tag; ///< The VLAN tag that was set on the bridge's port.
     /** Settings of the plain interface as they were, by name, such as "ipv6.conf.accept_ra". */

@@ -253,7 +253,7 @@ void ReadRouteAttributes(const rtmsg& header, const Attributes& attributes, Rout
         const auto* info = static_cast<const rta_cacheinfo*>(nla_data(attributes[RTA_CACHEINFO]));
         // The kernel counts in ticks of a hundredth of a second here, whatever its own clock is.
         route.expiresSeconds =
-            info->rta_expires > 0 ? static_cast<std::uint32_t>(info->rta_expires) / 100 + 1 : 0;
+            info->rta_expires > 0 ? (static_cast<std::uint32_t>(info->rta_expires) + 99) / 100 : 0;
     }
     if (attributes[RTA_PREF] != nullptr) {
         route.preference = nla_get_u8(attributes[RTA_PREF]);

@@ -66,11 +66,9 @@ bool BondManager::CheckModeSupport(VORN_LINK_AGGR_MODE mode)
 
 VORN_LINK_AGGR_MODE BondManager::DefaultModeConvert(VORN_LINK_AGGR_MODE mode)
 {
-    const int index = static_cast<int>(mode) - 1;
-    if (index < 0 || index >= static_cast<int>(kConvertedModes.size())) {
-        return VORN_LINK_AGGR_NONE;
-    }
-    return kConvertedModes[static_cast<std::size_t>(index)];
+    // Unsigned: 0 and everything negative land beyond the table's end.
+    const std::size_t index = static_cast<unsigned int>(mode) - 1U;
+    return index < kConvertedModes.size() ? kConvertedModes[index] : VORN_LINK_AGGR_NONE;
 }
 
 bool BondManager::Get(const std::string& name, VORNLINKAGGROPT* out)

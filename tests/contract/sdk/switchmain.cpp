@@ -68,20 +68,28 @@ int RunTests()
     return RUN_ALL_TESTS();
 }
 
+// Goes on in a new process; this one only waits for it. No exit handlers run here: they may want
+// a process of their own, which cannot be had any more.
+void ContinueInChild()
+{
+    std::cout << std::flush;
+    const pid_t child = fork();
+    if (child < 0) {
+        throw std::runtime_error(std::string("fork: ") + std::strerror(errno));
+    }
+    if (child > 0) {
+        _exit(WaitFor(child));
+    }
+}
+
 // The first process of the new process namespace takes in the daemons, and ends them by ending.
-int RunBelowInit()
+void ContinueBelowInit()
 {
     if (unshare(CLONE_NEWPID) != 0) {
         throw std::runtime_error(std::string("unshare: ") + std::strerror(errno));
     }
-    const pid_t init = fork();
-    if (init != 0) {
-        return WaitFor(init);
-    }
-    const pid_t tests = fork();
-    const int status = tests == 0 ? RunTests() : WaitFor(tests);
-    std::cout << std::flush;
-    _exit(status);
+    ContinueInChild();
+    ContinueInChild();
 }
 
 } // namespace
@@ -97,7 +105,8 @@ int main(int argc, char** argv)
         options.network = true;
         harness::EnterSandbox(options);
         AddOpenVSwitch();
-        return RunBelowInit();
+        ContinueBelowInit();
+        return RunTests();
     } catch (const std::exception& error) {
         std::cerr << error.what() << '\n';
         return 1;

@@ -44,7 +44,7 @@ FILE* OpenPipe(Recorder& recorder, const std::string& call, const std::string& c
     }
     (void)std::fwrite(pipe.text.data(), 1, pipe.text.size(), stream);
     std::rewind(stream);
-    recorder.Open(stream, "pipe of " + command);
+    recorder.Open(stream, "pipe of " + command, [stream] { (void)std::fclose(stream); });
     recorder.m_pipes[stream] = pipe;
     return stream;
 }

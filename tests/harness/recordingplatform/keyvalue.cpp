@@ -41,10 +41,9 @@ int CarryOut(const Recorder& recorder, const std::string& path, const KeyValues&
 void MoveHash(Recorder& recorder, VLIBCSzHash** hash)
 {
     auto* const moved = new VLIBCSzHash(std::move(**hash));
-    const std::string what = recorder.m_open[*hash];
     recorder.m_open.erase(*hash);
     delete *hash;
-    recorder.Open(moved, what);
+    recorder.Open(moved, "a hash", [moved] { delete moved; });
     *hash = moved;
 }
 
@@ -163,7 +162,7 @@ VLIBCSzHash* VLIBCSzHashAlloc(int size)
         return nullptr;
     }
     auto* const hash = new VLIBCSzHash;
-    recorder.Open(hash, "a hash");
+    recorder.Open(hash, "a hash", [hash] { delete hash; });
     return hash;
 }
 
@@ -213,7 +212,7 @@ VLIBCSzList* VLIBCSzListAlloc(int size)
     }
     auto* const list = new List;
     list->nItem = 0;
-    recorder.Open(list, "a list");
+    recorder.Open(list, "a list", [list] { delete list; });
     return list;
 }
 

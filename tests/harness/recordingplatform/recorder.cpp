@@ -4,6 +4,7 @@
 
 #include <cstdio>
 #include <cstdlib>
+#include <utility>
 
 #include <sys/uio.h>
 #include <unistd.h>
@@ -119,8 +120,9 @@ Recorder::Recorder()
 Recorder::~Recorder()
 {
     s_current = nullptr;
-    for (const auto& [handle, what] : m_open) {
-        ADD_FAILURE() << "left open: " << what;
+    for (const auto& [handle, open] : m_open) {
+        ADD_FAILURE() << "left open: " << open.what;
+        open.release();
     }
     if (m_heldLock != -1) {
         ADD_FAILURE() << "left locked: the lock file, handle " << m_heldLock;
@@ -158,9 +160,9 @@ std::optional<int> Recorder::AnswerFor(const std::string& text)
     return answer;
 }
 
-void Recorder::Open(const void* handle, const std::string& what)
+void Recorder::Open(const void* handle, const std::string& what, std::function<void()> release)
 {
-    m_open[handle] = what;
+    m_open[handle] = {what, std::move(release)};
 }
 
 bool Recorder::IsOpen(const void* handle, const std::string& function) const

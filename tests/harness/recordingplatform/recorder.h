@@ -7,6 +7,7 @@
 #include "recordingplatform/recordingplatform.h"
 
 #include <cstdarg>
+#include <functional>
 #include <map>
 #include <optional>
 #include <set>
@@ -54,7 +55,8 @@ public:
     /** The same for the handling of memory, which Calls() leaves out. */
     std::optional<int> Housekeeping(const std::string& text);
 
-    void Open(const void* handle, const std::string& what);
+    /** @param release  frees the handle should it be left open. */
+    void Open(const void* handle, const std::string& what, std::function<void()> release);
     /** Forgets a handle; the test fails, and false is the answer, when it is not open. */
     bool Close(const void* handle, const std::string& function);
     /** The test fails, and false is the answer, when the handle is not open. */
@@ -84,7 +86,11 @@ public:
     std::vector<std::string> m_calls;
     std::vector<std::string> m_allCalls;
     std::vector<LogLine> m_log;
-    std::map<const void*, std::string> m_open;
+    struct OpenHandle {
+        std::string what;
+        std::function<void()> release;
+    };
+    std::map<const void*, OpenHandle> m_open;
 
     std::vector<std::pair<std::string, ProgramOutput>> m_outputs;
     std::map<const void*, OpenPipe> m_pipes;

@@ -138,8 +138,8 @@ void RecordingPlatform::Forget()
 std::vector<std::string> RecordingPlatform::OpenHandles() const
 {
     std::vector<std::string> result;
-    for (const auto& [handle, what] : m_recorder->m_open) {
-        result.push_back(what);
+    for (const auto& [handle, open] : m_recorder->m_open) {
+        result.push_back(open.what);
     }
     if (m_recorder->m_heldLock != -1) {
         result.emplace_back("the lock file");

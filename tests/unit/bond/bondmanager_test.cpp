@@ -3,6 +3,7 @@
 #include "support/support.h"
 
 #include <cstring>
+#include <ostream>
 
 using harness::Err;
 using harness::RecordingPlatform;
@@ -28,6 +29,8 @@ struct ModeRow {
     bool supported;
     int converted;
     std::string options;
+
+    friend void PrintTo(const ModeRow& row, std::ostream* out) { *out << "mode " << row.mode; }
 };
 
 class Modes : public testing::TestWithParam<ModeRow> {};

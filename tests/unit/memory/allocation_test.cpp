@@ -18,7 +18,6 @@ using testing::AnyOf;
 using testing::Contains;
 using testing::IsEmpty;
 using unit::BondModes;
-using unit::kIgnoreList;
 using unit::kInterfaceList;
 using unit::kRegistry;
 using unit::Names;
@@ -52,7 +51,8 @@ void* Allocate(std::size_t size)
 
 } // namespace
 
-void* operator new(std::size_t size)
+// Not inlined: the compiler would see memory from `new` go to `free` and warn of a mismatch.
+[[gnu::noinline]] void* operator new(std::size_t size)
 {
     void* const memory = Allocate(size);
     if (memory == nullptr) {
@@ -61,32 +61,32 @@ void* operator new(std::size_t size)
     return memory;
 }
 
-void* operator new[](std::size_t size)
+[[gnu::noinline]] void* operator new[](std::size_t size)
 {
     return operator new(size);
 }
 
-void* operator new(std::size_t size, const std::nothrow_t& /*tag*/) noexcept
+[[gnu::noinline]] void* operator new(std::size_t size, const std::nothrow_t& /*tag*/) noexcept
 {
     return Allocate(size);
 }
 
-void operator delete(void* memory) noexcept
+[[gnu::noinline]] void operator delete(void* memory) noexcept
 {
     std::free(memory);
 }
 
-void operator delete(void* memory, std::size_t /*size*/) noexcept
+[[gnu::noinline]] void operator delete(void* memory, std::size_t /*size*/) noexcept
 {
     std::free(memory);
 }
 
-void operator delete[](void* memory) noexcept
+[[gnu::noinline]] void operator delete[](void* memory) noexcept
 {
     std::free(memory);
 }
 
-void operator delete[](void* memory, std::size_t /*size*/) noexcept
+[[gnu::noinline]] void operator delete[](void* memory, std::size_t /*size*/) noexcept
 {
     std::free(memory);
 }

@@ -9,6 +9,7 @@
 #include <cerrno>
 #include <filesystem>
 #include <functional>
+#include <ostream>
 
 #include <fcntl.h>
 #include <sys/mount.h>
@@ -16,7 +17,6 @@
 #include <unistd.h>
 
 using harness::Err;
-using harness::LogLine;
 using harness::RecordingPlatform;
 using testing::ElementsAre;
 using testing::IsEmpty;
@@ -58,6 +58,8 @@ struct Store {
         }
         return lines;
     }
+
+    friend void PrintTo(const Store& store, std::ostream* out) { *out << store.name; }
 };
 
 int AddToRegistry(const std::string& name)

@@ -2,6 +2,8 @@
 
 #include "support/support.h"
 
+#include <ostream>
+
 using harness::Err;
 using harness::RecordingPlatform;
 using testing::ElementsAre;
@@ -19,6 +21,8 @@ struct PortCall {
     bool (OVSManager::*run)(const std::string&, const std::string&) const;
     std::string verb;
     std::string word;
+
+    friend void PrintTo(const PortCall& call, std::ostream* out) { *out << call.name; }
 };
 
 class ManagerPort : public testing::TestWithParam<PortCall> {

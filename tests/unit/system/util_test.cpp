@@ -4,6 +4,8 @@
 
 #include "support/support.h"
 
+#include <ostream>
+
 using harness::Err;
 using harness::RecordingPlatform;
 using testing::ElementsAre;
@@ -150,6 +152,8 @@ TEST(StopOVSBaemon, TakesAPositiveAnswerAsSuccess)
 struct NetworkCall {
     std::string verb;
     bool (*run)(const std::vector<std::string>&);
+
+    friend void PrintTo(const NetworkCall& call, std::ostream* out) { *out << call.verb; }
 };
 
 class Network : public testing::TestWithParam<NetworkCall> {};

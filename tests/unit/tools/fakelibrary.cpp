@@ -19,7 +19,7 @@ int Act(const std::string& what, const std::map<std::string, std::string>& bondM
 {
     std::string call = what;
     for (const auto& [bond, mode] : bondModes) {
-        call += " " + bond + "=" + mode;
+        call.append(" ").append(bond).append("=").append(mode);
     }
     Host().calls.push_back(call);
     struct sigaction now {};
@@ -60,7 +60,7 @@ bool IsDaemonAlive()
 
 bool IsInterfaceExist(const std::string& name)
 {
-    return unit::Host().devices.count(name) > 0;
+    return unit::Host().devices.contains(name);
 }
 
 OVSRegConf::OVSRegConf() = default;

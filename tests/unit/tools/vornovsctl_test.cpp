@@ -32,6 +32,7 @@ Outcome Ctl(std::vector<std::string> words)
 {
     words.insert(words.begin(), "vornovsctl");
     std::vector<const char*> argv;
+    argv.reserve(words.size());
     for (const std::string& word : words) {
         argv.push_back(word.c_str());
     }
@@ -126,7 +127,7 @@ TEST_F(Vornovsctl, RegisterOfAClientThatIsRegisteredChangesNothing)
     Host().act = [](FakeHost&) { return 1; };
 
     EXPECT_EQ(Ctl({"register", "lab"}),
-              (Outcome{0, "'lab' was registered already; nothing was changed.\n", ""}));
+              (Outcome{5, "", "vornovsctl: 'lab' was registered already; nothing was changed.\n"}));
 }
 
 TEST_F(Vornovsctl, RegisterFailsOnAHostThatCannotRunTheSwitch)
@@ -227,7 +228,7 @@ TEST_F(Vornovsctl, UnregisterOfAnUnknownClientChangesNothing)
     Host().act = [](FakeHost&) { return 1; };
 
     EXPECT_EQ(Ctl({"unregister", "lab"}),
-              (Outcome{0, "'lab' was not registered; nothing was changed.\n", ""}));
+              (Outcome{5, "", "vornovsctl: 'lab' was not registered; nothing was changed.\n"}));
 }
 
 TEST_F(Vornovsctl, UnregisterFailsWhileTheClientIsStillRegistered)

@@ -1,0 +1,31 @@
+/**
+ * A host on paper: a folder with its configuration files and "world.json", which holds what the
+ * kernel, the switch and the gateway store know.
+ */
+#ifndef VORNOVS_TESTS_CONTRACT_RCNETWORK_WORLD_H
+#define VORNOVS_TESTS_CONTRACT_RCNETWORK_WORLD_H
+
+#include "rcnetwork/plan.h"
+
+#include <string>
+#include <vector>
+
+namespace contract {
+
+struct World {
+    vornhost::Inputs inputs;
+    std::vector<vornhost::Remark> remarks; ///< What the parser said of the files.
+};
+
+/** Reads such a folder; throws what goes wrong. */
+World ReadWorld(const std::string& folder);
+
+/** The plan as "rc.network --dry-run" prints it, and below it what is said. */
+std::string Describe(const vornhost::Plan& plan, const std::vector<vornhost::Remark>& remarks);
+
+/** @return  the file's text; throws when there is no such file. */
+std::string ReadText(const std::string& path);
+
+} // namespace contract
+
+#endif

@@ -54,7 +54,7 @@ std::optional<std::string> Resolve(const std::string& path)
     const std::unique_ptr<char, void (*)(void*)> resolved(::realpath(path.c_str(), nullptr),
                                                           std::free);
     if (resolved != nullptr) {
-        return resolved.get();
+        return std::string(resolved.get());
     }
     struct stat status {};
     if (errno == ENOENT && ::lstat(path.c_str(), &status) != 0 && errno == ENOENT) {

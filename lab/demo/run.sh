@@ -13,7 +13,7 @@ heading()
 tell_host()
 {
     echo "interfaces and addresses:"
-    ip -brief address show | grep -v '^lo ' | sed 's/^/    /'
+    ip -brief address show | grep -v '^lo ' | sed -E 's/^([^ ]*)@[^ ]*/\1    /; s/^/    /' | sort
     echo "routes:"
     { ip -4 route show; ip -6 route show | grep -v '^fe80'; } | sed 's/^/    /'
     echo "bridges:"

@@ -108,13 +108,21 @@ bool KeepOwnerAndMode(int descriptor, const struct stat& old)
            ::fchmod(descriptor, old.st_mode & 07777U) == 0;
 }
 
+/** What is left when an existing target may be written and no file can be made beside it. */
+bool KeepOrWriteInPlace(const std::string& path, std::string_view text, int error)
+{
+    // The folder is closed to us. Anything else, such as a full disk, is a write error: it leaves
+    // the target whole.
+    const bool closed = error == EACCES || error == EPERM;
+    return !closed || WriteInPlace(path, text);
+}
+
 /** @param old  the target's status, or null when there is no target yet. */
 bool ReplaceByRename(const std::string& path, std::string_view text, const struct stat* old)
 {
     Replacement replacement(path);
     if (!replacement) {
-        // An existing target opened for writing: this is a write error, which leaves it whole.
-        return old != nullptr;
+        return old != nullptr && KeepOrWriteInPlace(path, text, errno);
     }
     if (old != nullptr && !KeepOwnerAndMode(replacement.Get(), *old)) {
         return WriteInPlace(path, text);

@@ -15,11 +15,12 @@ constexpr char kAbout[] =
 
 constexpr char kExitStatus[] =
     "Exit status:\n"
-    "  0  what was asked for holds now, whether or not it held before\n"
-    "  1  it does not hold; the message says what does\n"
+    "  0  done\n"
+    "  1  not done; the message says what holds instead\n"
     "  2  the command line is wrong; nothing was done\n"
     "  3  not run by root; nothing was done\n"
     "  4  the clients and the network do not fit together; the message says what to do\n"
+    "  5  nothing to do: the name was registered already, perhaps by another program, or was not\n"
     "\n"
     "The system log tells the reasons. 'vornovsctl COMMAND --help' tells more of a command.";
 

@@ -65,8 +65,9 @@ public:
         }
         const int result = VORN::OVS::Register(m_command.client, m_command.bondModes);
         if (result == 1) {
-            m_output << m_client << " was registered already; nothing was changed.\n";
-            return kHolds;
+            m_errors << "vornovsctl: " << m_client
+                     << " was registered already; nothing was changed.\n";
+            return kNothingToDo;
         }
         if (result > 1) {
             m_errors << "vornovsctl: this host cannot run Open vSwitch (reason " << result
@@ -90,8 +91,8 @@ public:
         }
         const int result = VORN::OVS::UnRegister(m_command.client, m_command.bondModes);
         if (result == 1) {
-            m_output << m_client << " was not registered; nothing was changed.\n";
-            return kHolds;
+            m_errors << "vornovsctl: " << m_client << " was not registered; nothing was changed.\n";
+            return kNothingToDo;
         }
 
         const HostState after = ReadHostState();

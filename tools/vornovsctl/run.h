@@ -9,11 +9,12 @@
 namespace vornovsctl {
 
 enum ExitStatus : int {
-    kHolds = 0,       /**< what was asked for holds now */
+    kHolds = 0,       /**< done: what was asked for holds now */
     kDoesNotHold = 1, /**< it does not */
     kWrongUsage = 2,
     kNotRoot = 3,
-    kOutOfStep = 4, /**< clients and network do not fit together */
+    kOutOfStep = 4,   /**< clients and network do not fit together */
+    kNothingToDo = 5, /**< it held before, perhaps by somebody else's doing */
 };
 
 /** @return the exit status. */

@@ -10,14 +10,14 @@ HOOK
 chmod 755 "$hook"
 
 step "Reset a host without a client"
-expect_success /lab/clients/factoryreset
+expect_success vornovsctl reset --yes
 expect_failure test -e /run/lab/hook
 
 step "Reset a host on the switch"
 expect_success vornovsctl register alpha
 rm -f /run/lab/hook
 probes_start
-expect_success /lab/clients/factoryreset
+expect_success vornovsctl reset --yes
 expect_equal "what the hook was told" delete "$(cat /run/lab/hook)"
 for file in ovs_reg.conf ovs_interface.conf ovs_ignore.conf; do
     expect_failure test -e "$lab_state/$file"

@@ -58,13 +58,16 @@ process_ended()
     ! process_runs "$1"
 }
 
-# Pids of the processes with this program name, one a line; the name is the kernel's, 15 bytes.
+# Pids of the processes with this program name, one a line: the kernel's name for it, which is cut to
+# 15 bytes, or the one that it was called by.
 processes_named()
 {
-    local folder name
+    local folder name called
     for folder in /proc/[0-9]*; do
-        read -r name 2>/dev/null <"$folder/comm" || continue
-        if [ "$name" = "$1" ]; then
+        { read -r name <"$folder/comm"; } 2>/dev/null || continue
+        called=''
+        { read -r -d '' called <"$folder/cmdline"; } 2>/dev/null || true
+        if [ "$name" = "$1" ] || [ "${called##*/}" = "$1" ]; then
             echo "${folder#/proc/}"
         fi
     done

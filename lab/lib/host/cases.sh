@@ -21,7 +21,7 @@ lab_case_deadline()
     if [[ -f $file ]]; then
         cat "$file"
     else
-        echo 300
+        echo 600
     fi
 }
 

@@ -196,8 +196,11 @@ lab_layer()
 # Makes the system and product layers; sets $lab_kernel and $lab_image.
 lab_make_image()
 {
-    local here=${BASH_SOURCE[0]} system product
+    local here=${BASH_SOURCE[0]} system product turn
     mkdir -p "$lab_layers"
+    # Two runs of the lab share what they make.
+    exec {turn}>"$lab_build/.turn"
+    flock "$turn"
     lab_fetch_packages
     lab_kernel=$(echo "$lab_debian"/boot/vmlinuz-*)
 
@@ -212,6 +215,7 @@ lab_make_image()
         cat "$system" "$product" >"$lab_image.new"
         mv "$lab_image.new" "$lab_image"
     fi
+    exec {turn}>&-
 }
 
 # Everything that decides what the product layer holds.
@@ -247,6 +251,7 @@ lab_make_guest_image()
 lab_build_release()
 {
     say_note "building the release"
+    ensure_host_packages "${build_packages[@]}"
     mkdir -p "$lab_build"
     (cd "$lab_root" && cmake --preset release &&
         cmake --build --preset release --target src/all host/all tools/all) \

@@ -13,6 +13,8 @@ lab_layers=$lab_build/layers
 . "$lab_root/scripts/lib/say.sh"
 # shellcheck source=scripts/lib/hostpackages.sh
 . "$lab_root/scripts/lib/hostpackages.sh"
+# shellcheck source=scripts/lib/buildpackages.sh
+. "$lab_root/scripts/lib/buildpackages.sh"
 
 # A name for the content of files: paths on standard input, one a line.
 fingerprint()

@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <array>
+#include <chrono>
 #include <initializer_list>
 #include <memory>
 #include <random>
@@ -338,23 +339,28 @@ TEST_F(KeyValue, OfAHashMakesTheFileUnlessThereIsNothingToWrite)
 TEST_F(KeyValue, IsKeptByEveryOneOfManyWritersAtOnce)
 {
     WriteFile(kPath, "# shared\n");
+    (void)::unlink("/tmp/gate");
     std::vector<std::unique_ptr<scene::Child>> writers;
     writers.reserve(8);
     for (int writer = 0; writer < 8; ++writer) {
         writers.push_back(std::make_unique<scene::Child>([writer] {
-            int failures = 0;
-            for (int key = 0; key < 10; ++key) {
+            int failures =
+                scene::Within(std::chrono::seconds(10), [] { return scene::Exists("/tmp/gate"); })
+                    ? 0
+                    : 100;
+            for (int key = 0; key < 50; ++key) {
                 const std::string name = "K" + std::to_string(writer) + "_" + std::to_string(key);
                 failures += VLIBCFileSetKeyValue(kPath, name.c_str(), "v", 0) == 0 ? 0 : 1;
             }
             return failures;
         }));
     }
+    WriteFile("/tmp/gate", ""); // all at once
     for (const auto& writer : writers) {
         EXPECT_EQ(writer->Wait(), 0);
     }
     const std::string text = ReadFile(kPath);
-    EXPECT_EQ(std::count(text.begin(), text.end(), '\n'), 81);
+    EXPECT_EQ(std::count(text.begin(), text.end(), '\n'), 401);
     EXPECT_THAT(scene::Names(kFolder), ElementsAre("ifcfg-eth0"));
 }
 

@@ -127,6 +127,22 @@ TEST_F(Lifetime, OfTheLockIsThatOfTheProgramWhenTheClientIsKilled)
     EXPECT_EQ(ReadFile("/tmp/ended"), "end\n");
 }
 
+TEST_F(Lifetime, OfTheLockIsThatOfTheProgramWhenItsKeeperIsAskedToEndToo)
+{
+    const std::string program =
+        MakeScript("/tmp/program", std::string("echo $PPID > /tmp/keeper; ") + kUntilGate);
+    Child client([&] { return LockAndRun(program); });
+    ASSERT_TRUE(Within(10s, [] { return IdIn("/tmp/pid") > 0; }));
+    for (const int signal : {SIGTERM, SIGHUP, SIGINT}) {
+        ::kill(IdIn("/tmp/keeper"), signal);
+    }
+    client.Kill();
+    (void)client.Wait();
+    EXPECT_FALSE(Within(100ms, IsLockFree));
+    WriteFile("/tmp/gate", "");
+    EXPECT_TRUE(Within(10s, IsLockFree));
+}
+
 TEST_F(Lifetime, OfTheProgramDoesNotEndWithTheClientsGroup)
 {
     const std::string program = MakeScript("/tmp/program", kUntilGate);
@@ -140,6 +156,7 @@ TEST_F(Lifetime, OfTheProgramDoesNotEndWithTheClientsGroup)
     EXPECT_TRUE(IsAlive(IdIn("/tmp/pid")));
     WriteFile("/tmp/gate", "");
     EXPECT_TRUE(Within(10s, [] { return Exists("/tmp/ended"); }));
+    EXPECT_TRUE(Within(10s, IsLockFree));
 }
 
 TEST_F(Lifetime, OfTheLockIsNotThatOfADaemonThatTheProgramLeavesBehind)

@@ -203,6 +203,27 @@ TEST(FileLock, SurvivesThatTheRunFolderIsEmptied)
     EXPECT_EQ(VLIBCFileUnlockByFile(handle), 0);
 }
 
+TEST(FileLock, KeepsOthersOutAfterTheRunFolderWasEmptiedWhileItWasWaitedFor)
+{
+    int first = -1;
+    ASSERT_EQ(Lock(0, &first), 0);
+    std::thread administrator([&] {
+        std::this_thread::sleep_for(100ms);
+        for (const std::string& name : scene::Names("/run/vornovs")) {
+            ::unlink(("/run/vornovs/" + name).c_str());
+        }
+        // Nobody is kept out by the client's file alone.
+        ::unlink(kLockPath);
+        (void)VLIBCFileUnlockByFile(first);
+    });
+    int handle = -1;
+    EXPECT_EQ(Lock(10, &handle), 0);
+    administrator.join();
+    ::unlink(kLockPath);
+    EXPECT_FALSE(IsLockFree());
+    EXPECT_EQ(VLIBCFileUnlockByFile(handle), 0);
+}
+
 TEST(FileLock, IsNotReleasedTwiceNorUnderAStrangeHandle)
 {
     int handle = -1;

@@ -204,6 +204,21 @@ TEST(Program, GetsNoDescriptorButTheStandardOnes)
     EXPECT_EQ(VLIBCFileUnlockByFile(handle), 0);
 }
 
+TEST(Program, WritesNothingIntoTheClientsDescriptors)
+{
+    const std::string script = MakeScript("/tmp/program", "echo out; echo err >&2");
+    EXPECT_EQ(scene::ResultOf([&] {
+                  // Inherited by careless programs: at the numbers of the runner's own, too.
+                  const int file = ::open("/tmp/ours", O_RDWR | O_CREAT | O_TRUNC, 0600); // NOLINT
+                  for (int number = 0; number < 16; ++number) {
+                      (void)::dup2(file, number);
+                  }
+                  return VLIBCExec(script.c_str(), nullptr) == 0 ? 0 : 1;
+              }),
+              0);
+    EXPECT_EQ(scene::ReadFile("/tmp/ours"), "");
+}
+
 TEST(Program, IsIndependentOfTheClientsMaskAndFolder)
 {
     const mode_t mask = ::umask(0);

@@ -19,15 +19,18 @@ struct BaseHook::State {
     std::vector<std::string> environment;
 };
 
-BaseHook::BaseHook(const std::string& category, const std::string& name) : m_state(nullptr)
+BaseHook::BaseHook(const std::string& category, const std::string& name)
+    : m_state([&] {
+          const HarnessAllocations guard;
+          Recorder& recorder = Recorder::Current("BaseHook");
+          if (recorder.Housekeeping(CallText("BaseHook", {category, name})).value_or(1) == 0) {
+              throw std::bad_alloc();
+          }
+          auto* const state = new State{category, name, {}};
+          recorder.Open(state, "a hook", [state] { delete state; });
+          return state;
+      }())
 {
-    const HarnessAllocations guard;
-    Recorder& recorder = Recorder::Current("BaseHook");
-    if (recorder.Housekeeping(CallText("BaseHook", {category, name})).value_or(1) == 0) {
-        throw std::bad_alloc();
-    }
-    m_state = new State{category, name, {}};
-    recorder.Open(m_state, "a hook", [state = m_state] { delete state; });
 }
 
 int BaseHook::SetEnv(const std::string& key, const std::string& value)

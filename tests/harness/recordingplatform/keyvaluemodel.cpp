@@ -47,7 +47,8 @@ bool EditFile(const std::string& path, const KeyValues& set, const KeyValues& re
 {
     std::vector<std::string> lines = ReadLines(path).value_or(std::vector<std::string>());
     for (const auto& [key, value] : set) {
-        const std::string line = key + "=" + value;
+        std::string line(key);
+        line.append("=").append(value);
         const auto place = std::find_if(lines.begin(), lines.end(), IsKey(key));
         if (place != lines.end()) {
             *place = line;

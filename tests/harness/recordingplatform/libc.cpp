@@ -39,6 +39,7 @@ __attribute__((format(printf, 2, 0))) void Log(int priority, const char* format,
     }
     va_list measured;
     va_copy(measured, arguments);
+    // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): the copy is made one line above
     const int size = std::vsnprintf(nullptr, 0, format, measured);
     va_end(measured);
     std::string line(static_cast<std::size_t>(size) + 1, '\0');
@@ -67,7 +68,8 @@ void syslog(int priority, const char* format, ...)
     va_end(arguments);
 }
 
-void __syslog_chk(int priority, int flag, const char* format, ...);
+void __syslog_chk(int priority, int flag, const char* format, ...)
+    __attribute__((format(printf, 3, 4)));
 
 void __syslog_chk(int priority, int /*flag*/, const char* format, ...)
 {

@@ -5,13 +5,10 @@
 #include <filesystem>
 
 using harness::Err;
-using harness::Info;
 using harness::RecordingPlatform;
 using testing::ElementsAre;
 using testing::IsEmpty;
-using unit::BridgeDissolved;
 using unit::Calls;
-using unit::GatewaysCopied;
 using unit::kRegistry;
 using unit::kStateFolder;
 using unit::ListFolder;

@@ -18,7 +18,6 @@ using testing::AnyOf;
 using testing::Contains;
 using testing::IsEmpty;
 using unit::BondModes;
-using unit::kIgnoreList;
 using unit::kInterfaceList;
 using unit::kRegistry;
 using unit::Names;
@@ -306,6 +305,12 @@ std::vector<Entry> Stores()
          },
          1,
          {-1}},
+    };
+}
+
+std::vector<Entry> Lists()
+{
+    return {
         {"OVSIfsConf",
          [] {
              std::string path;
@@ -397,6 +402,12 @@ std::vector<Entry> Managers()
          On<OVSManager>([](OVSManager& m) { return AsInt(m.DeleteAll()); }),
          1,
          {0, 1}},
+    };
+}
+
+std::vector<Entry> Steps()
+{
+    return {
         {"CreateOVS",
          On<OVSManager>([](OVSManager& m) { return m.CreateOVS("eth2"); }),
          0,
@@ -497,6 +508,10 @@ INSTANTIATE_TEST_SUITE_P(Registrations, WithoutMemory,
                          NameOfRow);
 INSTANTIATE_TEST_SUITE_P(Stores, WithoutMemory,
                          testing::Combine(testing::ValuesIn(Stores()), testing::Bool()), NameOfRow);
+INSTANTIATE_TEST_SUITE_P(Lists, WithoutMemory,
+                         testing::Combine(testing::ValuesIn(Lists()), testing::Bool()), NameOfRow);
+INSTANTIATE_TEST_SUITE_P(Steps, WithoutMemory,
+                         testing::Combine(testing::ValuesIn(Steps()), testing::Bool()), NameOfRow);
 INSTANTIATE_TEST_SUITE_P(Managers, WithoutMemory,
                          testing::Combine(testing::ValuesIn(Managers()), testing::Bool()),
                          NameOfRow);

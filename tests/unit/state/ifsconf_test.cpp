@@ -16,7 +16,6 @@ using unit::kStateFolder;
 using unit::ListFolder;
 using unit::LongName;
 using unit::MakeUnopenable;
-using unit::Names;
 using unit::ReadFile;
 using unit::WriteFile;
 using VORN::OVS::OVSIfsConf;

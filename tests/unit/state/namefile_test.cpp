@@ -17,7 +17,6 @@
 #include <unistd.h>
 
 using harness::Err;
-using harness::LogLine;
 using harness::RecordingPlatform;
 using testing::ElementsAre;
 using testing::IsEmpty;
@@ -385,6 +384,20 @@ TEST_P(SavedNames, AreRefusedByAReadOnlyFolderThatHasNoSuchFile)
     }
     EXPECT_EQ(platform.Log(), GetParam().Refused(GetParam().addFails));
     EXPECT_THAT(ListFolder(kStateFolder), IsEmpty());
+}
+
+TEST_P(SavedNames, AreWrittenInPlaceInAReadOnlyFolderWhoseFileCanBeWritten)
+{
+    const RecordingPlatform platform;
+    WriteFile(GetParam().path, "eth0\n");
+    ASSERT_EQ(chmod(kStateFolder, 0555), 0);
+    {
+        const ScopedWithoutOverride unprivileged;
+        EXPECT_EQ(GetParam().add("eth1"), 0);
+    }
+    EXPECT_EQ(platform.Log(), LogLines{});
+    EXPECT_EQ(ReadFile(GetParam().path), "eth0\neth1\n");
+    EXPECT_THAT(ListFolder(kStateFolder), ElementsAre(GetParam().FileName()));
 }
 
 TEST_P(SavedNames, AreRefusedByAReadOnlyFileSystem)

@@ -16,7 +16,6 @@ using unit::BridgeMade;
 using unit::Calls;
 using unit::GatewaysCopied;
 using unit::LogLines;
-using unit::LongName;
 using unit::Sequence;
 using VORN::OVS::OVSManager;
 

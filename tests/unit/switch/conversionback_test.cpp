@@ -16,7 +16,6 @@ using unit::BridgeDissolved;
 using unit::Calls;
 using unit::GatewaysCopied;
 using unit::LogLines;
-using unit::LongName;
 using unit::Names;
 using unit::Sequence;
 using unit::WriteFile;

@@ -10,7 +10,6 @@ using testing::ElementsAre;
 using testing::IsEmpty;
 using unit::Calls;
 using unit::kExitedWith1;
-using unit::LogLines;
 using unit::LongName;
 using unit::Names;
 using unit::Sequence;

@@ -127,7 +127,7 @@ TEST_F(Vornovsctl, RegisterOfAClientThatIsRegisteredChangesNothing)
     Host().act = [](FakeHost&) { return 1; };
 
     EXPECT_EQ(Ctl({"register", "lab"}),
-              (Outcome{0, "'lab' was registered already; nothing was changed.\n", ""}));
+              (Outcome{5, "", "vornovsctl: 'lab' was registered already; nothing was changed.\n"}));
 }
 
 TEST_F(Vornovsctl, RegisterFailsOnAHostThatCannotRunTheSwitch)
@@ -228,7 +228,7 @@ TEST_F(Vornovsctl, UnregisterOfAnUnknownClientChangesNothing)
     Host().act = [](FakeHost&) { return 1; };
 
     EXPECT_EQ(Ctl({"unregister", "lab"}),
-              (Outcome{0, "'lab' was not registered; nothing was changed.\n", ""}));
+              (Outcome{5, "", "vornovsctl: 'lab' was not registered; nothing was changed.\n"}));
 }
 
 TEST_F(Vornovsctl, UnregisterFailsWhileTheClientIsStillRegistered)

@@ -15,7 +15,7 @@ namespace vornhost {
 /**
  * Reads the configuration file of an interface.
  * @return  nothing when there is none, it cannot be read, or its DEVICE says that it is another
- *          interface's.
+ *          interface's; a copy of the interface's own bridge's file counts as the interface's.
  */
 std::optional<KeyValueFile> LoadInterfaceFile(const std::string& interface);
 

@@ -5,6 +5,7 @@
 snapshot()
 {
     local folder="$lab_out/snapshots/$1"
+    wait_until 10 addresses_settled
     rm -rf "$folder"
     mkdir -p "$folder"
     snapshot_links >"$folder/links"
@@ -14,6 +15,12 @@ snapshot()
     snapshot_sysctls >"$folder/sysctls"
     snapshot_switch >"$folder/switch"
     snapshot_files "$folder"
+}
+
+# An address of IPv6 is tentative until nobody else has claimed it.
+addresses_settled()
+{
+    [ -z "$(ip -6 -oneline address show tentative)" ]
 }
 
 # Interface numbers change when a device is made anew and say nothing; the switch's own device is

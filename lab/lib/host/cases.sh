@@ -10,10 +10,9 @@ lab_case_names()
     done | sort | cut -d ' ' -f 2
 }
 
-# The first line of text in a case's steps.
 lab_case_title()
 {
-    sed -n '/^[^#[:space:]]/ { p; q; }' "$lab_source/cases/$1/README.md"
+    sed -n 's/^# //p' "$lab_source/cases/$1/README.md"
 }
 
 lab_case_deadline()

@@ -1,4 +1,4 @@
-# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
+# shellcheck shell=bash disable=SC2154,SC2034 # variables of the guest's other files
 
 remember_plain
 
@@ -10,6 +10,8 @@ expect_success vornovsctl unregister alpha
 expect_plain learned
 
 step "Be killed before each of $last steps"
+# Minutes of probes: more seldom than elsewhere, still five times within the limit.
+lab_probe_interval=20
 probes_start
 for ((number = 1; number <= last; number++)); do
     killed_at "$number" vornovsctl register alpha

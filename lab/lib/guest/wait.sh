@@ -18,20 +18,25 @@ guest_ticks()
     ticks=$((seconds * 100 + ${hundredths#0}))
 }
 
-# wait_until SECONDS COMMAND...: tries a command every 20 ms until it succeeds; fails the case when
-# it has not within the given seconds.
+# wait_until SECONDS COMMAND...: tries a command every 20 ms until it succeeds, every 200 ms once a
+# second has passed; fails the case when it has not within the given seconds.
 wait_until()
 {
-    local seconds="$1" ticks deadline
+    local seconds="$1" ticks began deadline
     shift
     guest_ticks
+    began="$ticks"
     deadline=$((ticks + seconds * 100))
     while ! "$@" >/dev/null 2>&1; do
         guest_ticks
         if [ "$ticks" -ge "$deadline" ]; then
             fail "after $seconds s still not so: $*"
         fi
-        pause 0.02
+        if [ "$((ticks - began))" -lt 100 ]; then
+            pause 0.02
+        else
+            pause 0.2
+        fi
     done
 }
 

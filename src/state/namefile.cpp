@@ -5,6 +5,7 @@
 #include <vornplatform/core.h>
 
 #include <fcntl.h>
+#include <sys/file.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -17,6 +18,7 @@ namespace VORN::OVS {
 namespace {
 
 constexpr mode_t kNewFileMode = 0666; // the process's umask takes its part
+constexpr int kMostWriters = 100;
 
 /** A file beside the target that takes its place, or is gone with this object. */
 class Replacement {
@@ -42,16 +44,31 @@ public:
     }
 
 private:
+    // One name for all, so that what a killed client left is taken over by the next one and does
+    // not pile up. Whoever finds the name in use takes the next number.
     int Open()
     {
-        int descriptor = -1;
-        int number = 0;
-        do {
-            m_path = m_target + "." + std::to_string(::gettid()) + "." + std::to_string(number++);
-            descriptor =
-                ::open(m_path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, kNewFileMode);
-        } while (descriptor < 0 && errno == EEXIST);
-        return descriptor;
+        for (int number = 0; number < kMostWriters; ++number) {
+            m_path = m_target + ".new" + (number == 0 ? "" : std::to_string(number));
+            const int descriptor =
+                ::open(m_path.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC | O_NOFOLLOW, kNewFileMode);
+            if (descriptor < 0 || (IsOurs(descriptor) && ::ftruncate(descriptor, 0) == 0)) {
+                return descriptor;
+            }
+            (void)::close(descriptor);
+        }
+        errno = EAGAIN;
+        return -1;
+    }
+
+    /** Locks the file. @return whether it is ours and still stands there. */
+    [[nodiscard]] bool IsOurs(int descriptor) const
+    {
+        struct stat opened {};
+        struct stat named {};
+        return ::flock(descriptor, LOCK_EX | LOCK_NB) == 0 && ::fstat(descriptor, &opened) == 0 &&
+               ::lstat(m_path.c_str(), &named) == 0 && opened.st_ino == named.st_ino &&
+               opened.st_dev == named.st_dev;
     }
 
     const std::string& m_target;

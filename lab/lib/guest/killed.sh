@@ -51,7 +51,7 @@ sweep_leftovers()
     while read -r file; do
         note "left behind: $file"
         rm -f "$file"
-    done < <(find /etc/sysconfig /usr/vorn/etc -name '.vornovs-??????' -o -name 'ovs_*.conf.[0-9]*.[0-9]*')
+    done < <(find /etc/sysconfig /usr/vorn/etc -name '.vornovs-??????' -o -name 'ovs_*.conf.new*')
 }
 
 # No file is half written: each configuration file has its DEVICE, which is its own name.

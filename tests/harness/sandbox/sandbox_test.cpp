@@ -25,6 +25,7 @@ using harness::EnterSandbox;
 using harness::SandboxOptions;
 using testing::ElementsAre;
 using testing::IsEmpty;
+using testing::UnorderedElementsAreArray;
 
 constexpr uid_t kOrdinaryUser = 65534;
 
@@ -67,13 +68,23 @@ protected:
     static uid_t User() { return ::geteuid() == 0 ? GetParam() : ::geteuid(); }
 };
 
+/** What stays in a folder: the way to this checkout, should it lie there, is never hidden. */
+std::vector<std::string> WayToCheckout(const fs::path& folder)
+{
+    const fs::path way = fs::current_path().lexically_relative(folder);
+    return *way.begin() == ".." ? std::vector<std::string>{}
+                                : std::vector<std::string>{way.begin()->string()};
+}
+
 TEST_P(Sandbox, HasEmptyFoldersThatCanBeWritten)
 {
     InAnotherProcess(User(), [] {
         EnterSandbox();
         for (const char* folder : {"/usr/vorn", "/etc/sysconfig", "/etc/init.d", "/run", "/tmp"}) {
             fs::create_directory(fs::path(folder) / "made");
-            EXPECT_THAT(Names(folder), ElementsAre("made")) << folder;
+            std::vector<std::string> expected = WayToCheckout(folder);
+            expected.emplace_back("made");
+            EXPECT_THAT(Names(folder), UnorderedElementsAreArray(expected)) << folder;
         }
     });
 }
@@ -137,7 +148,7 @@ TEST_P(Sandbox, KeepsTheEntriesOfAFolderMadeWritable)
         EnterSandbox(options);
         EXPECT_TRUE(std::ofstream("/usr/bin/vornovs-leak").good());
         EXPECT_TRUE(fs::remove("/usr/bin/vornovs-leak"));
-        EXPECT_THAT(Names("/usr/bin"), testing::UnorderedElementsAreArray(programs));
+        EXPECT_THAT(Names("/usr/bin"), UnorderedElementsAreArray(programs));
     });
 }
 

@@ -12,6 +12,7 @@
 #include <ostream>
 
 #include <fcntl.h>
+#include <sys/file.h>
 #include <sys/mount.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -110,13 +111,36 @@ TEST_P(SavedNames, AreWrittenBesideSyncedAndRenamed)
     const RecordingPlatform platform;
     const FileCalls calls;
     EXPECT_EQ(GetParam().add("eth0"), 0);
-    const std::string temporary = GetParam().FileName() + "[^ ]+";
+    const std::string temporary = GetParam().FileName() + ".new";
     EXPECT_THAT(calls.List(),
-                ElementsAre(MatchesRegex("fsync " + temporary),
-                            MatchesRegex("rename " + temporary + " " + GetParam().FileName()),
-                            "fsync vornovs"));
+                ElementsAre("fsync " + temporary,
+                            "rename " + temporary + " " + GetParam().FileName(), "fsync vornovs"));
     EXPECT_EQ(ReadFile(GetParam().path), "eth0\n");
     EXPECT_THAT(ListFolder(kStateFolder), ElementsAre(GetParam().FileName()));
+}
+
+TEST_P(SavedNames, TakeOverWhatAKilledClientLeftBeside)
+{
+    const RecordingPlatform platform;
+    WriteFile(GetParam().path + ".new", "a long name that was being written when the client\n");
+    EXPECT_EQ(GetParam().add("eth0"), 0);
+    EXPECT_EQ(ReadFile(GetParam().path), "eth0\n");
+    EXPECT_THAT(ListFolder(kStateFolder), ElementsAre(GetParam().FileName()));
+}
+
+TEST_P(SavedNames, LeaveTheFileThatAnotherClientIsWriting)
+{
+    const RecordingPlatform platform;
+    const std::string beside = GetParam().path + ".new";
+    WriteFile(beside, "eth9\n");
+    const int other = open(beside.c_str(), O_WRONLY | O_CLOEXEC);
+    ASSERT_EQ(flock(other, LOCK_EX | LOCK_NB), 0);
+    EXPECT_EQ(GetParam().add("eth0"), 0);
+    (void)close(other);
+    EXPECT_EQ(ReadFile(GetParam().path), "eth0\n");
+    EXPECT_EQ(ReadFile(beside), "eth9\n");
+    EXPECT_THAT(ListFolder(kStateFolder),
+                ElementsAre(GetParam().FileName(), GetParam().FileName() + ".new"));
 }
 
 TEST_P(SavedNames, TakeTheNewFilesModeFromTheUmask)

@@ -8,7 +8,7 @@
 # What the guest runs of Debian's, besides busybox.
 lab_programs=(
     bin/bash bin/dash bin/cp bin/ip sbin/bridge sbin/tc bin/ss usr/bin/chrt usr/bin/flock usr/bin/fping
-    usr/bin/tcpdump usr/bin/uuidgen sbin/ldconfig usr/bin/getconf
+    usr/bin/uuidgen sbin/ldconfig usr/bin/getconf
     usr/bin/ovs-vsctl usr/bin/ovs-appctl usr/bin/ovs-ofctl usr/bin/ovs-dpctl
     usr/bin/ovsdb-tool usr/bin/ovsdb-client usr/sbin/ovsdb-server
     usr/lib/openvswitch-switch/ovs-vswitchd

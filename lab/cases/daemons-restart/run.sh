@@ -1,6 +1,6 @@
 # shellcheck shell=bash disable=SC2154 # variables of the guest's other files
 
-# kill_all SIGNAL NAME
+# kill_all SIGNAL NAME: one of them may end with the one before it.
 kill_all()
 {
     local pid

@@ -21,6 +21,7 @@ expect_on_switch
 step "The host itself did not change"
 snapshot after
 expect_changed switched after '^\+beta$'
+# Finding no line is what is hoped for.
 snapshot_difference switched after | grep -v -e '^[-+]alpha$' -e '^[-+]beta$' \
     -e '^---' -e '^+++' >"$lab_out/rest" || true
 expect_same_text "the rest of the host" /dev/null "$lab_out/rest"

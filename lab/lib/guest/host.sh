@@ -107,7 +107,7 @@ expect_plain()
     expect_unchanged plain "${1:-home}"
 }
 
-# expect_registered NAME...: these and no others.
+# expect_registered NAME...: these and no others. There is no file while there is no client.
 expect_registered()
 {
     local wanted

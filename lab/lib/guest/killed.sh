@@ -96,7 +96,7 @@ killed_during()
     client=$!
     wait_until 60 test -e "$lab_out/reached-$verb"
     kill -KILL "$client"
-    wait "$client" 2>/dev/null || true
+    wait "$client" 2>/dev/null || true # its status is that it was killed
     if lock_is_free; then
         fail "the lock is free while rc.network still works for a killed client"
     fi

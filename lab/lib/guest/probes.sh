@@ -41,7 +41,8 @@ probes_next_phase()
     kill -USR1 "$lab_probe"
 }
 
-# Ends the probes; $lab_out/probes then has a line for each target.
+# Ends the probes; $lab_out/probes then has a line for each target. Whoever reads it notices when
+# one that died early has left none.
 probes_stop()
 {
     if [ -n "${lab_probe:-}" ]; then

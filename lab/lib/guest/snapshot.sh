@@ -81,6 +81,7 @@ snapshot_files()
 {
     local file
     mkdir -p "$1/files"
+    # A host need not have each of them; one that comes or goes changes the list.
     { find /etc/sysconfig /usr/vorn/etc /etc/vornovs-host.conf /etc/vorninfo.conf -type f \
         2>/dev/null || true; } | sort >"$1/file-list"
     while read -r file; do
@@ -91,12 +92,14 @@ snapshot_files()
     rm "$1/file-list"
 }
 
-# snapshot_difference ONE OTHER: prints what differs; empty when nothing does.
+# snapshot_difference ONE OTHER: prints what differs; empty when nothing does. A comparison that
+# could not be made is a difference too.
 snapshot_difference()
 {
     (
-        cd "$lab_out/snapshots" || exit 1
-        diff -r -U 0 "$1" "$2" | sed -e '/^@@/d' -e '/^diff /d' || true
+        cd "$lab_out/snapshots" || { echo "there are no snapshots"; exit; }
+        { diff -r -U 0 "$1" "$2" || [ $? -eq 1 ] || echo "\"$1\" and \"$2\" cannot be compared"; } |
+            sed -e '/^@@/d' -e '/^diff /d'
     )
 }
 

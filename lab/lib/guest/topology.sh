@@ -121,14 +121,14 @@ topology_addresses()
 }
 
 # What the appliance can probe: the outside's address on every port, and the far host, which is
-# reached through a gateway. $1 is 4 or 6.
+# reached through a gateway. $1 is 4 or 6; a topology may have none of a family.
 topology_outside_addresses()
 {
     sed -n -e 's/^outside [^ ]* //p' -e 's/^far //p' /lab/topology/topology | tr ' ' '\n' |
         sed 's|/.*||' | if [ "$1" = 4 ]; then grep '\.'; else grep ':'; fi || true
 }
 
-# The address of the far host; $1 is 4 or 6.
+# The address of the far host; $1 is 4 or 6. There need not be one.
 topology_far_address()
 {
     sed -n 's/^far //p' /lab/topology/topology | tr ' ' '\n' | sed 's|/.*||' |

@@ -4,7 +4,7 @@
 # A descriptor on which nothing ever comes.
 exec {lab_silence}<> <(:)
 
-# pause SECONDS: sleeps without starting a process.
+# pause SECONDS: sleeps without starting a process, by a read that always fails for want of input.
 pause()
 {
     read -r -t "$1" -u "$lab_silence" || true
@@ -71,6 +71,7 @@ processes_named()
     for folder in /proc/[0-9]*; do
         { read -r name <"$folder/comm"; } 2>/dev/null || continue
         called=''
+        # Fails for a process that has ended by now and for a kernel thread, which has no such line.
         { read -r -d '' called <"$folder/cmdline"; } 2>/dev/null || true
         if [ "$name" = "$1" ] || [ "${called##*/}" = "$1" ]; then
             echo "${folder#/proc/}"

@@ -42,6 +42,7 @@ lab_run_case()
         -serial "file:$results/results.tar") </dev/null >"$results/qemu" 2>&1 || status=$?
     echo $(($(date +%s) - began)) >"$results/seconds"
 
+    # A guest that hung sends no results; the verdict is read from its report all the same.
     tar -C "$results" -xf "$results/results.tar" 2>/dev/null || true
     rm -f "$results/results.tar" "$results/guest.cpio"
     verdict=$(sed -n 's/^lab-verdict: //p' "$results/report" 2>/dev/null | tr -d '\r' | tail -n 1)

@@ -119,7 +119,7 @@ lab_make_system()
     cp -r "$lab_debian/usr/share/openvswitch" "$root/usr/share/"
     mkdir -p "$root/etc/default" "$root/etc/iproute2"
     cp "$lab_debian/etc/default/openvswitch-switch" "$root/etc/default/"
-    cp "$lab_debian"/etc/iproute2/* "$root/etc/iproute2/" 2>/dev/null || true
+    find "$lab_debian/etc/iproute2" -maxdepth 1 -type f -exec cp -t "$root/etc/iproute2" {} +
 
     printf 'root:x:0:0:root:/root:/bin/sh\n' >"$root/etc/passwd"
     printf 'root:x:0:\n' >"$root/etc/group"
@@ -222,8 +222,8 @@ lab_make_image()
 lab_product_files()
 {
     printf '%s\n' "${BASH_SOURCE[0]}" "$lab_debian/.packages"
-    find "$lab_root/lab/clients" -name '*.cpp' 2>/dev/null || true
-    find "$lab_release/bin" "$lab_release/lib" -type f 2>/dev/null || true
+    find "$lab_root/lab/clients" -name '*.cpp'
+    find "$lab_release/bin" "$lab_release/lib" -type f
     find "$lab_root/host" "$lab_root/tools" -type f ! -name '*.cpp' ! -name '*.h'
     find "$lab_release" -name cmake_install.cmake
 }

@@ -60,7 +60,7 @@ bool Decider::IsJoined() const
         return false;
     }
     const SwitchPort* port = m_anyBridge->FindPort(m_pair.name);
-    return port != nullptr && port->working &&
+    return port != nullptr && !port->working.empty() &&
            (m_anyBridge->datapathType == kUserspaceDatapath ||
             m_inputs.live.NameOf(m_pair.port->master) == kDatapathLink);
 }
@@ -72,7 +72,7 @@ bool Decider::IsOurs() const
         return false;
     }
     const SwitchPort* port = m_anyBridge->FindPort(m_pair.name);
-    return m_anyBridge->ours || (port != nullptr && port->ours);
+    return m_anyBridge->marked || (port != nullptr && port->marked);
 }
 
 bool Decider::BridgeIsLive() const
@@ -176,9 +176,9 @@ void Decider::CheckMaster()
     if (!master.empty() && master != kDatapathLink) {
         owner = master;
     }
-    for (const auto& [name, bridge] : m_inputs.switchState.bridges) {
-        if (name != m_pair.bridge && bridge.FindPort(m_pair.name) != nullptr) {
-            owner = name;
+    for (const SwitchBridge& bridge : m_inputs.switchState.bridges) {
+        if (bridge.name != m_pair.bridge && bridge.FindPort(m_pair.name) != nullptr) {
+            owner = bridge.name;
         }
     }
     if (!owner.empty()) {
@@ -242,9 +242,9 @@ std::set<std::string> NamesToDecide(const Inputs& inputs)
     for (const auto& [name, file] : inputs.files) {
         names.insert(PlainOf(name));
     }
-    for (const auto& [name, bridge] : inputs.switchState.bridges) {
-        if (PlainOf(name) != name) {
-            names.insert(PlainOf(name));
+    for (const SwitchBridge& bridge : inputs.switchState.bridges) {
+        if (PlainOf(bridge.name) != bridge.name) {
+            names.insert(PlainOf(bridge.name));
         }
     }
     for (const auto& [name, record] : inputs.runState.interfaces) {
@@ -280,7 +280,7 @@ std::vector<std::string> Pair::ForeignPorts() const
 
 bool Pair::SourceStays() const
 {
-    return target == Target::kSwitch || switchBridge == nullptr || !switchBridge->ours ||
+    return target == Target::kSwitch || switchBridge == nullptr || !switchBridge->marked ||
            !ForeignPorts().empty();
 }
 

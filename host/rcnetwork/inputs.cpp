@@ -1,7 +1,6 @@
 #include "inputs.h"
 
 #include "support/keyvaluefile.h"
-#include "support/process.h"
 
 #include <cerrno>
 #include <cstring>
@@ -12,8 +11,7 @@
 namespace vornhost {
 namespace {
 
-constexpr std::chrono::seconds kToolDeadline{15};
-constexpr char kReadLimit[] = "--timeout=5"; // reading waits for nothing that takes longer
+constexpr std::chrono::seconds kReadLimit{5};
 
 std::string FirstLine(const std::string& path)
 {
@@ -95,7 +93,7 @@ void ReadGateways(Inputs& inputs, std::vector<Remark>& remarks)
     }
 }
 
-void ReadSwitch(Inputs& inputs, std::vector<Remark>& remarks)
+void ReadSwitchState(Inputs& inputs, std::vector<Remark>& remarks)
 {
     if (inputs.request.switchHung) {
         inputs.switchState.hung = true;
@@ -104,16 +102,9 @@ void ReadSwitch(Inputs& inputs, std::vector<Remark>& remarks)
     if (!ServiceRuns(kDatabaseService) || !ServiceRuns(kSwitchService)) {
         return;
     }
-    std::vector<std::string> command{kSwitchTool, kReadLimit};
-    const auto arguments = SwitchTablesArguments();
-    command.insert(command.end(), arguments.begin(), arguments.end());
-    ProcessOptions options;
-    options.deadline = kToolDeadline;
-    options.environment = ToolEnvironment();
-    const ProcessResult result = RunProcess(command, options);
-    const auto state = result.Succeeded() ? ParseSwitchTables(result.output) : std::nullopt;
-    if (state) {
-        inputs.switchState = *state;
+    if (auto bridges = vornhost::ReadSwitch(kReadLimit)) {
+        inputs.switchState.running = true;
+        inputs.switchState.bridges = std::move(*bridges);
         return;
     }
     inputs.switchState.hung = true;
@@ -157,7 +148,7 @@ std::optional<Inputs> ReadInputs(const Request& request, std::vector<Remark>& re
         return std::nullopt;
     }
     ReadGateways(inputs, remarks);
-    ReadSwitch(inputs, remarks);
+    ReadSwitchState(inputs, remarks);
     ReadRunState(inputs);
     auto live = ReadLiveState();
     if (!live) {

@@ -12,7 +12,6 @@
 
 namespace vornhost {
 
-constexpr char kConfigurationFolder[] = "/etc/sysconfig/network-scripts";
 constexpr char kSwitchTool[] = "/usr/bin/ovs-vsctl";
 constexpr char kDatabaseService[] = "/etc/init.d/vornovs-db";
 constexpr char kSwitchService[] = "/etc/init.d/vornovs-vswitch";

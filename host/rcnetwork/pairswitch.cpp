@@ -7,7 +7,7 @@ namespace {
 
 std::string MarkText()
 {
-    return std::string("external_ids:") + kMarkKey + "=" + kMarkValue;
+    return std::string("external_ids:") + kSwitchMarkKey + "=" + kSwitchMarkValue;
 }
 
 std::string MacSetting(const std::string& mac)
@@ -37,7 +37,7 @@ void PairPlanner::PlanBridge()
     }
     if (m_pair.bridgeLink == nullptr ||
         (m_pair.bridgeLink->mac != m_pair.port->mac &&
-         (m_pair.switchBridge == nullptr || m_pair.switchBridge->ours))) {
+         (m_pair.switchBridge == nullptr || m_pair.switchBridge->marked))) {
         m_steps.waitFor.push_back(m_pair.bridge + " " + m_pair.port->mac);
     }
     if (!m_pair.joined) {
@@ -67,13 +67,13 @@ void PairPlanner::AdjustBridge()
     const SwitchBridge& bridge = *m_pair.switchBridge;
     const SwitchPort* own = bridge.FindPort(bridge.name);
     auto& commands = m_steps.makeBridges;
-    if (bridge.ours && bridge.hwaddr != m_pair.port->mac) {
+    if (bridge.marked && bridge.hwaddr != m_pair.port->mac) {
         commands.push_back("set Bridge " + bridge.name + " " + MacSetting(m_pair.port->mac));
     }
     if (own == nullptr) {
         return;
     }
-    if (bridge.ours && own->mtuRequest != WantedMtu()) {
+    if (bridge.marked && own->mtuRequest != WantedMtu()) {
         commands.push_back("set Interface " + bridge.name +
                            " mtu_request=" + std::to_string(WantedMtu()));
     }

@@ -5,6 +5,7 @@
 #include "pairplan.h"
 #include "routeplan.h"
 
+#include <algorithm>
 #include <sstream>
 
 namespace vornhost {
@@ -64,6 +65,13 @@ void AddStages(const Steps& steps, Plan& plan)
 }
 
 } // namespace
+
+const SwitchBridge* SwitchState::Find(const std::string& bridge) const
+{
+    const auto found = std::find_if(bridges.begin(), bridges.end(),
+                                    [&](const SwitchBridge& each) { return each.name == bridge; });
+    return found == bridges.end() ? nullptr : &*found;
+}
 
 Plan MakePlan(const Inputs& inputs)
 {

@@ -5,13 +5,13 @@
 #ifndef VORNHOST_RCNETWORK_PLAN_H
 #define VORNHOST_RCNETWORK_PLAN_H
 
-#include "interfacefile.h"
 #include "livestate.h"
 #include "report.h"
 #include "runstate.h"
-#include "switchstate.h"
 
 #include "support/gatewaystore.h"
+#include "support/interfacefile.h"
+#include "support/switchdatabase.h"
 
 #include <map>
 #include <set>
@@ -28,6 +28,15 @@ struct Request {
     /** Interfaces that the switch could not be made to carry: they stay reachable without it. */
     std::set<std::string> withoutSwitch;
     bool switchHung = false; ///< It was asked before and did not answer.
+};
+
+/** What is known of the switch. */
+struct SwitchState {
+    bool running = false; ///< Both daemons run and the database answered.
+    bool hung = false;    ///< Both daemons run and the database did not answer.
+    std::vector<SwitchBridge> bridges;
+
+    const SwitchBridge* Find(const std::string& bridge) const;
 };
 
 /** All that a plan depends on. */

@@ -2,8 +2,75 @@
 
 #include "interfacename.h"
 
+#include <algorithm>
+#include <array>
+#include <charconv>
+#include <sstream>
+#include <string_view>
+
+#include <arpa/inet.h>
+
 namespace vornhost {
 namespace {
+
+constexpr char kFilePrefix[] = "ifcfg-";
+constexpr char kBridgePrefix[] = "ovs_";
+constexpr unsigned kMostNumberedAddresses = 256;
+
+std::string Lower(std::string text)
+{
+    std::transform(text.begin(), text.end(), text.begin(),
+                   [](unsigned char letter) { return static_cast<char>(std::tolower(letter)); });
+    return text;
+}
+
+std::string Trimmed(const std::string& text)
+{
+    constexpr char kBlanks[] = " \t\r";
+    const auto first = text.find_first_not_of(kBlanks);
+    if (first == std::string::npos) {
+        return {};
+    }
+    return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
+}
+
+std::optional<unsigned> ToNumber(const std::string& text, unsigned least, unsigned most)
+{
+    unsigned value = 0;
+    const char* end = text.data() + text.size();
+    const auto [stop, error] = std::from_chars(text.data(), end, value);
+    if (error != std::errc() || stop != end || value < least || value > most) {
+        return std::nullopt;
+    }
+    return value;
+}
+
+/** @return  the address in its usual notation, empty when the text is none of the family. */
+std::string NormalAddress(int family, const std::string& text)
+{
+    std::array<unsigned char, sizeof(in6_addr)> bytes{};
+    std::array<char, INET6_ADDRSTRLEN> normal{};
+    if (inet_pton(family, text.c_str(), bytes.data()) != 1 ||
+        inet_ntop(family, bytes.data(), normal.data(), normal.size()) == nullptr) {
+        return {};
+    }
+    return normal.data();
+}
+
+std::optional<unsigned> MaskLength(const std::string& mask)
+{
+    in_addr address{};
+    if (inet_pton(AF_INET, mask.c_str(), &address) != 1) {
+        return std::nullopt;
+    }
+    const std::uint32_t bits = ntohl(address.s_addr);
+    const auto length = static_cast<unsigned>(__builtin_popcount(bits));
+    const std::uint32_t expected = length == 0 ? 0 : ~std::uint32_t{0} << (32U - length);
+    if (bits != expected) {
+        return std::nullopt;
+    }
+    return length;
+}
 
 bool IsFileOf(const KeyValueFile& file, const std::string& interface)
 {
@@ -13,7 +80,241 @@ bool IsFileOf(const KeyValueFile& file, const std::string& interface)
     }
     // A conversion back that was cut short has copied the bridge's file over the interface's and
     // not edited it yet; were it not the interface's, nothing could finish the way home.
-    return device == "ovs_" + interface && file.Get("PRIMARY") == interface;
+    return device == kBridgePrefix + interface && file.Get("PRIMARY") == interface;
+}
+
+/** Reads the keys of one file and keeps what there is to say about them. */
+class Parser {
+public:
+    Parser(const std::string& name, const std::string& text) : m_values(KeyValueFile::Parse(text))
+    {
+        m_parsed.file.name = name;
+        // A file without its last line break may be one that is being written.
+        m_parsed.file.whole = !text.empty() && text.back() == '\n';
+    }
+
+    ParsedFile Parse();
+
+private:
+    std::string Value(const std::string& key) const;
+    std::string FileName() const { return kFilePrefix + m_parsed.file.name; }
+    void Leave(const std::string& reason);
+    void Refuse(const std::string& key, const std::string& reason);
+    std::optional<bool> YesOrNo(const std::string& key);
+    std::optional<unsigned> Number(const std::string& key, unsigned least, unsigned most);
+    bool IsOwnFile();
+    void DecideUse();
+    void ReadLinkKeys();
+    void ReadIpv4();
+    void ReadIpv4Address(const std::string& number);
+    void ReadIpv6();
+    void ReadIpv6Address(const std::string& key, const std::string& text);
+    std::string ReadGateway(const std::string& key, int family);
+
+    KeyValueFile m_values;
+    ParsedFile m_parsed;
+};
+
+std::string Parser::Value(const std::string& key) const
+{
+    std::string value = Trimmed(m_values.Get(key).value_or(""));
+    if (value.size() >= 2 && value.front() == value.back() &&
+        (value.front() == '"' || value.front() == '\'')) {
+        value = Trimmed(value.substr(1, value.size() - 2));
+    }
+    return value;
+}
+
+void Parser::Leave(const std::string& reason)
+{
+    m_parsed.file.use = FileUse::kLeaveAlone;
+    m_parsed.remarks.push_back(
+        {Severity::kWarning, FileName() + ": " + reason + "; the interface is left as it is"});
+}
+
+void Parser::Refuse(const std::string& key, const std::string& reason)
+{
+    m_parsed.file.whole = false;
+    m_parsed.remarks.push_back(
+        {Severity::kError, FileName() + ": " + key + "=" + Value(key) + ": " + reason});
+}
+
+std::optional<bool> Parser::YesOrNo(const std::string& key)
+{
+    const std::string value = Lower(Value(key));
+    if (value == "yes" || value == "true" || value == "on" || value == "1") {
+        return true;
+    }
+    if (value == "no" || value == "false" || value == "off" || value == "0") {
+        return false;
+    }
+    if (!value.empty()) {
+        Refuse(key, "neither yes nor no");
+    }
+    return std::nullopt;
+}
+
+std::optional<unsigned> Parser::Number(const std::string& key, unsigned least, unsigned most)
+{
+    const std::string value = Value(key);
+    if (value.empty()) {
+        return std::nullopt;
+    }
+    const auto number = ToNumber(value, least, most);
+    if (!number) {
+        Refuse(key, "not a number from " + std::to_string(least) + " to " + std::to_string(most));
+    }
+    return number;
+}
+
+bool Parser::IsOwnFile()
+{
+    if (m_values.Text().find('=') == std::string::npos) {
+        Leave("ignored, because it is empty");
+        return false;
+    }
+    const std::string device = Value("DEVICE");
+    if (!device.empty() && device != m_parsed.file.name) {
+        Leave("ignored, because its DEVICE is " + device);
+        return false;
+    }
+    return true;
+}
+
+void Parser::DecideUse()
+{
+    InterfaceFile& file = m_parsed.file;
+    const bool bridgeName = file.name.rfind(kBridgePrefix, 0) == 0;
+    const std::string type = Value("TYPE");
+    file.primary = Value("PRIMARY");
+    file.bridge = Value("BRIDGE");
+    const std::string protocol = Lower(Value("BOOTPROTO"));
+
+    if (bridgeName != (type == "OVS")) {
+        Leave(bridgeName ? "ignored, because its TYPE is not OVS"
+                         : "ignored, because a plain interface cannot have TYPE=OVS");
+    } else if (bridgeName && kBridgePrefix + file.primary != file.name) {
+        Leave("ignored, because its PRIMARY is \"" + file.primary + "\"");
+    } else if (Lower(Value("SLAVE")) == "yes") {
+        Leave("it belongs to a bond");
+    } else if (protocol == "dhcp" || protocol == "bootp") {
+        Leave("BOOTPROTO=" + protocol + " is not supported yet");
+    } else if (!protocol.empty() && protocol != "none" && protocol != "static") {
+        Leave("BOOTPROTO=" + protocol + " is unknown");
+    } else if (!bridgeName && !file.bridge.empty() && file.bridge != kBridgePrefix + file.name) {
+        Leave("BRIDGE=" + file.bridge + " is not supported yet");
+    } else {
+        file.use = bridgeName ? FileUse::kBridge : FileUse::kPlain;
+    }
+}
+
+void Parser::ReadLinkKeys()
+{
+    InterfaceFile& file = m_parsed.file;
+    file.onBoot = YesOrNo("ONBOOT").value_or(true);
+    file.mtu = Number("MTU", 68, 65535);
+    file.metric = Number("METRIC", 0, UINT32_MAX);
+    file.vlanId = Number("OVS_VLAN_ID", 0, 4095);
+    file.requiredMac = Lower(Value("HWADDR"));
+    if (!Value("MACADDR").empty()) {
+        Refuse("MACADDR", "changing the link address is not supported yet");
+    }
+}
+
+void Parser::ReadIpv4Address(const std::string& number)
+{
+    const std::string key = "IPADDR" + number;
+    std::string text = Value(key);
+    if (text.empty()) {
+        return;
+    }
+    std::optional<unsigned> length;
+    if (const auto slash = text.find('/'); slash != std::string::npos) {
+        length = ToNumber(text.substr(slash + 1), 0, 32);
+        text.resize(slash);
+    } else if (!Value("PREFIX" + number).empty()) {
+        length = Number("PREFIX" + number, 0, 32);
+    } else if (!Value("NETMASK" + number).empty()) {
+        length = MaskLength(Value("NETMASK" + number));
+        if (!length) {
+            Refuse("NETMASK" + number, "not a netmask");
+        }
+    }
+    const std::string local = NormalAddress(AF_INET, text);
+    if (local.empty()) {
+        Refuse(key, "not an IPv4 address");
+    } else if (!length) {
+        Refuse(key, "no length: neither PREFIX" + number + " nor NETMASK" + number + " is usable");
+    } else {
+        m_parsed.file.addresses.push_back({AF_INET, local, *length});
+    }
+}
+
+std::string Parser::ReadGateway(const std::string& key, int family)
+{
+    std::string text = Value(key);
+    // A zone says through which interface, and that is this one.
+    text.resize(std::min(text.size(), text.find('%')));
+    if (text.empty()) {
+        return {};
+    }
+    std::string gateway = NormalAddress(family, text);
+    if (gateway.empty()) {
+        Refuse(key, family == AF_INET ? "not an IPv4 address" : "not an IPv6 address");
+    }
+    return gateway;
+}
+
+void Parser::ReadIpv4()
+{
+    ReadIpv4Address("");
+    for (unsigned i = 0; i < kMostNumberedAddresses; ++i) {
+        ReadIpv4Address(std::to_string(i));
+    }
+    m_parsed.file.gateway = ReadGateway("GATEWAY", AF_INET);
+}
+
+void Parser::ReadIpv6Address(const std::string& key, const std::string& text)
+{
+    const auto slash = text.find('/');
+    const auto length =
+        slash == std::string::npos ? std::optional(64U) : ToNumber(text.substr(slash + 1), 0, 128);
+    const std::string local = NormalAddress(AF_INET6, text.substr(0, slash));
+    if (local.empty() || !length) {
+        Refuse(key, "not an IPv6 address with its length");
+        return;
+    }
+    m_parsed.file.addresses.push_back({AF_INET6, local, *length});
+}
+
+void Parser::ReadIpv6()
+{
+    if (YesOrNo("IPV6INIT") == false) {
+        return;
+    }
+    m_parsed.file.autoconf = YesOrNo("IPV6_AUTOCONF");
+    if (const std::string address = Value("IPV6ADDR"); !address.empty()) {
+        ReadIpv6Address("IPV6ADDR", address);
+    }
+    std::istringstream secondaries(Value("IPV6ADDR_SECONDARIES"));
+    for (std::string address; secondaries >> address;) {
+        ReadIpv6Address("IPV6ADDR_SECONDARIES", address);
+    }
+    m_parsed.file.gateway6 = ReadGateway("IPV6_DEFAULTGW", AF_INET6);
+}
+
+ParsedFile Parser::Parse()
+{
+    if (!IsOwnFile()) {
+        return m_parsed;
+    }
+    DecideUse();
+    if (m_parsed.file.use != FileUse::kLeaveAlone) {
+        ReadLinkKeys();
+        ReadIpv4();
+        ReadIpv6();
+    }
+    return m_parsed;
 }
 
 } // namespace
@@ -23,11 +324,34 @@ std::optional<KeyValueFile> LoadInterfaceFile(const std::string& interface)
     if (!IsInterfaceName(interface)) {
         return std::nullopt;
     }
-    auto file = KeyValueFile::Load("/etc/sysconfig/network-scripts/ifcfg-" + interface);
+    auto file =
+        KeyValueFile::Load(std::string(kConfigurationFolder) + "/" + kFilePrefix + interface);
     if (file && !IsFileOf(*file, interface)) {
         return std::nullopt;
     }
     return file;
+}
+
+std::string InterfaceOfFileName(const std::string& fileName)
+{
+    constexpr std::array kForeignEndings{"~",        ".bak",      ".orig",     ".old",
+                                         ".rpmsave", ".rpmnew",   ".rpmorig",  ".swp",
+                                         ".tmp",     ".dpkg-old", ".dpkg-new", ".dpkg-dist"};
+    if (fileName.rfind(kFilePrefix, 0) != 0) {
+        return {};
+    }
+    const std::string name = fileName.substr(sizeof kFilePrefix - 1);
+    const bool foreign = std::any_of(
+        kForeignEndings.begin(), kForeignEndings.end(), [&](const std::string_view ending) {
+            return name.size() > ending.size() &&
+                   name.compare(name.size() - ending.size(), ending.size(), ending) == 0;
+        });
+    return !foreign && IsInterfaceName(name) ? name : std::string();
+}
+
+ParsedFile ParseInterfaceFile(const std::string& name, const std::string& text)
+{
+    return Parser(name, text).Parse();
 }
 
 } // namespace vornhost

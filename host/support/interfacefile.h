@@ -1,23 +1,80 @@
 /**
- * The configuration files of interfaces, "ifcfg-" and the interface's name, as the platform's
- * libraries look at them.
+ * The configuration file of one interface, "ifcfg-NAME": parsed, never run.
  */
 #ifndef VORNHOST_SUPPORT_INTERFACEFILE_H
 #define VORNHOST_SUPPORT_INTERFACEFILE_H
 
 #include "keyvaluefile.h"
+#include "remark.h"
 
 #include <optional>
 #include <string>
+#include <vector>
 
 namespace vornhost {
 
+/** What a file is good for. */
+enum class FileUse {
+    kNone,      ///< There is no such file.
+    kPlain,     ///< It describes a plain interface.
+    kBridge,    ///< It describes the switch bridge that stands for the interface in "primary".
+    kLeaveAlone ///< Unreadable, half written or not supported: what is live stays as it is.
+};
+
+/** An address that a file asks for. */
+struct WantedAddress {
+    int family = 0;
+    std::string local;
+    unsigned prefixLength = 0;
+
+    bool operator==(const WantedAddress&) const = default;
+};
+
+/** What one file asks for. */
+struct InterfaceFile {
+    std::string name;
+    FileUse use = FileUse::kNone;
+    std::string primary; ///< The plain interface of a bridge file.
+    std::string bridge;  ///< The bridge that a plain file names.
+    bool onBoot = true;
+    bool whole = true; ///< No value was refused: what is missing here is really not wanted.
+    std::optional<unsigned> mtu;
+    std::optional<unsigned> metric;
+    std::optional<unsigned> vlanId;
+    std::optional<bool> autoconf; ///< Whether IPv6 addresses are taken from routers.
+    std::string requiredMac;      ///< The interface must have this link address.
+    std::vector<WantedAddress> addresses;
+    std::string gateway;
+    std::string gateway6;
+};
+
+/** A parsed file and what there is to say about it. */
+struct ParsedFile {
+    InterfaceFile file;
+    std::vector<Remark> remarks;
+};
+
+/** The folder of the configuration files. */
+constexpr char kConfigurationFolder[] = "/etc/sysconfig/network-scripts";
+
 /**
- * Reads the configuration file of an interface.
+ * Reads the keys of an interface's configuration file.
  * @return  nothing when there is none, it cannot be read, or its DEVICE says that it is another
  *          interface's; a copy of the interface's own bridge's file counts as the interface's.
  */
 std::optional<KeyValueFile> LoadInterfaceFile(const std::string& interface);
+
+/**
+ * Tells the interface that a file of the configuration folder describes.
+ * @return  empty for everything that is no such file: backups, temporary and foreign files.
+ */
+std::string InterfaceOfFileName(const std::string& fileName);
+
+/**
+ * Parses the text of the file of one interface. A value that cannot be one is refused with a
+ * remark that names file, key and value; the rest of the file counts.
+ */
+ParsedFile ParseInterfaceFile(const std::string& name, const std::string& text);
 
 } // namespace vornhost
 

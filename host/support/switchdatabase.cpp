@@ -3,8 +3,6 @@
 #include "databaseclient.h"
 
 #include <algorithm>
-#include <chrono>
-#include <map>
 #include <nlohmann/json.hpp>
 
 namespace vornhost {
@@ -14,16 +12,13 @@ namespace {
 using nlohmann::json;
 
 constexpr char kSocket[] = "/var/run/openvswitch/db.sock";
-constexpr std::chrono::seconds kLimit(10);
 
-constexpr char kRequest[] =
-    R"({"method":"transact","id":0,"params":["Open_vSwitch",)"
-    R"({"op":"select","table":"Bridge","where":[],)"
-    R"("columns":["name","ports"]},)"
-    R"({"op":"select","table":"Port","where":[],)"
-    R"("columns":["_uuid","name","interfaces","bond_mode","external_ids"]},)"
-    R"({"op":"select","table":"Interface","where":[],)"
-    R"("columns":["_uuid","name"]}]})";
+constexpr char kRequest[] = R"({"method":"transact","id":0,"params":["Open_vSwitch",)"
+                            R"({"op":"select","table":"Bridge","where":[],"columns":)"
+                            R"(["name","ports","external_ids","other_config","datapath_type"]},)"
+                            R"({"op":"select","table":"Port","where":[]},)"
+                            R"({"op":"select","table":"Interface","where":[],"columns":)"
+                            R"(["_uuid","name","ofport","error","mtu_request","lacp_current"]}]})";
 
 // A reference is ["uuid", text]; a column of several values ["set", [values]].
 std::string Reference(const json& value)
@@ -44,12 +39,53 @@ std::vector<std::string> References(const json& column)
 }
 
 // A column of pairs is ["map", [[key, value]]].
-bool HoldsMark(const json& column)
+SwitchValues Pairs(const json& row, const char* column)
 {
-    const json& pairs = column.at(1);
-    return std::any_of(pairs.begin(), pairs.end(), [](const json& pair) {
-        return pair.at(0) == kSwitchMarkKey && pair.at(1) == kSwitchMarkValue;
-    });
+    SwitchValues values;
+    if (row.contains(column)) {
+        for (const json& pair : row.at(column).at(1)) {
+            values[pair.at(0).get<std::string>()] = pair.at(1).get<std::string>();
+        }
+    }
+    return values;
+}
+
+bool HoldsMark(const SwitchValues& externalIds)
+{
+    const auto mark = externalIds.find(kSwitchMarkKey);
+    return mark != externalIds.end() && mark->second == kSwitchMarkValue;
+}
+
+std::optional<unsigned> Number(const json& row, const char* column)
+{
+    const auto found = row.find(column);
+    if (found == row.end() || !found->is_number_unsigned()) {
+        return std::nullopt;
+    }
+    return found->get<unsigned>();
+}
+
+std::string Text(const json& row, const char* column)
+{
+    const auto found = row.find(column);
+    return found != row.end() && found->is_string() ? found->get<std::string>() : "";
+}
+
+// What a column holds, when that is one value and says something.
+SwitchValues SingleValues(const json& row)
+{
+    SwitchValues values;
+    for (const auto& [column, value] : row.items()) {
+        if (column == "name") {
+            continue;
+        }
+        if (value.is_string() && !value.get<std::string>().empty()) {
+            values[column] = value.get<std::string>();
+        } else if (value.is_number() || value.is_boolean()) {
+            values[column] = value.dump();
+        }
+    }
+    return values;
 }
 
 bool ByName(const SwitchPort& one, const SwitchPort& other)
@@ -57,26 +93,49 @@ bool ByName(const SwitchPort& one, const SwitchPort& other)
     return one.name < other.name;
 }
 
+using InterfaceRows = std::map<std::string, json>;
 using Ports = std::map<std::string, SwitchPort>;
+
+void ParseInterface(const json& row, SwitchPort& port)
+{
+    const auto name = row.at("name").get<std::string>();
+    if (port.interfaces.empty()) {
+        port.mtuRequest = Number(row, "mtu_request");
+    }
+    port.interfaces.push_back(name);
+    if (Number(row, "ofport") && Text(row, "error").empty()) {
+        port.working.push_back(name);
+    }
+    port.negotiated = port.negotiated || row.value("lacp_current", json()) == json(true);
+}
+
+SwitchPort ParsePort(const json& row, const InterfaceRows& interfaces)
+{
+    SwitchPort port;
+    port.name = row.at("name").get<std::string>();
+    for (const std::string& interface : References(row.at("interfaces"))) {
+        ParseInterface(interfaces.at(interface), port);
+    }
+    std::sort(port.interfaces.begin(), port.interfaces.end());
+    std::sort(port.working.begin(), port.working.end());
+    port.columns = SingleValues(row);
+    port.otherConfig = Pairs(row, "other_config");
+    port.externalIds = Pairs(row, "external_ids");
+    port.bond = port.interfaces.size() > 1 || port.columns.contains("bond_mode");
+    port.marked = HoldsMark(port.externalIds);
+    port.tag = Number(row, "tag");
+    return port;
+}
 
 Ports ParsePorts(const json& portRows, const json& interfaceRows)
 {
-    std::map<std::string, std::string> interfaceNames;
+    InterfaceRows interfaces;
     for (const json& row : interfaceRows) {
-        interfaceNames[Reference(row.at("_uuid"))] = row.at("name").get<std::string>();
+        interfaces[Reference(row.at("_uuid"))] = row;
     }
-
     Ports ports;
     for (const json& row : portRows) {
-        SwitchPort port;
-        port.name = row.at("name").get<std::string>();
-        for (const std::string& interface : References(row.at("interfaces"))) {
-            port.interfaces.push_back(interfaceNames.at(interface));
-        }
-        std::sort(port.interfaces.begin(), port.interfaces.end());
-        port.bond = port.interfaces.size() > 1 || row.at("bond_mode").is_string();
-        port.marked = HoldsMark(row.at("external_ids"));
-        ports[Reference(row.at("_uuid"))] = port;
+        ports[Reference(row.at("_uuid"))] = ParsePort(row, interfaces);
     }
     return ports;
 }
@@ -91,6 +150,9 @@ std::vector<SwitchBridge> ParseBridges(const json& rows, const Ports& ports)
             bridge.ports.push_back(ports.at(port));
         }
         std::sort(bridge.ports.begin(), bridge.ports.end(), ByName);
+        bridge.marked = HoldsMark(Pairs(row, "external_ids"));
+        bridge.hwaddr = Pairs(row, "other_config")["hwaddr"];
+        bridge.datapathType = Text(row, "datapath_type");
         bridges.push_back(bridge);
     }
     std::sort(
@@ -116,10 +178,17 @@ std::optional<std::vector<SwitchBridge>> ParseSwitchReply(std::string_view reply
     }
 }
 
-std::optional<std::vector<SwitchBridge>> ReadSwitch()
+std::optional<std::vector<SwitchBridge>> ReadSwitch(std::chrono::milliseconds limit)
 {
-    const auto reply = AskDatabase(kSocket, kRequest, kLimit);
+    const auto reply = AskDatabase(kSocket, kRequest, limit);
     return reply ? ParseSwitchReply(*reply) : std::nullopt;
+}
+
+const SwitchPort* SwitchBridge::FindPort(const std::string& port) const
+{
+    const auto found = std::find_if(ports.begin(), ports.end(),
+                                    [&](const SwitchPort& each) { return each.name == port; });
+    return found == ports.end() ? nullptr : &*found;
 }
 
 const SwitchPort* FindUplink(const SwitchBridge& bridge, const std::string& primary)

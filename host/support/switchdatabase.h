@@ -4,6 +4,8 @@
 #ifndef VORNHOST_SUPPORT_SWITCHDATABASE_H
 #define VORNHOST_SUPPORT_SWITCHDATABASE_H
 
+#include <chrono>
+#include <map>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -15,20 +17,34 @@ namespace vornhost {
 constexpr char kSwitchMarkKey[] = "vornovs-network";
 constexpr char kSwitchMarkValue[] = "rc.network";
 
+/** Columns of text and numbers, or the pairs of one column, by name. */
+using SwitchValues = std::map<std::string, std::string>;
+
 struct SwitchPort {
     std::string name;
-    std::vector<std::string> interfaces; /**< sorted */
-    bool bond = false;                   /**< several interfaces, or a bond's mode */
-    bool marked = false;                 /**< made by the network program */
+    std::vector<std::string> interfaces; ///< Sorted.
+    bool bond = false;                   ///< Several interfaces, or a bond's mode.
+    bool marked = false;                 ///< Made by the network program.
+    std::optional<unsigned> tag{};
+    std::vector<std::string> working{};   ///< Those of the interfaces that the switch has opened.
+    std::optional<unsigned> mtuRequest{}; ///< Of its first interface.
+    bool negotiated = false;              ///< The partner of one of the interfaces speaks LACP.
+    SwitchValues columns{};               ///< bond_mode, lacp... without those that are empty.
+    SwitchValues otherConfig{};
+    SwitchValues externalIds{};
 
     bool operator==(const SwitchPort&) const = default;
 };
 
 struct SwitchBridge {
     std::string name;
-    std::vector<SwitchPort> ports; /**< sorted; the one of the bridge's own name is among them */
+    std::vector<SwitchPort> ports; ///< Sorted; the one of the bridge's own name is among them.
+    bool marked = false;           ///< Made by the network program.
+    std::string hwaddr{};          ///< The link address that it was given.
+    std::string datapathType{};    ///< Empty or "system" for the kernel's.
 
     bool operator==(const SwitchBridge&) const = default;
+    const SwitchPort* FindPort(const std::string& port) const;
 };
 
 /**
@@ -40,9 +56,10 @@ std::optional<std::vector<SwitchBridge>> ParseSwitchReply(std::string_view reply
 /**
  * Asks the database server at its socket. No process is started, as this runs in client programs
  * of any size that may treat their children as they like.
- * @return  nothing when the server does not answer within some seconds.
+ * @return  nothing when the server does not answer in time.
  */
-std::optional<std::vector<SwitchBridge>> ReadSwitch();
+std::optional<std::vector<SwitchBridge>>
+ReadSwitch(std::chrono::milliseconds limit = std::chrono::seconds(10));
 
 /**
  * Finds the port through which a bridge reaches the wire: the one of that name, else one that the

@@ -1,4 +1,4 @@
-#include "rcnetwork/interfacefile.h"
+#include "support/interfacefile.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>

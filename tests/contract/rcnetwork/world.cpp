@@ -149,8 +149,9 @@ SwitchPort ReadPort(const std::string& name, const Json& json)
 {
     SwitchPort port;
     port.name = name;
-    port.ours = json.value("ours", true);
-    port.working = json.value("working", true);
+    port.marked = json.value("ours", true);
+    port.interfaces = json.value("interfaces", std::vector<std::string>{name});
+    port.working = json.value("working", true) ? port.interfaces : std::vector<std::string>();
     if (json.contains("tag")) {
         port.tag = json.at("tag").get<unsigned>();
     }
@@ -167,9 +168,9 @@ SwitchState ReadSwitch(const Json& json)
     state.hung = json.value("hung", false);
     const Json bridges = json.value("bridges", Json::object());
     for (const auto& [name, bridge] : bridges.items()) {
-        SwitchBridge& made = state.bridges[name];
+        SwitchBridge& made = state.bridges.emplace_back();
         made.name = name;
-        made.ours = bridge.value("ours", true);
+        made.marked = bridge.value("ours", true);
         made.hwaddr = bridge.value("hwaddr", "");
         for (const auto& [portName, port] : bridge.at("ports").items()) {
             made.ports.push_back(ReadPort(portName, port));

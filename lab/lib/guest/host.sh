@@ -200,20 +200,21 @@ switch_value()
 # Linux bond's.
 expect_bond_on_switch()
 {
-    local bond="$1" bridge="ovs_$1" slave linux mode lacp name
+    local bond="$1" bridge="ovs_$1" slave linux mode lacp name slaves
     linux="$(sed -n 's/^BONDING_OPTS=.*mode=\([^ "]*\).*/\1/p' "$lab_out/plain-ifcfg-$bond")"
     case $linux in
         active-backup | 1) mode=active-backup lacp=off name=ovs-active-backup ;;
         802.3ad | 4) mode=balance-tcp lacp=active name=ovs-balance-tcp ;;
         *) mode=balance-slb lacp=off name=ovs-balance-slb ;;
     esac
-    expect_switch_bond "$bond" "$mode" "$lacp" $(slaves_of "$bond")
+    mapfile -t slaves < <(slaves_of "$bond")
+    expect_switch_bond "$bond" "$mode" "$lacp" "${slaves[@]}"
     expect_bridge_like "$bond"
     expect_line "$lab_ifcfg$bridge" "DEVICE=$bridge"
     expect_line "$lab_ifcfg$bridge" "BOND_MODE=$name"
     expect_line "$lab_ifcfg$bridge" "BONDING_OPTS=\"bond_mode=$mode lacp=$lacp\""
-    expect_line "$lab_ifcfg$bridge" "SLAVE_LIST=\"$(slaves_of "$bond" | tr '\n' ' ')\""
-    for slave in $(slaves_of "$bond"); do
+    expect_line "$lab_ifcfg$bridge" "SLAVE_LIST=\"$(printf '%s ' "${slaves[@]}")\""
+    for slave in "${slaves[@]}"; do
         expect_line "$lab_ifcfg$slave" "MASTER=$bridge"
         expect_line "$lab_ifcfg$slave" "SLAVE=yes"
         expect_line "${lab_ifcfg}ovs_$slave" "SLAVE=yes"

@@ -1,4 +1,4 @@
-# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
+# shellcheck shell=bash disable=SC2154,SC2034 # variables of the guest's other files
 
 rounds=12
 seed=20260101
@@ -9,11 +9,11 @@ lab_probe_after=1
 made_topology=/lab/topology/topology
 made_files=/lab/topology/host$lab_ifcfg
 
-# one_of WORD...
+# one_of WORD...: sets $chosen. Starts no subshell, which would throw dice of its own.
 one_of()
 {
-    local chosen=$((RANDOM % $# + 1))
-    printf '%s' "${!chosen}"
+    chosen=$((RANDOM % $# + 1))
+    chosen="${!chosen}"
 }
 
 # True in so many of a hundred cases.
@@ -26,7 +26,8 @@ chance()
 make_addressing()
 {
     local interface="$1" number="$2" prefix outside
-    prefix="$(one_of 16 22 24 28 30)"
+    one_of 16 22 24 28 30
+    prefix="$chosen"
     outside="outside $interface 10.$number.0.1/$prefix"
     echo "IPADDR=10.$number.0.2"
     echo "PREFIX=$prefix"
@@ -45,9 +46,11 @@ make_addressing()
     echo "$outside" >>"$made_topology"
 }
 
+# bonding_options MODE SLAVE: sets $options.
 bonding_options()
 {
-    local options="mode=$1 miimon=$(one_of 50 100)"
+    one_of 50 100
+    options="mode=$1 miimon=$chosen"
     if chance 30; then
         options="$options updelay=200 downdelay=200"
     fi
@@ -57,10 +60,15 @@ bonding_options()
                 options="$options primary=$2"
             fi
             ;;
-        802.3ad) options="$options lacp_rate=fast xmit_hash_policy=$(one_of layer2 layer3+4)" ;;
-        balance-xor) options="$options xmit_hash_policy=$(one_of layer2 layer2+3)" ;;
+        802.3ad)
+            one_of layer2 layer3+4
+            options="$options lacp_rate=fast xmit_hash_policy=$chosen"
+            ;;
+        balance-xor)
+            one_of layer2 layer2+3
+            options="$options xmit_hash_policy=$chosen"
+            ;;
     esac
-    echo "$options"
 }
 
 # make_interface NAME NUMBER: a file's common keys and its network, on itself or on a VLAN.
@@ -70,7 +78,8 @@ make_interface()
     echo "DEVICE=$name"
     echo "ONBOOT=yes"
     if chance 30; then
-        echo "MTU=$(one_of 1400 1480 9000)"
+        one_of 1400 1480 9000
+        echo "MTU=$chosen"
     fi
     if chance 40; then
         vlan="$name.$((RANDOM % 4000 + 2))"
@@ -89,7 +98,8 @@ make_bond()
 {
     local number="$1" mode slave
     shift
-    mode="$(one_of active-backup balance-xor 802.3ad)"
+    one_of active-backup balance-xor 802.3ad
+    mode="$chosen"
     case $mode in
         active-backup) echo "switch bond0 $*" ;;
         802.3ad) echo "partner bond0 mode=802.3ad,miimon=100,lacp_rate=fast $*" ;;
@@ -97,7 +107,8 @@ make_bond()
     esac >>"$made_topology"
     {
         make_interface bond0 "$number"
-        echo "BONDING_OPTS=\"$(bonding_options "$mode" "$1")\""
+        bonding_options "$mode" "$1"
+        echo "BONDING_OPTS=\"$options\""
     } >"${made_files}bond0"
     for slave in "$@"; do
         printf '# Cable %s\nDEVICE=%s\nMASTER=bond0\nSLAVE=yes\n' "${slave#eth}" "$slave" \

@@ -6,10 +6,11 @@
 // been answered the file OUTPUT.ready is made and the counting begins. SIGUSR1 begins the next
 // phase. SIGTERM ends: a line a target is written to OUTPUT, separated by tabs:
 //
-//   LABEL TARGET[@SOURCE] GAP AT ANSWERED SENT [ANSWERED SENT of the next phase]...
+//   LABEL TARGET[@SOURCE] GAP AT ANSWERED SENT PHASE-GAP [ANSWERED SENT PHASE-GAP]...
 //
 // GAP is the longest time between two answers beyond the interval, in ms, the time from the last
-// answer to the end included; AT is when it began, in seconds since the counting began.
+// answer to the end included; AT is when it began, in seconds since the counting began. PHASE-GAP
+// is the longest of those that began in the phase.
 //
 // One program for all targets and both namespaces: with one timer for everything the guest wakes up
 // once an interval, and two programs would keep each other waiting.
@@ -37,7 +38,7 @@
 namespace {
 
 constexpr std::size_t kSequences = 65536;
-constexpr std::size_t kPhases = 8;
+constexpr std::size_t kPhases = 32;
 constexpr double kLateAnswers = 0.2; // seconds that the last probes are given
 
 volatile std::sig_atomic_t g_phase = 0;
@@ -73,6 +74,8 @@ struct Target {
     double gapBegan = 0;
     std::array<unsigned, kPhases> sent{};
     std::array<unsigned, kPhases> answered{};
+    std::array<double, kPhases> phaseGap{};
+    std::size_t lastPhase = 0; // in which the last answer came
     std::vector<std::uint8_t> phaseOf = std::vector<std::uint8_t>(kSequences);
 };
 
@@ -191,10 +194,12 @@ void Send(Target& target, std::size_t number, std::uint16_t sequence)
 
 void NoteGap(Target& target, double until, double interval)
 {
-    if (until - target.lastAnswer - interval > target.gap) {
-        target.gap = until - target.lastAnswer - interval;
+    const double gap = until - target.lastAnswer - interval;
+    if (gap > target.gap) {
+        target.gap = gap;
         target.gapBegan = target.lastAnswer;
     }
+    target.phaseGap[target.lastPhase] = std::max(target.phaseGap[target.lastPhase], gap);
 }
 
 void Receive(int socket, std::vector<Target>& targets, double interval)
@@ -222,6 +227,7 @@ void Receive(int socket, std::vector<Target>& targets, double interval)
         const double now = Now();
         NoteGap(target, now, interval);
         target.lastAnswer = now;
+        target.lastPhase = static_cast<std::size_t>(g_phase);
         ++target.answered[target.phaseOf[sequence]];
     }
 }
@@ -239,6 +245,7 @@ void Restart(std::vector<Target>& targets)
         target.gapBegan = target.lastAnswer;
         target.sent = {};
         target.answered = {};
+        target.phaseGap = {};
     }
 }
 
@@ -253,7 +260,8 @@ void Report(const std::string& path, const std::vector<Target>& targets, double 
                      target.gap * 1000, target.gapBegan - began);
         for (int phase = 0; phase <= g_phase; ++phase) {
             const auto index = static_cast<std::size_t>(phase);
-            std::fprintf(file, "\t%u\t%u", target.answered[index], target.sent[index]);
+            std::fprintf(file, "\t%u\t%u\t%.1f", target.answered[index], target.sent[index],
+                         target.phaseGap[index] * 1000);
         }
         std::fputc('\n', file);
     }

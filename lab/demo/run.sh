@@ -31,29 +31,39 @@ since_begin()
     awk -v begin="$begin" -v now="$EPOCHREALTIME" 'BEGIN { printf "%7.3f s", now - begin }'
 }
 
-every_port()
+# every KINDS COMMAND...: the command holds for each interface of these kinds.
+every()
 {
-    local port
-    for port in $(host_ports); do
-        "$@" "$port" || return 1
+    local kinds="$1" interface
+    shift
+    # shellcheck disable=SC2086 # words
+    for interface in $(host_of_kind $kinds); do
+        "$@" "$interface" || return 1
     done
 }
 
+link_there() { [ -e "/sys/class/net/$1" ]; }
+link_gone() { [ ! -e "/sys/class/net/$1" ]; }
 bridge_file_written() { [ -e "${lab_ifcfg}ovs_$1" ]; }
 bridge_file_gone() { [ ! -e "${lab_ifcfg}ovs_$1" ]; }
-bridge_made() { [ -e "/sys/class/net/ovs_$1" ]; }
-bridge_gone() { [ ! -e "/sys/class/net/ovs_$1" ]; }
+bridge_made() { link_there "ovs_$1"; }
+bridge_gone() { link_gone "ovs_$1"; }
+tag_written() { grep -q "^OVS_VLAN_ID=${1##*.}\$" "${lab_ifcfg}ovs_${1%.*}" 2>/dev/null; }
+tag_gone() { ! tag_written "$1"; }
 somebody_registered() { [ -s "$lab_state/ovs_reg.conf" ]; }
 nobody_registered() { [ ! -s "$lab_state/ovs_reg.conf" ]; }
 switch_runs() { [ -e /run/openvswitch/ovs-vswitchd.pid ]; }
 
-# tell_stage TEXT CONDITION...: prints the text once, when the condition first holds.
+# tell_stage TEXT CONDITION...: prints the text once, when the condition first holds; the probes
+# count from there on as another phase.
 tell_stage()
 {
     local text="$1"
     shift
     if [[ $told != *"|$text|"* ]] && "$@"; then
         told="$told|$text|"
+        probes_next_phase
+        echo "$text" >>"$lab_out/stages"
         printf '    %s  %s\n' "$(since_begin)" "$text"
     fi
 }
@@ -64,6 +74,7 @@ run_and_tell()
     local pid status=0 stages="$1"
     shift
     told='|'
+    echo "the client is started" >"$lab_out/stages"
     echo "\$ $*"
     probes_next_phase
     begin="$EPOCHREALTIME"
@@ -74,9 +85,8 @@ run_and_tell()
         pause 0.01
     done
     wait "$pid" || status=$?
-    probes_next_phase
     "$stages"
-    printf '    %s  the client is done\n' "$(since_begin)"
+    tell_stage "the client is done" true
     sed 's/^/    /' "$lab_out/client-output"
     [ "$status" -eq 0 ] || fail "'$*' ended with $status"
 }
@@ -84,20 +94,27 @@ run_and_tell()
 stages_of_registration()
 {
     tell_stage "the client's name is recorded" somebody_registered
-    tell_stage "every bridge has its configuration file" every_port bridge_file_written
+    tell_stage "the Linux VLAN is removed" every vlan link_gone
+    tell_stage "the Linux bond is taken apart" every bond link_gone
     tell_stage "the switch's daemons run" switch_runs
-    tell_stage "every bridge is there" every_port bridge_made
+    tell_stage "each port has its bridge" every slave bridge_made
+    tell_stage "the bond is one of the switch" every "port bond" bridge_made
+    tell_stage "the VLAN is the tag of its bridge" every vlan tag_written
 }
 
 stages_of_withdrawal()
 {
     tell_stage "nobody is registered any more" nobody_registered
+    tell_stage "the tag is taken off" every vlan tag_gone
+    tell_stage "the switch's bond is taken apart" every bond bridge_gone
     tell_stage "every bridge's configuration file is folded back into its port's" \
-        every_port bridge_file_gone
-    tell_stage "every bridge is gone" every_port bridge_gone
+        every "port bond" bridge_file_gone
+    tell_stage "every bridge is gone" every "port bond" bridge_gone
+    tell_stage "the Linux bond is back" every bond link_there
+    tell_stage "the Linux VLAN is back" every vlan link_there
 }
 
-# What the probes saw before, during and after the client's run.
+# What the probes saw before, during and after the client's run, and the longest gap of each stage.
 tell_traffic()
 {
     printf '    %-40s %13s %13s %13s  %s\n' "echo every 5 ms, answered" before during after \
@@ -111,8 +128,22 @@ tell_traffic()
         } else {
             what = "second host to " ends[1]
         }
-        printf "    %-40s %13s %13s %13s  %s ms\n", what, $5 " of " $6, $7 " of " $8, $9 " of " $10, $3
+        answered = sent = 0
+        for (i = 8; i < NF - 2; i += 3) {
+            answered += $i
+            sent += $(i + 1)
+        }
+        printf "    %-40s %13s %13s %13s  %s ms\n", what, $5 " of " $6, answered " of " sent,
+            $(NF - 2) " of " $(NF - 1), $3
     }' "$lab_out/probes"
+    echo "    the longest gap that began after each stage, of any address:"
+    awk -F '\t' 'NR == FNR { stage[NR] = $0; stages = NR; next }
+        { for (i = 1; i <= stages; i++) {
+              gap = $(7 + 3 * i)
+              if (gap > worst[i]) worst[i] = gap
+          } }
+        END { for (i = 1; i <= stages; i++) printf "    %10.1f ms  %s\n", worst[i], stage[i] }' \
+        "$lab_out/stages" "$lab_out/probes"
 }
 
 # worst NAME: the longer of the outages of both directions.
@@ -126,7 +157,7 @@ worst()
 tell_comparison()
 {
     local subject lines
-    for subject in links addresses routes groups sysctls switch file-modes; do
+    for subject in links addresses routes groups sysctls bonds switch file-modes; do
         lines="$(wc -l <"$lab_out/snapshots/plain/$subject")"
         if diff -q "$lab_out/snapshots/plain/$subject" "$lab_out/snapshots/home/$subject" \
             >/dev/null; then
@@ -164,7 +195,8 @@ tell_host
 echo "the switch:"
 ovs-vsctl --timeout=10 show | sed 's/^/    /'
 expect_on_switch
-echo "Every bridge has its port's addresses, hardware address, MTU and gateway."
+echo "Every bridge has the addresses, hardware address, MTU and gateway of what it stands for; the bond"
+echo "is one of the switch in the mode that stands for its own, and the VLAN is its bridge's tag."
 
 heading "The client unregisters"
 probes_start
@@ -181,5 +213,5 @@ snapshot home
 tell_comparison
 expect_unchanged plain home
 
-printf '\nProved: %s ports went on to the switch and came back, the host answered throughout (longest gap %s ms there, %s ms back), and everything is what it was.\n' \
-    "$(host_ports | wc -l)" "$(worst Register)" "$(worst UnRegister)"
+printf '\nProved: a port, a bond and a VLAN went on to the switch and came back, the host answered throughout (longest gap %s ms there, %s ms back), and everything is what it was.\n' \
+    "$(worst Register)" "$(worst UnRegister)"

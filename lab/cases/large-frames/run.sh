@@ -7,7 +7,6 @@ expect_large_echo()
     in_outside fping -6 -q -r 3 -b 8900 fd10:0:0:a0::2 || fail "nor is one of IPv6"
 }
 
-in_outside ip link set out-eth0 mtu 9000
 expect_equal "the MTU of eth0" 9000 "$(cat /sys/class/net/eth0/mtu)"
 expect_large_echo
 remember_plain

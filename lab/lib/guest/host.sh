@@ -18,13 +18,76 @@ timed()
     [ "$status" -eq 0 ] || fail "'$*' ended with $status"
 }
 
-# The ports whose interfaces have a file, so that they go on to the switch; in order of name.
-host_ports()
+# The interfaces that have a file, in order of name.
+host_interfaces()
 {
     local file
     for file in /lab/topology/host"$lab_ifcfg"*; do
         echo "${file##*/ifcfg-}"
     done
+}
+
+# kind_of INTERFACE: bond, slave, vlan or port, as its file says.
+kind_of()
+{
+    local file="/lab/topology/host$lab_ifcfg$1"
+    if grep -q '^BONDING_OPTS=' "$file"; then
+        echo bond
+    elif grep -q '^MASTER=' "$file"; then
+        echo slave
+    elif grep -q '^VLAN=yes' "$file"; then
+        echo vlan
+    else
+        echo port
+    fi
+}
+
+# host_of_kind KIND...: the interfaces of these kinds.
+host_of_kind()
+{
+    local interface kind
+    for interface in $(host_interfaces); do
+        kind="$(kind_of "$interface")"
+        case " $* " in
+            *" $kind "*) echo "$interface" ;;
+        esac
+    done
+}
+
+# The interfaces that get a bridge of their own when the host goes on to the switch.
+host_ports()
+{
+    host_of_kind port bond
+}
+
+# The slaves of a Linux bond, as its slaves' files say.
+slaves_of()
+{
+    local interface
+    for interface in $(host_of_kind slave); do
+        if grep -q "^MASTER=$1\$" "/lab/topology/host$lab_ifcfg$interface"; then
+            echo "$interface"
+        fi
+    done
+}
+
+# The VLAN on an interface; empty when there is none.
+vlan_on()
+{
+    local interface
+    for interface in $(host_of_kind vlan); do
+        if [ "${interface%.*}" = "$1" ]; then
+            echo "$interface"
+        fi
+    done
+}
+
+# The interface whose addresses the bridge of a port or bond takes over.
+addressed()
+{
+    local vlan
+    vlan="$(vlan_on "$1")"
+    echo "${vlan:-$1}"
 }
 
 # The address and prefix length that a device has now, link-local ones left out.
@@ -39,27 +102,68 @@ default_routes()
         sed -e 's/ proto [^ ]*//' -e 's/ pref medium//' -e 's/ *$//' | sort
 }
 
-# Remembers how the ports look in plain Linux networking.
+# Remembers how the interfaces look in plain Linux networking.
 remember_plain()
 {
-    local port
+    local name
+    wait_until 30 bonds_settled
     snapshot plain
     default_routes >"$lab_out/plain-default-routes"
-    for port in $(host_ports); do
-        addresses_of "$port" >"$lab_out/plain-addresses-$port"
-        cp -p "$lab_ifcfg$port" "$lab_out/plain-ifcfg-$port"
+    for name in $(host_interfaces); do
+        addresses_of "$name" >"$lab_out/plain-addresses-$name"
+        cat "/sys/class/net/$name/address" >"$lab_out/plain-mac-$name"
+        cat "/sys/class/net/$name/mtu" >"$lab_out/plain-mtu-$name"
+        cp -p "$lab_ifcfg$name" "$lab_out/plain-ifcfg-$name"
     done
 }
 
-# Every port of the host is carried by its bridge.
+# True when each Linux bond has as many ports in use as its mode gives it, and agrees with its
+# partner where it has one.
+bonds_settled()
+{
+    local bond folder slave
+    for bond in $(host_of_kind bond); do
+        folder="/sys/class/net/$bond/bonding"
+        [ -d "$folder" ] || return 1
+        for slave in $(slaves_of "$bond"); do
+            [ "$(cat "/sys/class/net/$slave/bonding_slave/mii_status" 2>/dev/null)" = up ] || return 1
+        done
+        if grep -q '802.3ad' "$folder/mode"; then
+            expect_partner "$bond" || return 1
+        fi
+    done
+}
+
+# True when the Linux bond's aggregate has all its ports and a partner.
+expect_partner()
+{
+    local folder="/sys/class/net/$1/bonding" slave state ports=0
+    for slave in $(slaves_of "$1"); do
+        ports=$((ports + 1))
+        state="$(cat "/sys/class/net/$slave/bonding_slave/ad_partner_oper_port_state")"
+        # Collecting and distributing.
+        [ $((state & 48)) -eq 48 ] || return 1
+    done
+    [ "$(cat "$folder/ad_num_ports")" = "$ports" ] &&
+        [ "$(cat "$folder/ad_partner_mac")" != 00:00:00:00:00:00 ]
+}
+
+# Every port and bond of the host is carried by its bridge.
 expect_on_switch()
 {
-    local port
-    for port in $(host_ports); do
-        expect_port_on_switch "$port"
-        expect_bridge_files "$port"
+    local name
+    for name in $(host_of_kind port); do
+        expect_port_on_switch "$name"
+        [ -n "$(vlan_on "$name")" ] || expect_bridge_files "$name"
     done
-    sed -E 's/ dev / dev ovs_/' "$lab_out/plain-default-routes" | sort >"$lab_out/wanted-routes"
+    for name in $(host_of_kind bond); do
+        expect_bond_on_switch "$name"
+    done
+    for name in $(host_of_kind vlan); do
+        expect_vlan_on_switch "$name"
+    done
+    sed -E 's/ dev ([^. ]*)(\.[0-9]+)?/ dev ovs_\1/' "$lab_out/plain-default-routes" | sort \
+        >"$lab_out/wanted-routes"
     default_routes >"$lab_out/got-routes"
     expect_same_text "the default routes" "$lab_out/wanted-routes" "$lab_out/got-routes"
 }
@@ -68,13 +172,93 @@ expect_port_on_switch()
 {
     local port="$1" bridge="ovs_$1"
     expect_equal "the bridge of $port" "$bridge" "$(ovs-vsctl --timeout=10 port-to-br "$port" 2>&1)"
-    expect_equal "the hardware address of $bridge" "$(cat "/sys/class/net/$port/address")" \
-        "$(cat "/sys/class/net/$bridge/address")"
-    expect_equal "the MTU of $bridge" "$(cat "/sys/class/net/$port/mtu")" \
-        "$(cat "/sys/class/net/$bridge/mtu")"
+    expect_equal "the hardware address of $port" "$(cat "$lab_out/plain-mac-$port")" \
+        "$(cat "/sys/class/net/$port/address")"
     expect_equal "the addresses of $port" "" "$(addresses_of "$port")"
-    expect_equal "the addresses of $bridge" "$(cat "$lab_out/plain-addresses-$port")" \
-        "$(addresses_of "$bridge")"
+    expect_bridge_like "$port"
+}
+
+# The bridge has the hardware address, MTU and addresses of the interface that it stands for.
+expect_bridge_like()
+{
+    local name="$1" bridge="ovs_$1"
+    expect_equal "the hardware address of $bridge" "$(cat "$lab_out/plain-mac-$name")" \
+        "$(cat "/sys/class/net/$bridge/address")"
+    expect_equal "the MTU of $bridge" "$(cat "$lab_out/plain-mtu-$name")" \
+        "$(cat "/sys/class/net/$bridge/mtu")"
+    expect_equal "the addresses of $bridge" \
+        "$(cat "$lab_out/plain-addresses-$(addressed "$name")")" "$(addresses_of "$bridge")"
+}
+
+# switch_value TABLE RECORD COLUMN, without quotes
+switch_value()
+{
+    ovs-vsctl --timeout=10 --if-exists get "$1" "$2" "$3" | tr -d '"'
+}
+
+# The Linux bond is gone and its slaves are one bond of the switch, in the mode that stands for the
+# Linux bond's.
+expect_bond_on_switch()
+{
+    local bond="$1" bridge="ovs_$1" slave linux mode lacp name slaves
+    linux="$(sed -n 's/^BONDING_OPTS=.*mode=\([^ "]*\).*/\1/p' "$lab_out/plain-ifcfg-$bond")"
+    case $linux in
+        active-backup | 1) mode=active-backup lacp=off name=ovs-active-backup ;;
+        802.3ad | 4) mode=balance-tcp lacp=active name=ovs-balance-tcp ;;
+        *) mode=balance-slb lacp=off name=ovs-balance-slb ;;
+    esac
+    mapfile -t slaves < <(slaves_of "$bond")
+    expect_switch_bond "$bond" "$mode" "$lacp" "${slaves[@]}"
+    expect_bridge_like "$bond"
+    expect_line "$lab_ifcfg$bridge" "DEVICE=$bridge"
+    expect_line "$lab_ifcfg$bridge" "BOND_MODE=$name"
+    expect_line "$lab_ifcfg$bridge" "BONDING_OPTS=\"bond_mode=$mode lacp=$lacp\""
+    expect_line "$lab_ifcfg$bridge" "SLAVE_LIST=\"$(printf '%s ' "${slaves[@]}")\""
+    for slave in "${slaves[@]}"; do
+        expect_line "$lab_ifcfg$slave" "MASTER=$bridge"
+        expect_line "$lab_ifcfg$slave" "SLAVE=yes"
+        expect_line "${lab_ifcfg}ovs_$slave" "SLAVE=yes"
+    done
+    [ ! -e "/sys/class/net/$bond" ] || fail "the Linux bond $bond is there still"
+    [ ! -e "$lab_ifcfg$bond" ] || fail "the Linux bond $bond has a file still"
+}
+
+# expect_switch_bond BOND MODE LACP SLAVE...: the bridge of a bond, its mode and its members.
+expect_switch_bond()
+{
+    local bridge="ovs_${1#ovs_}" mode="$2" lacp="$3" port slave
+    shift 3
+    expect_equal "the members of $bridge" "$(printf '%s\n' "$@" | sort)" \
+        "$(ovs-vsctl --timeout=10 list-ifaces "$bridge" 2>&1 | sort)"
+    port="$(ovs-vsctl --timeout=10 list-ports "$bridge")"
+    expect_equal "the mode of $bridge" "$mode" "$(switch_value Port "$port" bond_mode)"
+    expect_equal "LACP of $bridge" "$lacp" "$(switch_value Port "$port" lacp)"
+    if [ "$lacp" = active ]; then
+        wait_until 30 switch_negotiated "$port"
+    fi
+    for slave in "$@"; do
+        [ ! -e "/sys/class/net/ovs_$slave" ] || fail "the bridge ovs_$slave is there still"
+        expect_equal "the addresses of $slave" "" "$(addresses_of "$slave")"
+        expect_equal "IPv6 of $slave is off" 1 "$(cat "/proc/sys/net/ipv6/conf/$slave/disable_ipv6")"
+    done
+}
+
+# True when the switch agreed with its partner on every member of a bond.
+switch_negotiated()
+{
+    ovs-appctl --timeout=10 lacp/show "$1" >"$lab_out/lacp" || return 1
+    grep -q 'status: .*negotiated' "$lab_out/lacp" &&
+        ! grep -E '^(member|slave):' "$lab_out/lacp" | grep -v ': current attached'
+}
+
+# The VLAN's interface is gone, and its id is the tag of its parent's bridge.
+expect_vlan_on_switch()
+{
+    local parent="${1%.*}" id="${1##*.}"
+    expect_equal "the tag of ovs_$parent" "$id" "$(switch_value Port "ovs_$parent" tag)"
+    expect_line "${lab_ifcfg}ovs_$parent" "OVS_VLAN_ID=$id"
+    [ ! -e "/sys/class/net/$1" ] || fail "the VLAN interface $1 is there still"
+    [ ! -e "$lab_ifcfg$1" ] || fail "the VLAN interface $1 has a file still"
 }
 
 # The bridge's file is the port's with three keys changed, and the port's gained one.
@@ -103,6 +287,7 @@ expect_same_text()
 # The host is plain again and in everything what it was.
 expect_plain()
 {
+    wait_until 60 bonds_settled
     snapshot "${1:-home}"
     expect_unchanged plain "${1:-home}"
 }

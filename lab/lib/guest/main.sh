@@ -14,6 +14,8 @@
 . /lab/probes.sh
 # shellcheck source=host.sh
 . /lab/host.sh
+# shellcheck source=roundtrip.sh
+. /lab/roundtrip.sh
 # shellcheck source=killed.sh
 . /lab/killed.sh
 

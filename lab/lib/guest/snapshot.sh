@@ -13,6 +13,7 @@ snapshot()
     snapshot_routes >"$folder/routes"
     snapshot_groups >"$folder/groups"
     snapshot_sysctls >"$folder/sysctls"
+    snapshot_bonds >"$folder/bonds"
     snapshot_switch >"$folder/switch"
     snapshot_files "$folder"
 }
@@ -23,12 +24,13 @@ addresses_settled()
     [ -z "$(ip -6 -oneline address show tentative)" ]
 }
 
-# Interface numbers change when a device is made anew and say nothing; the switch's own device is
-# part of the switch.
+# Numbers of interfaces and aggregates change when a device is made anew, failures of a cable are
+# counted from then on, and say nothing; the switch's own device is part of the switch.
 snapshot_links()
 {
     ip -details -oneline link show |
         sed -E -e 's/^[0-9]+: //' -e 's/@(if)?[0-9]+:/:/' -e 's/ link-netns(id)? [^ ]+//' \
+            -e 's/ (ad_aggregator(_id)?|link_failure_count) [0-9]+//g' \
             -e 's/\\//g' -e 's/  +/ /g' |
         sed '/^ovs-system:/d' | sort
 }
@@ -61,6 +63,16 @@ snapshot_sysctls()
     { grep -rs . /proc/sys/net/ipv4/conf /proc/sys/net/ipv6/conf /proc/sys/net/ipv4/neigh \
         /proc/sys/net/ipv6/neigh || true; } |
         sed -e '/\/ovs-system\//d' -e 's|^/proc/sys/||' | sort
+}
+
+# Every option of every bond, and the slaves in their order.
+snapshot_bonds()
+{
+    local folder
+    for folder in /sys/class/net/*/bonding; do
+        [ -d "$folder" ] || continue
+        grep -rs . "$folder" | sed -e "s|^/sys/class/net/||" -e '/\/ad_aggregator:/d'
+    done | sort
 }
 
 snapshot_switch()

@@ -7,7 +7,11 @@
 # A topology's file `topology` has these lines:
 #   port NAME KIND MAC      KIND veth: a pair of the guest's kernel, fastest and exactly repeatable
 #                                virtio: a PCI card, connected to one of the outside's
-#   outside NAME ADDRESS... the outside's addresses on the port's segment
+#   switch NAME PORT...     the other ends of these ports are on one Ethernet switch
+#   partner NAME OPTION=VALUE[,OPTION=VALUE]... PORT...
+#                           the other ends of these ports are a bond with these options
+#   outside NAME ADDRESS... the outside's addresses on the segment of a port, a switch or a partner;
+#                           NAME.ID means the VLAN of that id on it
 #   far ADDRESS...          addresses of a host behind the gateways
 # Its folder `host` is laid over the appliance's file system.
 
@@ -34,6 +38,12 @@ topology_build()
     done </lab/topology/topology
     while read -r word name rest; do
         case $word in
+            switch) topology_switch "$name" "$rest" ;;
+            partner) topology_partner "$name" "${rest%% *}" "${rest#* }" ;;
+        esac
+    done </lab/topology/topology
+    while read -r word name rest; do
+        case $word in
             outside) topology_outside "$name" "$rest" ;;
             far) topology_far "$name $rest" ;;
         esac
@@ -57,7 +67,7 @@ topology_port()
         topology_rename "$peer_mac" "out-$name"
         ip link set "out-$name" netns outside
     fi
-    in_outside ip link set "out-$name" up
+    in_outside ip link set "out-$name" mtu 9000 up
 }
 
 # The kernel numbers cards as it finds them, which takes names that ports want.
@@ -84,9 +94,37 @@ topology_rename()
     fail "no card has the address $1"
 }
 
+# A switch that learns at once where an address is, and keeps nothing from passing.
+topology_switch()
+{
+    local port
+    in_outside ip link add "out-$1" type bridge stp_state 0 forward_delay 0
+    for port in $2; do
+        in_outside ip link set "out-$port" master "out-$1"
+    done
+    in_outside ip link set "out-$1" mtu 9000 up
+}
+
+# topology_partner NAME OPTIONS PORTS
+topology_partner()
+{
+    local port options="${2//[,=]/ }"
+    # shellcheck disable=SC2086 # words
+    in_outside ip link add "out-$1" type bond $options
+    for port in $3; do
+        in_outside ip link set "out-$port" down
+        in_outside ip link set "out-$port" master "out-$1"
+    done
+    in_outside ip link set "out-$1" up
+}
+
 topology_outside()
 {
     local address
+    if [[ $1 == *.* ]]; then
+        in_outside ip link add link "out-${1%.*}" name "out-$1" type vlan id "${1##*.}"
+        in_outside ip link set "out-$1" up
+    fi
     for address in $2; do
         in_outside ip address add "$address" dev "out-$1"
     done

@@ -1,0 +1,280 @@
+#include "bondoptions.h"
+
+#include <algorithm>
+#include <array>
+#include <charconv>
+#include <fstream>
+#include <iterator>
+#include <sstream>
+
+namespace vornhost {
+namespace {
+
+constexpr char kMode[] = "mode";
+constexpr char kArpTargets[] = "arp_ip_target";
+
+/** What decides how an option is read and where it counts. */
+struct Option {
+    std::string_view name;
+    std::string_view initial; ///< What a new bond has.
+    std::string_view named;   ///< Names of the values 0, 1...; or none.
+    std::string_view modes;   ///< Where it counts; none: everywhere.
+    bool twin = false;        ///< The switch has the like.
+};
+
+constexpr std::string_view kModeNames =
+    "balance-rr active-backup balance-xor broadcast 802.3ad balance-tlb balance-alb";
+constexpr std::string_view kNumbers = "";
+constexpr std::string_view kAllModes = "";
+constexpr std::string_view kWithPrimary = "active-backup balance-tlb balance-alb";
+constexpr std::string_view kWithLacp = "802.3ad";
+constexpr std::string_view kWithHash = "balance-xor 802.3ad balance-tlb";
+constexpr std::string_view kWithArp = "balance-rr active-backup balance-xor broadcast";
+constexpr std::string_view kLearning = "balance-tlb balance-alb";
+constexpr std::string_view kRoundRobin = "balance-rr";
+constexpr std::string_view kNoYes = "off on";
+constexpr std::string_view kMacPolicies = "none active follow";
+constexpr std::string_view kValidations =
+    "none active backup all filter filter_active filter_backup";
+constexpr std::string_view kAnyAll = "any all";
+constexpr std::string_view kSelections = "stable bandwidth count";
+constexpr std::string_view kRates = "slow fast";
+constexpr std::string_view kReselections = "always better failure";
+constexpr std::string_view kHashes = "layer2 layer3+4 layer2+3 encap2+3 encap3+4 vlan+srcmac";
+
+constexpr std::array kOptions{
+    Option{"mode", "balance-rr", kModeNames, kAllModes, true},
+    Option{"ad_actor_sys_prio", "65535", kNumbers, kWithLacp, true},
+    Option{"ad_actor_system", "00:00:00:00:00:00", kNumbers, kWithLacp, true},
+    Option{"ad_select", "stable", kSelections, kWithLacp},
+    Option{"ad_user_port_key", "0", kNumbers, kWithLacp},
+    Option{"all_slaves_active", "0", kNumbers, kAllModes},
+    Option{"arp_all_targets", "any", kAnyAll, kWithArp},
+    Option{"arp_interval", "0", kNumbers, kWithArp},
+    Option{"arp_ip_target", "", kNumbers, kWithArp},
+    Option{"arp_missed_max", "2", kNumbers, kWithArp},
+    Option{"arp_validate", "none", kValidations, kWithArp},
+    Option{"downdelay", "0", kNumbers, kAllModes, true},
+    Option{"fail_over_mac", "none", kMacPolicies, kAllModes},
+    Option{"lacp_active", "on", kNoYes, kWithLacp},
+    Option{"lacp_rate", "slow", kRates, kWithLacp, true},
+    Option{"lp_interval", "1", kNumbers, kAllModes},
+    Option{"miimon", "0", kNumbers, kAllModes, true},
+    Option{"min_links", "0", kNumbers, kAllModes},
+    Option{"ns_ip6_target", "", kNumbers, kWithArp},
+    Option{"num_grat_arp", "1", kNumbers, kAllModes},
+    Option{"num_unsol_na", "1", kNumbers, kAllModes},
+    Option{"packets_per_slave", "1", kNumbers, kRoundRobin},
+    Option{"peer_notif_delay", "0", kNumbers, kAllModes},
+    Option{"primary", "", kNumbers, kWithPrimary, true},
+    Option{"primary_reselect", "always", kReselections, kWithPrimary},
+    Option{"resend_igmp", "1", kNumbers, kAllModes},
+    Option{"tlb_dynamic_lb", "1", kNumbers, kLearning},
+    Option{"updelay", "0", kNumbers, kAllModes, true},
+    Option{"use_carrier", "1", kNumbers, kAllModes, true},
+    Option{"xmit_hash_policy", "layer2", kHashes, kWithHash},
+};
+
+const Option* FindOption(std::string_view name)
+{
+    const auto* const found = std::find_if(kOptions.begin(), kOptions.end(),
+                                           [&](const Option& each) { return each.name == name; });
+    return found == kOptions.end() ? nullptr : found;
+}
+
+std::vector<std::string> Words(std::string_view text)
+{
+    std::istringstream stream{std::string(text)};
+    return {std::istream_iterator<std::string>(stream), std::istream_iterator<std::string>()};
+}
+
+bool CountsIn(const Option& option, const std::string& mode)
+{
+    const auto modes = Words(option.modes);
+    return modes.empty() || std::find(modes.begin(), modes.end(), mode) != modes.end();
+}
+
+/** Takes the kernel's number of a named value for the name; all else stays. */
+std::string NamedValue(const std::string& option, const std::string& value)
+{
+    const Option* const known = FindOption(option);
+    const auto names = Words(known == nullptr ? "" : known->named);
+    std::size_t number = 0;
+    const char* const end = value.data() + value.size();
+    const auto [stop, error] = std::from_chars(value.data(), end, number);
+    const bool isNumber = error == std::errc() && stop == end;
+    return isNumber && number < names.size() ? names[number] : value;
+}
+
+/** Without the sign by which the kernel is told to add an address to its list. */
+std::string WithoutSigns(std::string list)
+{
+    std::erase(list, '+');
+    return list;
+}
+
+std::string FirstLine(const std::string& path)
+{
+    std::ifstream file(path);
+    std::string line;
+    std::getline(file, line);
+    return line;
+}
+
+std::string LiveFolder(const std::string& bond)
+{
+    return std::string(kInterfaceFolder) + '/' + bond + "/bonding/";
+}
+
+/** The kernel shows a named value as "fast 1" and a list as "one two". */
+std::string LiveValue(const Option& option, const std::string& line)
+{
+    const auto words = Words(line);
+    if (words.empty() || !option.named.empty()) {
+        return words.empty() ? "" : words[0];
+    }
+    std::string list;
+    for (const std::string& word : words) {
+        list += (list.empty() ? "" : ",") + word;
+    }
+    return list;
+}
+
+bool IsInitial(const std::string& name, const std::string& value)
+{
+    const Option* const option = FindOption(name);
+    return option != nullptr && value == option->initial;
+}
+
+} // namespace
+
+BondOptions BondOptions::Parse(std::string_view text)
+{
+    BondOptions options;
+    for (const std::string& word : Words(text)) {
+        const auto equals = word.find('=');
+        if (equals == 0 || equals == std::string::npos) {
+            continue;
+        }
+        const std::string name = word.substr(0, equals);
+        std::string value = word.substr(equals + 1);
+        if (name == kArpTargets) {
+            const std::string former = options.Get(name);
+            value = former + (former.empty() ? "" : ",") + WithoutSigns(value);
+        }
+        options.values[name] = NamedValue(name, value);
+    }
+    return options;
+}
+
+std::optional<BondOptions> BondOptions::ReadLive(const std::string& bond)
+{
+    BondOptions options;
+    for (const Option& option : kOptions) {
+        const std::string name(option.name);
+        const std::string value = LiveValue(option, FirstLine(LiveFolder(bond) + name));
+        if (!value.empty()) {
+            options.values[name] = value;
+        }
+    }
+    return options.Get(kMode).empty() ? std::nullopt : std::optional<BondOptions>(options);
+}
+
+std::string BondOptions::Get(const std::string& name) const
+{
+    const auto found = values.find(name);
+    return found == values.end() ? "" : found->second;
+}
+
+std::string BondOptions::Text() const
+{
+    // The mode comes first: it decides which others the kernel takes.
+    std::string text = values.contains(kMode) ? std::string(kMode) + '=' + Get(kMode) : "";
+    for (const auto& [name, value] : values) {
+        if (name != kMode) {
+            text += (text.empty() ? "" : " ") + name + '=' + value;
+        }
+    }
+    return text;
+}
+
+BondOptions BondOptions::OverlaidWith(const BondOptions& other) const
+{
+    BondOptions both = other;
+    both.values.insert(values.begin(), values.end());
+    return both;
+}
+
+BondOptions BondOptions::WithMode(const std::string& mode) const
+{
+    BondOptions changed = *this;
+    std::erase_if(changed.values, [&](const auto& entry) {
+        const Option* const option = FindOption(entry.first);
+        return option != nullptr && !CountsIn(*option, mode);
+    });
+    changed.values[kMode] = mode;
+    const auto isOff = [&](const char* name) {
+        return changed.Get(name).empty() || changed.Get(name) == "0";
+    };
+    if (isOff("miimon") && isOff("arp_interval")) {
+        changed.values["miimon"] = "100";
+    }
+    return changed;
+}
+
+std::optional<std::vector<std::string>> ReadLiveSlaves(const std::string& bond)
+{
+    std::ifstream file(LiveFolder(bond) + "slaves");
+    if (!file) {
+        return std::nullopt;
+    }
+    std::string line;
+    std::getline(file, line);
+    std::vector<std::string> slaves = Words(line);
+    // Where a page is too small for all names, the kernel says so with a word of its own.
+    if (!slaves.empty() && slaves.back().starts_with("++")) {
+        return std::nullopt;
+    }
+    return slaves;
+}
+
+std::map<std::string, std::string> SwitchColumns(const BondOptions& options)
+{
+    const std::string mode = options.Get(kMode);
+    std::map<std::string, std::string> columns;
+    const auto add = [&](const char* name, const char* column) {
+        const std::string value = options.Get(name);
+        const Option* const option = FindOption(name);
+        if (!value.empty() && value != option->initial && CountsIn(*option, mode)) {
+            columns[column] = value;
+        }
+    };
+    add("updelay", "bond_updelay");
+    add("downdelay", "bond_downdelay");
+    add("miimon", "other_config:bond-miimon-interval");
+    add("primary", "other_config:bond-primary");
+    add("lacp_rate", "other_config:lacp-time");
+    add("ad_actor_system", "other_config:lacp-system-id");
+    add("ad_actor_sys_prio", "other_config:lacp-system-priority");
+    // Both ask the driver for its carrier unless they are told to read the card's registers.
+    if (options.Get("use_carrier") == "0") {
+        columns["other_config:bond-detect-mode"] = "miimon";
+    }
+    return columns;
+}
+
+std::vector<std::string> WithoutTwin(const BondOptions& options)
+{
+    const std::string mode = options.Get(kMode);
+    std::vector<std::string> lost;
+    for (const auto& [name, value] : options.values) {
+        const Option* const option = FindOption(name);
+        const bool counts = option == nullptr || (!option->twin && CountsIn(*option, mode));
+        if (counts && !IsInitial(name, value)) {
+            lost.push_back(name + '=' + value);
+        }
+    }
+    return lost;
+}
+
+} // namespace vornhost

@@ -241,9 +241,9 @@ void Decider::CheckPort()
                                                  : "there is no interface " + m_unit.name);
         m_unit.target = Target::kLeaveAlone;
     } else if (!HasRequiredMac()) {
-        Say(Severity::kError, "ifcfg-" + m_unit.file->name + ": HWADDR=" +
-                                  m_unit.file->requiredMac + ", but " + m_unit.name + " has " +
-                                  m_unit.port->mac + "; it is left as it is");
+        Say(Severity::kError, "ifcfg-" + m_unit.file->name +
+                                  ": HWADDR=" + m_unit.file->requiredMac + ", but " + m_unit.name +
+                                  " has " + m_unit.port->mac + "; it is left as it is");
         m_unit.target = Target::kLeaveAlone;
     } else {
         CheckMaster();
@@ -264,9 +264,8 @@ bool Decider::IsOwnMaster(const std::string& master) const
 /** An interface that belongs to something else cannot go on our bridge. */
 void Decider::CheckMaster()
 {
-    const std::vector<const Link*> ports = m_unit.kind == UnitKind::kBond
-                                               ? m_unit.members
-                                               : m_unit.Ports();
+    const std::vector<const Link*> ports =
+        m_unit.kind == UnitKind::kBond ? m_unit.members : m_unit.Ports();
     for (const Link* port : ports) {
         std::string owner;
         const std::string master = m_inputs.live.NameOf(port->master);
@@ -386,7 +385,7 @@ std::set<std::string> NamesToDecide(const Inputs& inputs)
 bool IsExcused(const Inputs& inputs, const Kinship& kinship, const std::string& name)
 {
     return inputs.request.known.contains(name) || !kinship.HeirOf(name).empty() ||
-           !kinship.MasterOf(name).empty() || inputs.live.FindLink(name) != nullptr;
+           !kinship.MasterOf(name).empty();
 }
 
 /** In the order in which they came up, so that routes are made in the order in which they stood. */

@@ -71,8 +71,7 @@ Handover ParseHandover(const std::string& text, unsigned long second)
         handover.tags = json.at("tags").get<std::map<std::string, unsigned>>();
         for (const auto& [name, bond] : json.at("bonds").items()) {
             handover.bonds[name] = {bond.at("members").get<std::vector<std::string>>(),
-                                    bond.at("mac").get<std::string>(),
-                                    bond.at("lacp").get<bool>()};
+                                    bond.at("mac").get<std::string>(), bond.at("lacp").get<bool>()};
         }
     } catch (const std::exception&) {
         return {};
@@ -80,9 +79,14 @@ Handover ParseHandover(const std::string& text, unsigned long second)
     return handover;
 }
 
+bool IsPartOfConversion()
+{
+    return std::getenv(kHoldMark) != nullptr;
+}
+
 Handover LoadHandover()
 {
-    if (std::getenv(kHoldMark) == nullptr) {
+    if (!IsPartOfConversion()) {
         return {};
     }
     std::ifstream file(kHandoverPath);

@@ -34,6 +34,9 @@ struct Handover {
     bool IsSilent(const std::string& name) const;
 };
 
+/** Whether this run is one of the steps of a conversion. */
+bool IsPartOfConversion();
+
 /** @return  an empty one when there is none, it is too old, or this run is no part of it. */
 Handover LoadHandover();
 

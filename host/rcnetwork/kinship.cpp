@@ -229,6 +229,23 @@ std::vector<std::string> Kinship::LegaciesOf(const std::string& unit) const
     return legacies;
 }
 
+std::string Kinship::ParentFor(const FileVlan& vlan) const
+{
+    const std::string bridge = BridgeFor(vlan.parent);
+    const auto handed = m_inputs.handover.bonds.find(vlan.parent);
+    const bool onSwitch = IsWantedOnSwitch(vlan.parent);
+    if (!onSwitch &&
+        (m_inputs.live.FindLink(vlan.parent) != nullptr || IsWantedBond(vlan.parent))) {
+        const std::string heir = HeirOf(vlan.parent);
+        return heir.empty() ? vlan.parent : heir;
+    }
+    if (onSwitch || m_inputs.live.FindLink(bridge) != nullptr) {
+        const std::string heir = HeirOf(vlan.parent);
+        return heir.empty() ? bridge : heir;
+    }
+    return handed == m_inputs.handover.bonds.end() ? vlan.parent : handed->second.members.front();
+}
+
 std::set<std::string> Kinship::RelativesOf(const std::string& name) const
 {
     std::set<std::string> relatives{MasterOf(name), LiveMasterOf(name)};

@@ -41,6 +41,9 @@ public:
     /** @return  the bonds whose heir the unit is. */
     std::vector<std::string> LegaciesOf(const std::string& unit) const;
 
+    /** @return  what a VLAN's interface stands on, wherever that is now. */
+    std::string ParentFor(const FileVlan& vlan) const;
+
     /** @return  the interfaces that must be looked at together with those named. */
     std::set<std::string> Closure(std::set<std::string> names) const;
 

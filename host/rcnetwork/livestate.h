@@ -21,8 +21,8 @@ constexpr char kNewInterface[] = "default";
 
 /** A bond of the kernel. */
 struct LiveBond {
-    std::vector<std::string> members;             ///< In the order in which they joined.
-    std::map<std::string, std::string> ownMacs;   ///< What members are called again when they leave.
+    std::vector<std::string> members;           ///< In the order in which they joined.
+    std::map<std::string, std::string> ownMacs; ///< What members are called again when they leave.
     std::map<std::string, std::string> options{}; ///< As the kernel writes them.
 };
 

@@ -28,7 +28,7 @@ struct Request {
     std::set<std::string> names; ///< Plain interfaces; none: everything.
     /** Interfaces that the switch could not be made to carry: they stay reachable without it. */
     std::set<std::string> withoutSwitch;
-    bool switchHung = false; ///< It was asked before and did not answer.
+    bool switchHung = false;     ///< It was asked before and did not answer.
     std::set<std::string> known; ///< Named ones that were there when the run began.
 };
 

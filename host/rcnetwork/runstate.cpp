@@ -56,8 +56,7 @@ Json WriteRecord(const InterfaceRecord& record)
 bool InterfaceRecord::Empty() const
 {
     return addresses.empty() && routes.empty() && unchecked.empty() && !broughtUp && !made &&
-           ownMac.empty() && !formerMtu &&
-           !tag && formerSettings.empty();
+           ownMac.empty() && !formerMtu && !tag && formerSettings.empty();
 }
 
 RunState ParseRunState(const std::string& text)

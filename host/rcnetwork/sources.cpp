@@ -24,6 +24,7 @@ private:
     bool BelongsToAVlan(const Link& device, const std::string& base) const;
     bool HasAddresses(const Link& link) const;
     bool IsLate() const;
+    bool IsOnWrongParent() const;
 
     const Inputs& m_inputs;
     const Kinship& m_kinship;
@@ -42,8 +43,8 @@ void SourceFinder::Absorb()
     if (m_unit.tag) {
         for (const Link& link : m_inputs.live.links) {
             if (link.kind == "vlan" && !IsTagDevice(link) && m_unit.port != nullptr &&
-                link.parent == m_unit.port->index &&
-                link.vlanId == static_cast<int>(*m_unit.tag) && !m_kinship.HasFile(link.name)) {
+                link.parent == m_unit.port->index && link.vlanId == static_cast<int>(*m_unit.tag) &&
+                !m_kinship.HasFile(link.name)) {
                 absorbed.push_back(link.name);
             }
         }
@@ -78,9 +79,8 @@ void SourceFinder::NameCarrier()
     } else {
         m_unit.carrier = m_unit.name;
     }
-    m_unit.carrierLink = m_unit.target == Target::kSwitch
-                             ? m_unit.bridgeLink
-                             : m_inputs.live.FindLink(m_unit.carrier);
+    m_unit.carrierLink = m_unit.target == Target::kSwitch ? m_unit.bridgeLink
+                                                          : m_inputs.live.FindLink(m_unit.carrier);
 }
 
 bool SourceFinder::HasAddresses(const Link& link) const
@@ -142,6 +142,18 @@ void SourceFinder::Look(const std::string& base)
     }
 }
 
+/** A VLAN's interface whose bond has gone, or has gone on to the switch. */
+bool SourceFinder::IsOnWrongParent() const
+{
+    if (m_unit.kind != UnitKind::kVlan || m_unit.port == nullptr || !m_unit.addWanted) {
+        return false;
+    }
+    const FileVlan& vlan = *m_kinship.UsableFile(m_unit.name)->vlan;
+    const std::string parent = m_kinship.ParentFor(vlan);
+    return m_inputs.live.FindLink(parent) != nullptr &&
+           m_inputs.live.NameOf(m_unit.port->parent) != parent;
+}
+
 /** Whether the carrier cannot carry anything before something else has gone or come. */
 bool SourceFinder::IsLate() const
 {
@@ -154,7 +166,6 @@ bool SourceFinder::IsLate() const
                                   (m_unit.tag || m_unit.kind == UnitKind::kVlan);
             return !source.stays && (sameVlan || source.link->kind == "bond");
         });
-    const auto bond = m_inputs.live.bonds.find(m_unit.name);
     const bool gathers =
         m_unit.kind == UnitKind::kBond &&
         std::any_of(m_unit.members.begin(), m_unit.members.end(), [&](const Link* member) {
@@ -167,6 +178,13 @@ void SourceFinder::Run()
 {
     Absorb();
     NameCarrier();
+    if (IsOnWrongParent()) {
+        m_unit.rebuilt = true;
+        if (m_unit.carrierLink == m_unit.port) {
+            m_unit.carrierLink = nullptr;
+            m_unit.sources.push_back({m_unit.port, false});
+        }
+    }
     Look(m_unit.name);
     for (const std::string& base : m_unit.absorbed) {
         Look(base);

@@ -41,9 +41,9 @@ bool Unit::BridgeStays() const
 
 const Source* Unit::SourceOf(int index) const
 {
-    const auto found =
-        std::find_if(sources.begin(), sources.end(),
-                     [&](const Source& source) { return source.link->index == index; });
+    const auto found = std::find_if(sources.begin(), sources.end(), [&](const Source& source) {
+        return source.link->index == index;
+    });
     return found == sources.end() ? nullptr : &*found;
 }
 

@@ -40,11 +40,12 @@ struct Unit {
     bool takeDown = false;               ///< A stop: the link goes back to what it was, too.
     bool heldDown = false;               ///< Waits for its bond without traffic of its own.
 
-    std::vector<const Link*> members; ///< Of a bond that is asked for: those that exist.
-    std::optional<unsigned> tag;      ///< The VLAN in which the carrier's traffic shall be.
-    std::string carrier;              ///< The interface that shall carry addresses and routes...
+    std::vector<const Link*> members;  ///< Of a bond that is asked for: those that exist.
+    std::optional<unsigned> tag;       ///< The VLAN in which the carrier's traffic shall be.
+    std::string carrier;               ///< The interface that shall carry addresses and routes...
     const Link* carrierLink = nullptr; ///< ...null when there is none of that name yet...
     bool late = false;                 ///< ...and whether it can be used only once others let go.
+    bool rebuilt = false;              ///< A VLAN's interface that stands on the wrong one.
     std::vector<Source> sources;       ///< The most important one first.
     std::vector<std::string> absorbed; ///< Units of which it takes everything over.
 

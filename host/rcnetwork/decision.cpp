@@ -422,8 +422,7 @@ std::vector<Unit> DecideUnits(const Inputs& inputs, const Kinship& kinship,
         Unit unit = Decider(inputs, kinship, name, remarks).Decide();
         if (unit.target != Target::kLeaveAlone) {
             units.push_back(std::move(unit));
-        } else if (named && starts && kinship.MasterOf(name).empty() &&
-                   kinship.HeirOf(name).empty()) {
+        } else if (named && starts && !IsExcused(inputs, kinship, name)) {
             remarks.push_back({Severity::kError, name + " was not started"});
         }
     }

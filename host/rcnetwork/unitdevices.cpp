@@ -162,7 +162,9 @@ void UnitPlanner::GatherMember(const Link& member)
 {
     auto& lines = m_steps.move.links;
     InterfaceRecord& record = m_steps.records[member.name];
-    if (HasGlobalAddress(&member)) {
+    const auto& addresses = m_inputs.live.addresses;
+    if (std::any_of(addresses.begin(), addresses.end(),
+                    [&](const Address& address) { return address.index == member.index; })) {
         lines.push_back("addr flush dev " + member.name);
     }
     if (member.up) {

@@ -2,6 +2,7 @@
 
 #include "announce.h"
 #include "inputs.h"
+#include "readiness.h"
 
 #include "support/process.h"
 
@@ -20,9 +21,6 @@ constexpr std::chrono::seconds kToolDeadline{15};
 constexpr std::chrono::seconds kServiceDeadline{60};
 constexpr std::chrono::seconds kBridgeDeadline{8};
 constexpr std::chrono::milliseconds kBridgePoll{10};
-constexpr std::chrono::seconds kPartnerDeadline{15};
-constexpr std::chrono::milliseconds kPartnerPoll{100};
-constexpr std::chrono::seconds kReadLimit{5};
 
 std::vector<std::string> Words(const std::string& line)
 {
@@ -62,7 +60,7 @@ private:
     bool WaitForBridges(const Stage& stage);
     bool WriteSettings(const Stage& stage);
     void AnnounceAll(const Stage& stage);
-    void WaitForPartners(const Stage& stage);
+    void WaitForAll(const Stage& stage);
     bool ForgetGateways(const Stage& stage);
 
     const Plan& m_plan;
@@ -185,25 +183,12 @@ void Applier::AnnounceAll(const Stage& stage)
     }
 }
 
-/** A partner that does not speak the protocol is said, and the bond works through one member. */
-void Applier::WaitForPartners(const Stage& stage)
+/** What does not come is said; the traffic then waits until it does. */
+void Applier::WaitForAll(const Stage& stage)
 {
-    const auto deadline = std::chrono::steady_clock::now() + kPartnerDeadline;
     for (const std::string& line : stage.lines) {
-        const auto words = Words(line);
-        const auto agreed = [&] {
-            const auto bridges = ReadSwitch(kReadLimit);
-            return bridges && std::any_of(bridges->begin(), bridges->end(), [&](const auto& each) {
-                       const SwitchPort* port = each.FindPort(words.at(1));
-                       return each.name == words.at(0) && port != nullptr && port->negotiated;
-                   });
-        };
-        while (!agreed()) {
-            if (std::chrono::steady_clock::now() > deadline) {
-                (void)Fail("the partner of " + words.at(0) + " has not agreed on LACP");
-                break;
-            }
-            std::this_thread::sleep_for(kPartnerPoll);
+        if (!WaitFor(Words(line))) {
+            (void)Fail("still waiting for: " + line);
         }
     }
 }
@@ -239,7 +224,7 @@ bool Applier::Run(const Stage& stage)
         AnnounceAll(stage);
         return true;
     case StageKind::kReady:
-        WaitForPartners(stage);
+        WaitForAll(stage);
         return true;
     case StageKind::kGateways:
         break;

@@ -384,7 +384,9 @@ std::set<std::string> NamesToDecide(const Inputs& inputs)
 
 bool IsExcused(const Inputs& inputs, const Kinship& kinship, const std::string& name)
 {
-    return inputs.request.known.contains(name) || !kinship.HeirOf(name).empty() ||
+    const Link* link = inputs.live.FindLink(name);
+    const bool made = link != nullptr && (link->kind == "bond" || link->kind == "vlan");
+    return made || inputs.request.known.contains(name) || !kinship.HeirOf(name).empty() ||
            !kinship.MasterOf(name).empty();
 }
 

@@ -71,6 +71,7 @@ void AddStages(const Steps& steps, Plan& plan)
     AddStage(plan, StageKind::kSwitch, "make bridges", steps.makeBridges);
     AddStage(plan, StageKind::kWait, "wait for bridges", steps.waitFor);
     AddStage(plan, StageKind::kBatch, "make devices", steps.devices.Lines());
+    AddStage(plan, StageKind::kReady, "wait for links", steps.readyBefore);
     AddStage(plan, StageKind::kSettings, "settings before", steps.settingsBefore);
     AddStage(plan, StageKind::kBatch, "build beside", steps.beside.Lines());
     std::vector<std::string> joinAndLeave = Once(steps.leave);
@@ -78,6 +79,10 @@ void AddStages(const Steps& steps, Plan& plan)
     AddStage(plan, StageKind::kSwitch, "join and leave", joinAndLeave);
     AddStage(plan, StageKind::kBatch, "move", steps.move.Lines());
     AddStage(plan, StageKind::kAnnounce, "announce", steps.announce);
+    AddStage(plan, StageKind::kSwitch, "remove bridges", Once(steps.removeBridges));
+    AddStage(plan, StageKind::kBatch, "tidy", steps.tidy.Lines());
+    AddStage(plan, StageKind::kReady, "wait for members", steps.readyAfter);
+    AddStage(plan, StageKind::kBatch, "put in order", steps.order.Lines());
     AddStage(plan, StageKind::kSettings, "settings after", steps.settingsAfter);
     AddStage(plan, StageKind::kReady, "wait for partners", steps.negotiate);
     AddStage(plan, StageKind::kGateways, "forget gateways", steps.forgetGateways);

@@ -68,7 +68,7 @@ enum class StageKind {
     kSettings, ///< "INTERFACE SETTING VALUE"
     kBatch,    ///< Lines of one "ip -batch".
     kAnnounce, ///< "INTERFACE" whose place the network outside is told.
-    kReady,    ///< "BRIDGE PORT" of the switch whose partner must agree on LACP.
+    kReady,    ///< "KIND NAME..." that is waited for as long as that makes sense.
     kGateways  ///< "INTERFACE" whose gateway records are dropped.
 };
 

@@ -1,6 +1,7 @@
 #include "sources.h"
 
 #include <algorithm>
+#include <iterator>
 
 #include <linux/rtnetlink.h>
 
@@ -23,6 +24,8 @@ private:
     void Add(const Link* link, bool stays);
     bool BelongsToAVlan(const Link& device, const std::string& base) const;
     bool HasAddresses(const Link& link) const;
+    bool CanJoinAnyTime(const Link& member) const;
+    bool CarriesBefore() const;
     bool IsLate() const;
     bool IsOnWrongParent() const;
 
@@ -119,7 +122,7 @@ void SourceFinder::Look(const std::string& base)
     const bool replaced = m_unit.kind == UnitKind::kSwitchBond && base == m_unit.name;
     const bool device = link != nullptr && link->kind == "vlan" && base != m_unit.name;
     if (base != m_unit.bridge) {
-        Add(link, !legacy && !replaced && !device);
+        Add(link, legacy || (!replaced && !device));
     }
     for (const Link& each : m_inputs.live.links) {
         if (link != nullptr && IsTagDevice(each) && each.parent == link->index &&
@@ -138,7 +141,9 @@ void SourceFinder::Look(const std::string& base)
     other.target = Target::kPlain;
     other.switchBridge = m_inputs.switchState.Find(bridge);
     if (other.switchBridge != nullptr && other.switchBridge->marked) {
-        Add(m_inputs.live.FindLink(bridge), other.BridgeStays());
+        // From bridge to bridge the old one goes when no traffic waits for that any more.
+        const bool stays = m_unit.target == Target::kSwitch || other.BridgeStays();
+        Add(m_inputs.live.FindLink(bridge), stays);
     }
 }
 
@@ -154,6 +159,24 @@ bool SourceFinder::IsOnWrongParent() const
            m_inputs.live.NameOf(m_unit.port->parent) != parent;
 }
 
+/** Nothing goes through it, so nobody notices when it joins a bond. */
+bool SourceFinder::CanJoinAnyTime(const Link& member) const
+{
+    const auto& links = m_inputs.live.links;
+    const bool carriesVlan = std::any_of(links.begin(), links.end(), [&](const Link& link) {
+        return link.kind == "vlan" && link.parent == member.index;
+    });
+    return member.master == 0 && !HasAddresses(member) && !(carriesVlan && member.up);
+}
+
+/** Whether a new bond reaches the wire before the member that carries the traffic joins it. */
+bool SourceFinder::CarriesBefore() const
+{
+    return !m_unit.idle.empty() &&
+           std::all_of(m_unit.members.begin(), m_unit.members.end(),
+                       [](const Link* member) { return member->master == 0; });
+}
+
 /** Whether the carrier cannot carry anything before something else has gone or come. */
 bool SourceFinder::IsLate() const
 {
@@ -164,14 +187,12 @@ bool SourceFinder::IsLate() const
         std::any_of(m_unit.sources.begin(), m_unit.sources.end(), [&](const Source& source) {
             const bool sameVlan = source.link->kind == "vlan" && m_unit.carrierLink == nullptr &&
                                   (m_unit.tag || m_unit.kind == UnitKind::kVlan);
-            return !source.stays && (sameVlan || source.link->kind == "bond");
+            return !source.stays && sameVlan;
         });
-    const bool gathers =
-        m_unit.kind == UnitKind::kBond &&
-        std::any_of(m_unit.members.begin(), m_unit.members.end(), [&](const Link* member) {
-            return m_unit.port == nullptr || member->master != m_unit.port->index;
-        });
-    return replaces || gathers;
+    const bool gathers = m_unit.kind == UnitKind::kBond &&
+                         std::any_of(m_unit.members.begin(), m_unit.members.end(),
+                                     [&](const Link* member) { return !CanJoinAnyTime(*member); });
+    return replaces || (gathers && m_unit.port == nullptr && !CarriesBefore());
 }
 
 void SourceFinder::Run()
@@ -201,6 +222,10 @@ void SourceFinder::Run()
     }
     std::stable_partition(m_unit.sources.begin(), m_unit.sources.end(),
                           [&](const Source& source) { return HasAddresses(*source.link); });
+    if (m_unit.kind == UnitKind::kBond) {
+        std::copy_if(m_unit.members.begin(), m_unit.members.end(), std::back_inserter(m_unit.idle),
+                     [&](const Link* member) { return CanJoinAnyTime(*member); });
+    }
     m_unit.late = IsLate();
 }
 

@@ -142,7 +142,7 @@ bool SetSwitchBond(const std::string& bridge)
         return false;
     }
     return !columns.SpeaksLacp() || port.negotiated ||
-           Apply({StageKind::kReady, "wait for partners", {bridge + " " + port.name}});
+           Apply({StageKind::kReady, "wait for partners", {"switch " + bridge + " " + port.name}});
 }
 
 } // namespace vornhost

@@ -41,6 +41,7 @@ struct Unit {
     bool heldDown = false;               ///< Waits for its bond without traffic of its own.
 
     std::vector<const Link*> members;  ///< Of a bond that is asked for: those that exist.
+    std::vector<const Link*> idle;     ///< Those of them that can join before any traffic moves.
     std::optional<unsigned> tag;       ///< The VLAN in which the carrier's traffic shall be.
     std::string carrier;               ///< The interface that shall carry addresses and routes...
     const Link* carrierLink = nullptr; ///< ...null when there is none of that name yet...

@@ -10,6 +10,8 @@ namespace vornhost {
 namespace {
 
 /** The kernel takes the others only once these are set. */
+constexpr char kLacpMode[] = "802.3ad";
+constexpr char kJoinDelay[] = "updelay";
 constexpr std::array kFirstOptions{"mode", "miimon", "arp_interval"};
 
 std::string OptionLine(const std::string& bond, const std::string& name, const std::string& value)
@@ -46,12 +48,17 @@ std::vector<std::string> InOrder(const BondOptions& options)
 
 } // namespace
 
+/** Whether the interface is to become a member of the bond. */
+bool UnitPlanner::IsMissing(const Link& member) const
+{
+    return m_unit.port == nullptr || member.master != m_unit.port->index;
+}
+
+/** Whether everything is taken from the interface because it joins a bond at once. */
 bool UnitPlanner::IsGathered(const Link& link) const
 {
-    const auto& members = m_unit.members;
-    return m_unit.kind == UnitKind::kBond && m_unit.addWanted &&
-           std::find(members.begin(), members.end(), &link) != members.end() &&
-           (m_unit.port == nullptr || link.master != m_unit.port->index);
+    return m_unit.kind == UnitKind::kBond && m_unit.late && m_unit.addWanted &&
+           IsMember(link.name) && IsMissing(link);
 }
 
 void UnitPlanner::MakeVlan(const std::string& device, const std::string& parent, unsigned id)
@@ -113,7 +120,13 @@ void UnitPlanner::MakeBond()
     line += options.Get("mode").empty() ? "" : " mode " + options.Get("mode");
     lines.push_back(line);
     for (const std::string& name : InOrder(options)) {
-        lines.push_back(OptionLine(m_unit.name, name, options.Get(name)));
+        // Only members that come later wait for that long.
+        auto& stage = name == kJoinDelay ? m_steps.tidy.links : lines;
+        stage.push_back(OptionLine(m_unit.name, name, options.Get(name)));
+    }
+    if (m_moves && !Live(MainSource(), "ipv6.conf.disable_ipv6").empty()) {
+        // It is given the link-local address that is in use.
+        lines.push_back("link set dev " + m_unit.name + " addrgenmode none");
     }
     lines.push_back("link set dev " + m_unit.name + " up");
     m_record.made = true;
@@ -148,19 +161,69 @@ void UnitPlanner::AdjustBondOptions()
     }
 }
 
+bool UnitPlanner::IsIdle(const Link* member) const
+{
+    return std::find(m_unit.idle.begin(), m_unit.idle.end(), member) != m_unit.idle.end();
+}
+
+/**
+ * Members without traffic join before anything moves, the one with the traffic when the others have
+ * taken that over.
+ */
 void UnitPlanner::Gather()
 {
+    auto& last = m_unit.late ? m_steps.move.links : m_steps.tidy.links;
+    const bool late = m_unit.late;
+    bool joins = false;
     for (const Link* member : m_unit.members) {
-        if (IsGathered(*member)) {
-            GatherMember(*member);
+        if (IsMissing(*member)) {
+            const bool early = !late && IsIdle(member);
+            GatherMember(*member, early ? m_steps.devices.links : last);
+            joins = joins || early;
+        }
+    }
+    const auto& sources = m_unit.sources;
+    const bool moves = std::any_of(sources.begin(), sources.end(), [&](const Source& source) {
+        return HasGlobalAddress(source.link);
+    });
+    if (joins && moves && m_unit.port == nullptr) {
+        m_steps.readyBefore.push_back("link " + m_unit.name);
+        if (SpeaksLacp()) {
+            m_steps.readyBefore.push_back("partner " + m_unit.name);
+        }
+    }
+    if (!late && m_unit.port == nullptr) {
+        PutInOrder();
+    }
+}
+
+bool UnitPlanner::SpeaksLacp() const
+{
+    return OptionsOf(m_inputs.files.at(m_unit.name)).Get("mode") == kLacpMode;
+}
+
+/** The kernel keeps the order in which members join, and the first one has a meaning. */
+void UnitPlanner::PutInOrder()
+{
+    const auto& members = m_unit.members;
+    const auto isIdle = [&](const Link* member) { return IsIdle(member); };
+    const auto busy = std::find_if_not(members.begin(), members.end(), isIdle);
+    if (std::none_of(busy, members.end(), isIdle)) {
+        return;
+    }
+    m_steps.readyAfter.push_back((SpeaksLacp() ? "aggregated " : "member ") + (*busy)->name);
+    for (auto member = busy; member != members.end(); ++member) {
+        if (IsIdle(*member)) {
+            m_steps.order.links.push_back("link set dev " + (*member)->name + " nomaster");
+            m_steps.order.links.push_back("link set dev " + (*member)->name + " master " +
+                                          m_unit.name);
         }
     }
 }
 
 /** Only an interface that is down can become a member; the bond brings it up again. */
-void UnitPlanner::GatherMember(const Link& member)
+void UnitPlanner::GatherMember(const Link& member, std::vector<std::string>& lines)
 {
-    auto& lines = m_steps.move.links;
     InterfaceRecord& record = m_steps.records[member.name];
     const auto& addresses = m_inputs.live.addresses;
     if (std::any_of(addresses.begin(), addresses.end(),
@@ -192,25 +255,45 @@ void UnitPlanner::DissolveBonds()
     }
 }
 
-/** The members are free before the bond goes, so that the first one carries on at once. */
+/**
+ * The heir leaves first and takes the traffic over; as long as it does not, the bond has the other
+ * members. A bond that becomes one of the switch goes as a whole.
+ */
 void UnitPlanner::DissolveBond(const std::string& bond)
 {
-    auto& lines = ToSwitch() ? m_steps.beside.links : m_steps.move.links;
-    for (const std::string& member : m_inputs.live.bonds.at(bond).members) {
-        ReleaseMember(bond, member);
+    const LiveBond& live = m_inputs.live.bonds.at(bond);
+    const bool whole = m_unit.kind == UnitKind::kSwitchBond;
+    for (const std::string& member : live.members) {
+        if (member == m_unit.name && !m_unit.takeDown) {
+            ReleaseMember(bond, member, m_steps.devices.links);
+            m_steps.readyBefore.push_back("link " + member);
+            const auto mode = live.options.find("mode");
+            if (mode != live.options.end() && mode->second == kLacpMode &&
+                live.members.size() > 1) {
+                m_steps.readyBefore.push_back("alone " + member);
+            }
+        } else if (whole || !IsMember(member)) {
+            ReleaseMember(bond, member, whole ? m_steps.beside.links : m_steps.tidy.links);
+        }
     }
-    lines.push_back("link del dev " + bond);
+    m_steps.tidy.linksDown.push_back("link del dev " + bond);
 }
 
-void UnitPlanner::ReleaseMember(const std::string& bond, const std::string& member)
+bool UnitPlanner::IsMember(const std::string& name) const
 {
-    auto& lines = ToSwitch() ? m_steps.beside.links : m_steps.move.links;
+    return std::any_of(m_unit.members.begin(), m_unit.members.end(),
+                       [&](const Link* member) { return member->name == name; });
+}
+
+void UnitPlanner::ReleaseMember(const std::string& bond, const std::string& member,
+                                std::vector<std::string>& lines)
+{
     const LiveBond& live = m_inputs.live.bonds.at(bond);
     const Link* bondLink = m_inputs.live.FindLink(bond);
     const HandedBond* handed = m_inputs.handover.FirstOf(member);
     const auto own = live.ownMacs.find(member);
-    lines.push_back("link set dev " + member + " nomaster");
     InterfaceRecord record = member == m_unit.name ? m_record : FormerRecord(member);
+    lines.push_back("link set dev " + member + " nomaster");
     if (handed != nullptr && bondLink != nullptr && own != live.ownMacs.end() &&
         own->second != bondLink->mac) {
         // Its neighbours go on to find the host where they know it.

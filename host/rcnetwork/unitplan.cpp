@@ -81,7 +81,9 @@ std::string UnitPlanner::MainSource() const
 bool UnitPlanner::WireHasCarrier() const
 {
     const auto ports = m_unit.Ports();
-    return std::any_of(ports.begin(), ports.end(), [](const Link* port) { return port->carrier; });
+    const auto carries = [](const Link* port) { return port->carrier; };
+    return std::any_of(ports.begin(), ports.end(), carries) ||
+           (ports.empty() && m_unit.MainSource() != nullptr && carries(m_unit.MainSource()));
 }
 
 bool UnitPlanner::HasGlobalAddress(const Link* link) const

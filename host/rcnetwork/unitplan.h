@@ -31,13 +31,18 @@ struct Steps {
     bool needsSwitch = false;
     std::vector<std::string> makeBridges;
     std::vector<std::string> waitFor;
-    BatchParts devices; ///< Bonds and VLANs that are missing.
+    BatchParts devices; ///< Bonds and VLANs that are missing, members that leave or join early.
+    std::vector<std::string> readyBefore;
     std::vector<std::string> settingsBefore;
     BatchParts beside; ///< Made while traffic still takes its former way.
     std::vector<std::string> leave;
     std::vector<std::string> join;
     BatchParts move; ///< Follows the ports.
     std::vector<std::string> announce;
+    std::vector<std::string> removeBridges;
+    BatchParts tidy; ///< What no traffic waits for.
+    std::vector<std::string> readyAfter;
+    BatchParts order; ///< Members that join anew, because of their order.
     std::vector<std::string> settingsAfter;
     std::vector<std::string> negotiate;
     std::vector<std::string> forgetGateways;
@@ -83,12 +88,18 @@ private:
     // unitdevices.cpp: bonds and VLANs of the kernel
     void PlanDevices();
     void MakeBond();
+    bool IsMissing(const Link& member) const;
     void Gather();
-    void GatherMember(const Link& member);
+    void GatherMember(const Link& member, std::vector<std::string>& lines);
+    void PutInOrder();
     void AdjustBondOptions();
     void DissolveBonds();
     void DissolveBond(const std::string& bond);
-    void ReleaseMember(const std::string& bond, const std::string& member);
+    bool IsMember(const std::string& name) const;
+    bool IsIdle(const Link* member) const;
+    bool SpeaksLacp() const;
+    void ReleaseMember(const std::string& bond, const std::string& member,
+                       std::vector<std::string>& lines);
     void MakeVlan(const std::string& device, const std::string& parent, unsigned id);
     void RemoveOldVlans();
 

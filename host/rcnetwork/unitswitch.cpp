@@ -192,7 +192,7 @@ void UnitPlanner::JoinBond()
         m_steps.join.push_back(removal);
     }
     if (columns.SpeaksLacp() && (live == nullptr || !live->negotiated) && WireHasCarrier()) {
-        m_steps.negotiate.push_back(m_unit.bridge + " " + port);
+        m_steps.negotiate.push_back("switch " + m_unit.bridge + " " + port);
     }
 }
 
@@ -247,13 +247,19 @@ void UnitPlanner::LeaveBridge(const SwitchBridge& bridge, const Unit& owner)
         }
     }
     m_moves = m_moves || !ours.empty() || HasGlobalAddress(m_inputs.live.FindLink(bridge.name));
-    if (!owner.BridgeStays()) {
+    if (!owner.BridgeStays() && !ToSwitch()) {
         m_steps.leave.push_back("--if-exists del-br " + bridge.name);
         m_moves = true;
+        ours.clear();
+    }
+    for (const std::string& port : ours) {
+        m_steps.leave.push_back("--if-exists del-port " + bridge.name + " " + port);
+    }
+    if (!owner.BridgeStays() && ToSwitch()) {
+        // The traffic does not wait until a bridge has been taken apart.
+        m_steps.removeBridges.push_back("--if-exists del-br " + bridge.name);
+        m_moves = true;
     } else if (!ours.empty()) {
-        for (const std::string& port : ours) {
-            m_steps.leave.push_back("--if-exists del-port " + bridge.name + " " + port);
-        }
         m_remarks.push_back(
             {Severity::kWarning, bridge.name +
                                      " stays without uplink and addresses, because other "

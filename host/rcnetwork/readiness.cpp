@@ -19,9 +19,6 @@ constexpr milliseconds kLinkDeadline{5000};
 constexpr milliseconds kPartnerDeadline{10000};
 constexpr milliseconds kPoll{10};
 constexpr milliseconds kDatabaseLimit{5000};
-/** Nothing here shows what the partner thinks; this is how long one on the short timeout takes. */
-constexpr milliseconds kAloneTime{3500};
-constexpr unsigned kCollectingAndDistributing = 0x30;
 
 std::string FirstWord(const std::string& path)
 {
@@ -41,20 +38,6 @@ bool HasCarrier(const std::string& name)
 bool IsInUse(const std::string& member)
 {
     return FirstWord(kInterfaces + member + "/bonding_slave/mii_status") == "up";
-}
-
-bool HasPartner(const std::string& bond)
-{
-    const std::string mac = FirstWord(kInterfaces + bond + "/bonding/ad_partner_mac");
-    return mac.find_first_not_of("0:") != std::string::npos;
-}
-
-bool IsAggregated(const std::string& member)
-{
-    const std::string state =
-        FirstWord(kInterfaces + member + "/bonding_slave/ad_partner_oper_port_state");
-    const unsigned long bits = std::strtoul(state.c_str(), nullptr, 10);
-    return (bits & kCollectingAndDistributing) == kCollectingAndDistributing;
 }
 
 bool HasNegotiated(const std::string& bridge, const std::string& port)
@@ -90,17 +73,7 @@ bool WaitFor(const std::vector<std::string>& what)
     if (kind == "member") {
         return WaitUntil([&] { return IsInUse(name); }, kLinkDeadline);
     }
-    if (kind == "partner") {
-        return WaitUntil([&] { return HasPartner(name); }, kPartnerDeadline);
-    }
-    if (kind == "aggregated") {
-        return WaitUntil([&] { return IsAggregated(name); }, kPartnerDeadline);
-    }
-    if (kind == "switch") {
-        return WaitUntil([&] { return HasNegotiated(name, what.at(2)); }, kPartnerDeadline);
-    }
-    std::this_thread::sleep_for(kAloneTime);
-    return true;
+    return WaitUntil([&] { return HasNegotiated(name, what.at(2)); }, kPartnerDeadline);
 }
 
 } // namespace vornhost

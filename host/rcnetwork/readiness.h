@@ -13,9 +13,6 @@ namespace vornhost {
  * Waits for one of these, each as long as it may take:
  *   link NAME          the interface has a carrier
  *   member NAME        the kernel's bond has the interface in use
- *   partner BOND       somebody answers the LACP of the kernel's bond
- *   aggregated NAME    the partner has taken the member of the kernel's bond into its aggregate
- *   alone NAME         the partner has found out that the interface is in no aggregate any more
  *   switch BRIDGE PORT the partner of the switch's bond has agreed on LACP
  * @return  whether it came.
  */

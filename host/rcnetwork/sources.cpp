@@ -8,6 +8,8 @@
 namespace vornhost {
 namespace {
 
+constexpr char kLacpMode[] = "802.3ad";
+
 class SourceFinder {
 public:
     SourceFinder(const Inputs& inputs, const Kinship& kinship, Unit& unit)
@@ -169,10 +171,15 @@ bool SourceFinder::CanJoinAnyTime(const Link& member) const
     return member.master == 0 && !HasAddresses(member) && !(carriesVlan && member.up);
 }
 
-/** Whether a new bond reaches the wire before the member that carries the traffic joins it. */
+/**
+ * Whether a new bond reaches the wire before the member that carries the traffic joins it. A
+ * partner that speaks LACP leaves that member as soon as it hears of the bond.
+ */
 bool SourceFinder::CarriesBefore() const
 {
-    return !m_unit.idle.empty() &&
+    const InterfaceFile* file = m_kinship.UsableFile(m_unit.name);
+    return !m_unit.idle.empty() && file != nullptr &&
+           BondOptionsOf(*file).Get("mode") != kLacpMode &&
            std::all_of(m_unit.members.begin(), m_unit.members.end(),
                        [](const Link* member) { return member->master == 0; });
 }
@@ -230,6 +237,15 @@ void SourceFinder::Run()
 }
 
 } // namespace
+
+BondOptions BondOptionsOf(const InterfaceFile& file)
+{
+    std::string text;
+    for (const auto& [name, value] : file.bondOptions) {
+        text += name + "=" + value + " ";
+    }
+    return BondOptions::Parse(text);
+}
 
 void FindSources(const Inputs& inputs, const Kinship& kinship, Unit& unit)
 {

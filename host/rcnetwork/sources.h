@@ -7,7 +7,12 @@
 #include "kinship.h"
 #include "unit.h"
 
+#include "support/bondoptions.h"
+
 namespace vornhost {
+
+/** @return  the options that the file of a bond of the kernel asks for. */
+BondOptions BondOptionsOf(const InterfaceFile& file);
 
 /** Names the unit's carrier, and finds everything else that carries its addressing now. */
 void FindSources(const Inputs& inputs, const Kinship& kinship, Unit& unit);

@@ -1,5 +1,7 @@
 #include "unitplan.h"
 
+#include "sources.h"
+
 #include "support/bondoptions.h"
 
 #include <algorithm>
@@ -10,7 +12,6 @@ namespace vornhost {
 namespace {
 
 /** The kernel takes the others only once these are set. */
-constexpr char kLacpMode[] = "802.3ad";
 constexpr char kJoinDelay[] = "updelay";
 constexpr std::array kFirstOptions{"mode", "miimon", "arp_interval"};
 
@@ -23,15 +24,6 @@ std::string OptionLine(const std::string& bond, const std::string& name, const s
 bool IsForTheTool(const std::string& name)
 {
     return name != "mode" && name != "num_unsol_na";
-}
-
-BondOptions OptionsOf(const InterfaceFile& file)
-{
-    std::string text;
-    for (const auto& [name, value] : file.bondOptions) {
-        text += name + "=" + value + " ";
-    }
-    return BondOptions::Parse(text);
 }
 
 std::vector<std::string> InOrder(const BondOptions& options)
@@ -109,7 +101,7 @@ void UnitPlanner::PlanDevices()
 
 void UnitPlanner::MakeBond()
 {
-    const BondOptions options = OptionsOf(m_inputs.files.at(m_unit.name));
+    const BondOptions options = BondOptionsOf(m_inputs.files.at(m_unit.name));
     auto& lines = m_steps.devices.links;
     std::string line = "link add dev " + m_unit.name;
     if (!WantedMac().empty()) {
@@ -141,7 +133,7 @@ void UnitPlanner::AdjustBondOptions()
     if (live == m_inputs.live.bonds.end() || live->second.options.empty()) {
         return;
     }
-    const BondOptions options = OptionsOf(file);
+    const BondOptions options = BondOptionsOf(file);
     for (const auto& [name, value] : options.values) {
         const auto has = live->second.options.find(name);
         if (has != live->second.options.end() && has->second == value) {
@@ -188,18 +180,10 @@ void UnitPlanner::Gather()
     });
     if (joins && moves && m_unit.port == nullptr) {
         m_steps.readyBefore.push_back("link " + m_unit.name);
-        if (SpeaksLacp()) {
-            m_steps.readyBefore.push_back("partner " + m_unit.name);
-        }
     }
     if (!late && m_unit.port == nullptr) {
         PutInOrder();
     }
-}
-
-bool UnitPlanner::SpeaksLacp() const
-{
-    return OptionsOf(m_inputs.files.at(m_unit.name)).Get("mode") == kLacpMode;
 }
 
 /** The kernel keeps the order in which members join, and the first one has a meaning. */
@@ -211,7 +195,7 @@ void UnitPlanner::PutInOrder()
     if (std::none_of(busy, members.end(), isIdle)) {
         return;
     }
-    m_steps.readyAfter.push_back((SpeaksLacp() ? "aggregated " : "member ") + (*busy)->name);
+    m_steps.readyAfter.push_back("member " + (*busy)->name);
     for (auto member = busy; member != members.end(); ++member) {
         if (IsIdle(*member)) {
             m_steps.order.links.push_back("link set dev " + (*member)->name + " nomaster");
@@ -267,11 +251,6 @@ void UnitPlanner::DissolveBond(const std::string& bond)
         if (member == m_unit.name && !m_unit.takeDown) {
             ReleaseMember(bond, member, m_steps.devices.links);
             m_steps.readyBefore.push_back("link " + member);
-            const auto mode = live.options.find("mode");
-            if (mode != live.options.end() && mode->second == kLacpMode &&
-                live.members.size() > 1) {
-                m_steps.readyBefore.push_back("alone " + member);
-            }
         } else if (whole || !IsMember(member)) {
             ReleaseMember(bond, member, whole ? m_steps.beside.links : m_steps.tidy.links);
         }
@@ -299,6 +278,10 @@ void UnitPlanner::ReleaseMember(const std::string& bond, const std::string& memb
         // Its neighbours go on to find the host where they know it.
         lines.push_back("link set dev " + member + " address " + bondLink->mac);
         record.ownMac = own->second;
+    }
+    if (member == m_unit.name && m_moves && Carrier() == member) {
+        // It is given the link-local address that is in use.
+        lines.push_back("link set dev " + member + " addrgenmode none");
     }
     const bool stopped = m_unit.takeDown && record.broughtUp;
     if (!stopped && !m_inputs.handover.IsSilent(member)) {

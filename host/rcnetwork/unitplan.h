@@ -97,7 +97,6 @@ private:
     void DissolveBond(const std::string& bond);
     bool IsMember(const std::string& name) const;
     bool IsIdle(const Link* member) const;
-    bool SpeaksLacp() const;
     void ReleaseMember(const std::string& bond, const std::string& member,
                        std::vector<std::string>& lines);
     void MakeVlan(const std::string& device, const std::string& parent, unsigned id);

@@ -236,9 +236,13 @@ void Decider::CheckPort()
     }
     const bool isMade = m_unit.kind == UnitKind::kBond || m_unit.kind == UnitKind::kVlan;
     if (m_unit.port == nullptr && !(isMade && m_inputs.request.verb == Verb::kStart)) {
-        Say(IsAsked() ? Severity::kError : Severity::kWarning,
-            m_unit.kind == UnitKind::kSwitchBond ? m_unit.bridge + " has no member that exists"
-                                                 : "there is no interface " + m_unit.name);
+        const auto record = m_inputs.runState.interfaces.find(m_unit.name);
+        const bool made = record != m_inputs.runState.interfaces.end() && record->second.made;
+        if (m_inputs.request.verb == Verb::kStart || !made) {
+            Say(IsAsked() ? Severity::kError : Severity::kWarning,
+                m_unit.kind == UnitKind::kSwitchBond ? m_unit.bridge + " has no member that exists"
+                                                     : "there is no interface " + m_unit.name);
+        }
         m_unit.target = Target::kLeaveAlone;
     } else if (!HasRequiredMac()) {
         Say(Severity::kError, "ifcfg-" + m_unit.file->name +

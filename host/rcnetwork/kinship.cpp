@@ -78,6 +78,9 @@ std::string Kinship::BridgeFor(const std::string& name) const
 
 void Kinship::ReadWanted()
 {
+    if (m_inputs.request.verb == Verb::kStop) {
+        return; // nothing is
+    }
     for (const auto& [name, file] : m_inputs.files) {
         if (file.use == FileUse::kBridge && !file.slaveList.empty()) {
             m_members[PlainOf(name)] = file.slaveList;

@@ -132,12 +132,21 @@ const Unit* RoutePlanner::SourceUnitOf(const Route& route) const
     return found == m_units.end() ? nullptr : &*found;
 }
 
+/** Whether an earlier run made the route for this unit or one that it takes over. */
+bool RoutePlanner::IsRecorded(const Unit& unit, const Route& route) const
+{
+    const auto has = [&](const std::string& name) {
+        const auto record = m_inputs.runState.interfaces.find(name);
+        return record != m_inputs.runState.interfaces.end() &&
+               record->second.routes.contains(RouteKeyText(route));
+    };
+    return has(unit.name) || std::any_of(unit.absorbed.begin(), unit.absorbed.end(), has);
+}
+
 /** Made by an earlier run, and nothing asks for it any more. */
 bool RoutePlanner::IsUnwanted(const Unit& unit, const Route& route) const
 {
-    const auto record = m_inputs.runState.interfaces.find(unit.name);
-    if (!unit.removeUnwanted || record == m_inputs.runState.interfaces.end() ||
-        !record->second.routes.contains(RouteKeyText(route))) {
+    if (!unit.removeUnwanted || !IsRecorded(unit, route)) {
         return false;
     }
     const auto& wanted = m_wanted.at(unit.name);

@@ -132,7 +132,9 @@ void UnitPlanner::RemoveAddress(const Address& address, const std::string& inter
 void UnitPlanner::RemoveAddresses()
 {
     const auto& all = m_inputs.live.addresses;
-    const Link* carrier = m_unit.carrierLink;
+    // What stands on an interface that goes needs no command of its own.
+    const bool goes = m_unit.takeDown && m_former.made;
+    const Link* carrier = goes ? nullptr : m_unit.carrierLink;
     bool removesFromCarrier = false;
     for (const Address& address : std::vector<Address>(all.rbegin(), all.rend())) {
         const Source* source = m_unit.SourceOf(address.index);

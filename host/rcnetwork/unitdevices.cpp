@@ -53,12 +53,18 @@ bool UnitPlanner::IsGathered(const Link& link) const
            IsMember(link.name) && IsMissing(link);
 }
 
+/** Whether the carrier is given the link-local address that is in use, and makes none itself. */
+bool UnitPlanner::BringsLinkLocal() const
+{
+    return m_moves && !m_unit.takeDown && !Live(MainSource(), "ipv6.conf.disable_ipv6").empty();
+}
+
 void UnitPlanner::MakeVlan(const std::string& device, const std::string& parent, unsigned id)
 {
     auto& lines = m_unit.late ? m_steps.move.links : m_steps.devices.links;
     lines.push_back("link add link " + parent + " name " + device + " type vlan id " +
                     std::to_string(id));
-    if (m_unit.late && m_moves) {
+    if (m_unit.late && BringsLinkLocal()) {
         lines.push_back("link set dev " + device + " addrgenmode none");
     }
     Build().links.push_back("link set dev " + device + " up");
@@ -116,8 +122,7 @@ void UnitPlanner::MakeBond()
         auto& stage = name == kJoinDelay ? m_steps.tidy.links : lines;
         stage.push_back(OptionLine(m_unit.name, name, options.Get(name)));
     }
-    if (m_moves && !Live(MainSource(), "ipv6.conf.disable_ipv6").empty()) {
-        // It is given the link-local address that is in use.
+    if (BringsLinkLocal()) {
         lines.push_back("link set dev " + m_unit.name + " addrgenmode none");
     }
     lines.push_back("link set dev " + m_unit.name + " up");
@@ -279,8 +284,7 @@ void UnitPlanner::ReleaseMember(const std::string& bond, const std::string& memb
         lines.push_back("link set dev " + member + " address " + bondLink->mac);
         record.ownMac = own->second;
     }
-    if (member == m_unit.name && m_moves && Carrier() == member) {
-        // It is given the link-local address that is in use.
+    if (member == Carrier() && BringsLinkLocal()) {
         lines.push_back("link set dev " + member + " addrgenmode none");
     }
     const bool stopped = m_unit.takeDown && record.broughtUp;

@@ -88,6 +88,7 @@ private:
     // unitdevices.cpp: bonds and VLANs of the kernel
     void PlanDevices();
     void MakeBond();
+    bool BringsLinkLocal() const;
     bool IsMissing(const Link& member) const;
     void Gather();
     void GatherMember(const Link& member, std::vector<std::string>& lines);

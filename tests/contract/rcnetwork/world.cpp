@@ -41,6 +41,8 @@ Link ReadLink(const Json& json)
     link.carrier = json.value("carrier", link.up);
     link.kind = json.value("kind", "");
     link.master = json.value("master", 0);
+    link.parent = json.value("parent", 0);
+    link.vlanId = json.value("vlan", -1);
     link.type = kEthernet;
     return link;
 }
@@ -138,6 +140,12 @@ LiveState ReadLive(const Json& json)
     for (const Json& each : json.value("neighbours", Json::array())) {
         live.neighbours.push_back(ReadNeighbour(each, live));
     }
+    const Json bonds = json.value("bonds", Json::object());
+    for (const auto& [name, bond] : bonds.items()) {
+        live.bonds[name] = {bond.at("members"),
+                            bond.value("ownMacs", std::map<std::string, std::string>()),
+                            bond.value("options", std::map<std::string, std::string>())};
+    }
     const Json settingsOf = json.value("settings", Json::object());
     for (const auto& [name, settings] : settingsOf.items()) {
         live.settings[name] = settings.get<Settings>();
@@ -152,6 +160,10 @@ SwitchPort ReadPort(const std::string& name, const Json& json)
     port.marked = json.value("ours", true);
     port.interfaces = json.value("interfaces", std::vector<std::string>{name});
     port.working = json.value("working", true) ? port.interfaces : std::vector<std::string>();
+    port.bond = port.interfaces.size() > 1 || json.value("bond", false);
+    port.columns = json.value("columns", SwitchValues());
+    port.otherConfig = json.value("otherConfig", SwitchValues());
+    port.externalIds = json.value("externalIds", SwitchValues());
     if (json.contains("tag")) {
         port.tag = json.at("tag").get<unsigned>();
     }
@@ -239,6 +251,14 @@ World ReadWorld(const std::string& folder)
     world.inputs.live = ReadLive(json);
     world.inputs.switchState = ReadSwitch(json.value("switch", Json{{"running", false}}));
     world.inputs.gateways = GatewayStore::Parse(json.value("gateways", "")).Records();
+    const Json formerBonds = json.value("formerBonds", Json::object());
+    for (const auto& [name, bond] : formerBonds.items()) {
+        world.inputs.formerBonds[name] = {bond.at("members"), bond.at("mac"),
+                                          bond.value("columns", SwitchValues())};
+    }
+    if (json.contains("handover")) {
+        world.inputs.handover = ParseHandover(json.at("handover").dump(), 0);
+    }
     if (json.contains("record")) {
         world.inputs.runState = ParseRunState(json.at("record").dump());
     }

@@ -222,6 +222,16 @@ BondOptions BondOptions::WithMode(const std::string& mode) const
     return changed;
 }
 
+BondOptions BondOptions::Chosen(const BondOptions& named) const
+{
+    BondOptions chosen = *this;
+    std::erase_if(chosen.values, [&](const auto& entry) {
+        return entry.first != kMode && IsInitial(entry.first, entry.second) &&
+               !named.values.contains(entry.first);
+    });
+    return chosen;
+}
+
 std::optional<std::vector<std::string>> ReadLiveSlaves(const std::string& bond)
 {
     std::ifstream file(LiveFolder(bond) + "slaves");

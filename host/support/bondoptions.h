@@ -48,6 +48,9 @@ struct BondOptions {
      *          ignores there, and with link monitoring if none is left.
      */
     BondOptions WithMode(const std::string& mode) const;
+
+    /** @return  those that are not what a new bond has anyway, and all that the other names. */
+    BondOptions Chosen(const BondOptions& named) const;
 };
 
 /**

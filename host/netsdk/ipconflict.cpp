@@ -22,20 +22,14 @@ using vornhost::WantedAddress;
 
 constexpr char kBridgePrefix[] = "ovs_";
 
-/** The IPv4 addresses that a file asks for, whatever it says its interface is for. */
-std::optional<std::vector<WantedAddress>> ConfiguredAddresses(const std::string& interface)
+/** @return  nothing when there is no file that can be read. */
+std::optional<std::vector<WantedAddress>> IPv4AddressesOf(const std::string& interface)
 {
     const auto state = vornhost::ReadFileState(interface);
     if (!state || !state->text) {
         return std::nullopt;
     }
-    auto file = vornhost::KeyValueFile::Parse(*state->text);
-    for (const std::string& key : file.Keys()) {
-        if (vornhost::IsPlaceKey(key)) {
-            (void)file.Remove(key);
-        }
-    }
-    auto addresses = vornhost::ParseInterfaceFile("any", file.Text()).file.addresses;
+    auto addresses = vornhost::ConfiguredAddresses(vornhost::KeyValueFile::Parse(*state->text));
     std::erase_if(addresses, [](const WantedAddress& each) { return each.family != AF_INET; });
     return addresses;
 }
@@ -79,7 +73,7 @@ bool LieTogether(const std::vector<WantedAddress>& addresses,
 
 std::optional<std::vector<std::string>> Conflicts(const std::string& bond)
 {
-    const auto subnets = ConfiguredAddresses(bond);
+    const auto subnets = IPv4AddressesOf(bond);
     if (!subnets) {
         return std::nullopt;
     }
@@ -91,7 +85,7 @@ std::optional<std::vector<std::string>> Conflicts(const std::string& bond)
         if (bridge == bond || name == bond || (!slaves.empty() && name == slaves[0])) {
             continue;
         }
-        const auto addresses = ConfiguredAddresses(bridge);
+        const auto addresses = IPv4AddressesOf(bridge);
         if (addresses && LieTogether(*addresses, *subnets)) {
             conflicts.push_back(name);
         }

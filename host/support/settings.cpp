@@ -79,6 +79,16 @@ void ReplaceAddressing(const KeyValueFile& from, KeyValueFile& to)
     }
 }
 
+std::vector<WantedAddress> ConfiguredAddresses(KeyValueFile file)
+{
+    for (const std::string& key : file.Keys()) {
+        if (IsPlaceKey(key)) {
+            (void)file.Remove(key);
+        }
+    }
+    return ParseInterfaceFile("any", file.Text()).file.addresses;
+}
+
 bool SameSettings(const KeyValueFile& one, const KeyValueFile& other)
 {
     KeyValueFile unused;

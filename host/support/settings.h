@@ -5,11 +5,13 @@
 #ifndef VORNHOST_SUPPORT_SETTINGS_H
 #define VORNHOST_SUPPORT_SETTINGS_H
 
+#include "interfacefile.h"
 #include "keyvaluefile.h"
 
 #include <functional>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace vornhost {
 
@@ -30,6 +32,9 @@ void RemoveAddressing(KeyValueFile& file);
 
 /** Gives a file another's addressing for its own; an MTU that the other has none of stays. */
 void ReplaceAddressing(const KeyValueFile& from, KeyValueFile& to);
+
+/** @return  the addresses that a file asks for, whatever kind of interface it is for. */
+std::vector<WantedAddress> ConfiguredAddresses(KeyValueFile file);
 
 /** Whether two files set the same keys to the same values, place keys aside. */
 bool SameSettings(const KeyValueFile& one, const KeyValueFile& other);

@@ -261,7 +261,15 @@ std::optional<std::vector<GatewayState>>
 GatewaysForBond(const BondPlan& plan, const std::optional<RememberedBond>& memory)
 {
     if (memory) {
-        return memory->state.gateways; // the bond's own are there: the caller has brought them back
+        // The bond's own are there: the caller has brought them back from its bridge. The bridge
+        // that was given some is gone.
+        auto former = memory->state.gateways;
+        for (GatewayState& state : former) {
+            if (state.interface.starts_with(kBridgePrefix)) {
+                state.gateway.reset();
+            }
+        }
+        return former;
     }
     auto bonds = vornhost::ReadGatewayStates({plan.name});
     auto carriers = vornhost::ReadGatewayStates({plan.slaves[0]});

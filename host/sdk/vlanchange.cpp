@@ -221,15 +221,15 @@ private:
             return false;
         }
         std::vector<GatewayState> states = Renamed(*parents, m_plan.parent, m_plan.name);
-        std::vector<GatewayState> former = *parents;
+        std::vector<GatewayState> former = m_memory ? m_memory->state.gateways : *parents;
+        std::erase_if(former, [&](const GatewayState& state) {
+            return m_memory && state.interface == m_memory->name;
+        });
         for (GatewayState& state : former) {
-            state.gateway.reset();
-        }
-        if (m_memory) {
-            former = m_memory->state.gateways;
-            std::erase_if(former, [&](const GatewayState& state) {
-                return state.interface == m_memory->name;
-            });
+            // The bridge that was given some is gone.
+            if (!m_memory || state.interface != m_plan.parent) {
+                state.gateway.reset();
+            }
         }
         return WriteGatewayStates(Together(std::move(states), former));
     }

@@ -1,5 +1,6 @@
 #include "apply.h"
 
+#include "announce.h"
 #include "inputs.h"
 
 #include "support/process.h"
@@ -19,6 +20,9 @@ constexpr std::chrono::seconds kToolDeadline{15};
 constexpr std::chrono::seconds kServiceDeadline{60};
 constexpr std::chrono::seconds kBridgeDeadline{8};
 constexpr std::chrono::milliseconds kBridgePoll{10};
+constexpr std::chrono::seconds kPartnerDeadline{15};
+constexpr std::chrono::milliseconds kPartnerPoll{100};
+constexpr std::chrono::seconds kReadLimit{5};
 
 std::vector<std::string> Words(const std::string& line)
 {
@@ -57,6 +61,8 @@ private:
     void RunAdditions(const Stage& stage) const;
     bool WaitForBridges(const Stage& stage);
     bool WriteSettings(const Stage& stage);
+    void AnnounceAll(const Stage& stage);
+    void WaitForPartners(const Stage& stage);
     bool ForgetGateways(const Stage& stage);
 
     const Plan& m_plan;
@@ -170,6 +176,38 @@ bool Applier::WriteSettings(const Stage& stage)
     return true;
 }
 
+void Applier::AnnounceAll(const Stage& stage)
+{
+    for (const std::string& interface : stage.lines) {
+        if (!Announce(interface)) {
+            (void)Fail("cannot announce " + interface + ": " + std::strerror(errno));
+        }
+    }
+}
+
+/** A partner that does not speak the protocol is said, and the bond works through one member. */
+void Applier::WaitForPartners(const Stage& stage)
+{
+    const auto deadline = std::chrono::steady_clock::now() + kPartnerDeadline;
+    for (const std::string& line : stage.lines) {
+        const auto words = Words(line);
+        const auto agreed = [&] {
+            const auto bridges = ReadSwitch(kReadLimit);
+            return bridges && std::any_of(bridges->begin(), bridges->end(), [&](const auto& each) {
+                       const SwitchPort* port = each.FindPort(words.at(1));
+                       return each.name == words.at(0) && port != nullptr && port->negotiated;
+                   });
+        };
+        while (!agreed()) {
+            if (std::chrono::steady_clock::now() > deadline) {
+                (void)Fail("the partner of " + words.at(0) + " has not agreed on LACP");
+                break;
+            }
+            std::this_thread::sleep_for(kPartnerPoll);
+        }
+    }
+}
+
 bool Applier::ForgetGateways(const Stage& stage)
 {
     const GatewayStoreLock lock;
@@ -197,6 +235,12 @@ bool Applier::Run(const Stage& stage)
         return WriteSettings(stage);
     case StageKind::kBatch:
         return RunBatch(stage);
+    case StageKind::kAnnounce:
+        AnnounceAll(stage);
+        return true;
+    case StageKind::kReady:
+        WaitForPartners(stage);
+        return true;
     case StageKind::kGateways:
         break;
     }
@@ -217,6 +261,12 @@ bool ApplyPlan(const Plan& plan, std::vector<Remark>& remarks)
         }
     }
     return true;
+}
+
+bool ApplyStage(const Stage& stage, std::vector<Remark>& remarks)
+{
+    const Plan plan;
+    return Applier(plan, remarks).Run(stage);
 }
 
 } // namespace vornhost

@@ -19,6 +19,9 @@ namespace vornhost {
  */
 bool ApplyPlan(const Plan& plan, std::vector<Remark>& remarks);
 
+/** Carries out one stage by itself, waiting for the switch. */
+bool ApplyStage(const Stage& stage, std::vector<Remark>& remarks);
+
 } // namespace vornhost
 
 #endif

@@ -1,68 +1,115 @@
 #include "decision.h"
 
+#include "sources.h"
+
 #include <algorithm>
 
 namespace vornhost {
 namespace {
 
-constexpr char kBridgePrefix[] = "ovs_";
 constexpr char kDatapathLink[] = "ovs-system";
 constexpr char kUserspaceDatapath[] = "netdev";
+constexpr int kAfterAllLinks = 1 << 30;
 
-/** Decides one pair. */
+/** Decides one unit. */
 class Decider {
 public:
-    Decider(const Inputs& inputs, const std::string& name, std::vector<Remark>& remarks);
-    Pair Decide();
+    Decider(const Inputs& inputs, const Kinship& kinship, const std::string& name,
+            std::vector<Remark>& remarks);
+    Unit Decide();
 
 private:
-    const InterfaceFile* File(const std::string& name) const;
     void Say(Severity severity, const std::string& text) { m_remarks.push_back({severity, text}); }
+    void ReadKind();
+    void ReadMembers();
+    bool IsWorkingPort(const Link& link, const SwitchPort& port) const;
     bool IsJoined() const;
     bool IsOurs() const;
     bool BridgeIsLive() const;
+    bool IsPartOfABond() const;
     void ChooseForStop();
     void ChooseForStart();
     void ChooseWithoutBridgeFile();
     void GiveUpOnForeignBridge();
     void CheckPort();
+    bool IsAsked() const;
+    bool HasRequiredMac() const;
     void CheckMaster();
+    bool IsOwnMaster(const std::string& master) const;
     void RespectOnBoot();
     void CheckSwitch();
+    void ChooseTag();
 
     const Inputs& m_inputs;
+    const Kinship& m_kinship;
     std::vector<Remark>& m_remarks;
-    Pair m_pair;
+    Unit m_unit;
     const SwitchBridge* m_anyBridge = nullptr;
 };
 
-Decider::Decider(const Inputs& inputs, const std::string& name, std::vector<Remark>& remarks)
-    : m_inputs(inputs), m_remarks(remarks)
+Decider::Decider(const Inputs& inputs, const Kinship& kinship, const std::string& name,
+                 std::vector<Remark>& remarks)
+    : m_inputs(inputs), m_kinship(kinship), m_remarks(remarks)
 {
-    m_pair.name = name;
-    m_pair.bridge = BridgeOf(name);
-    m_pair.port = inputs.live.FindLink(name);
-    m_pair.bridgeLink = inputs.live.FindLink(m_pair.bridge);
-    m_anyBridge = inputs.switchState.Find(m_pair.bridge);
-    m_pair.switchBridge = m_anyBridge;
-    m_pair.joined = IsJoined();
+    m_unit.name = name;
+    m_unit.bridge = kinship.BridgeFor(name);
+    m_unit.port = m_unit.bridge == name ? nullptr : inputs.live.FindLink(name);
+    m_unit.bridgeLink = inputs.live.FindLink(m_unit.bridge);
+    m_anyBridge = inputs.switchState.Find(m_unit.bridge);
+    m_unit.switchBridge = m_anyBridge;
+    m_unit.heldDown = inputs.handover.IsSilent(name);
+    ReadKind();
+    m_unit.joined = IsJoined();
 }
 
-const InterfaceFile* Decider::File(const std::string& name) const
+void Decider::ReadKind()
 {
-    const auto found = m_inputs.files.find(name);
-    return found == m_inputs.files.end() ? nullptr : &found->second;
+    const InterfaceFile* file = m_kinship.UsableFile(m_unit.name);
+    if (m_kinship.IsWantedOnSwitch(m_unit.name)) {
+        m_unit.kind = UnitKind::kSwitchBond;
+    } else if (m_kinship.IsWantedBond(m_unit.name)) {
+        m_unit.kind = UnitKind::kBond;
+    } else if (file != nullptr && file->vlan) {
+        m_unit.kind = UnitKind::kVlan;
+    }
+    ReadMembers();
+    if (m_unit.kind == UnitKind::kSwitchBond) {
+        m_unit.port = m_unit.members.empty() ? nullptr : m_unit.members.front();
+    }
+}
+
+void Decider::ReadMembers()
+{
+    for (const std::string& member : m_kinship.MembersOf(m_unit.name)) {
+        if (const Link* link = m_inputs.live.FindLink(member); link != nullptr) {
+            m_unit.members.push_back(link);
+        } else {
+            Say(Severity::kWarning, "there is no interface " + member + " for " + m_unit.name);
+        }
+    }
+}
+
+bool Decider::IsWorkingPort(const Link& link, const SwitchPort& port) const
+{
+    return std::find(port.working.begin(), port.working.end(), link.name) != port.working.end() &&
+           (m_anyBridge->datapathType == kUserspaceDatapath ||
+            m_inputs.live.NameOf(link.master) == kDatapathLink);
 }
 
 bool Decider::IsJoined() const
 {
-    if (m_anyBridge == nullptr || m_pair.port == nullptr || m_pair.bridgeLink == nullptr) {
+    if (m_anyBridge == nullptr || m_unit.port == nullptr || m_unit.bridgeLink == nullptr) {
         return false;
     }
-    const SwitchPort* port = m_anyBridge->FindPort(m_pair.name);
-    return port != nullptr && !port->working.empty() &&
-           (m_anyBridge->datapathType == kUserspaceDatapath ||
-            m_inputs.live.NameOf(m_pair.port->master) == kDatapathLink);
+    const bool bond = m_unit.kind == UnitKind::kSwitchBond;
+    const SwitchPort* port = m_anyBridge->FindPort(bond ? m_unit.BondPort() : m_unit.name);
+    if (port == nullptr) {
+        return false;
+    }
+    const std::vector<const Link*> links = m_unit.Ports();
+    return port->interfaces.size() == links.size() &&
+           std::all_of(links.begin(), links.end(),
+                       [&](const Link* link) { return IsWorkingPort(*link, *port); });
 }
 
 /** Whether this program made the bridge or at least put the port on it. */
@@ -71,134 +118,191 @@ bool Decider::IsOurs() const
     if (m_anyBridge == nullptr) {
         return false;
     }
-    const SwitchPort* port = m_anyBridge->FindPort(m_pair.name);
+    const SwitchPort* port = m_anyBridge->FindPort(m_unit.name);
     return m_anyBridge->marked || (port != nullptr && port->marked);
 }
 
 bool Decider::BridgeIsLive() const
 {
-    return m_pair.bridgeLink != nullptr || m_anyBridge != nullptr;
+    return m_unit.bridgeLink != nullptr || m_anyBridge != nullptr;
+}
+
+/** Such an interface is no unit of its own: its bond is. */
+bool Decider::IsPartOfABond() const
+{
+    return m_inputs.request.verb == Verb::kStart && !m_kinship.MasterOf(m_unit.name).empty();
 }
 
 void Decider::ChooseForStop()
 {
-    const auto record = m_inputs.runState.interfaces.find(m_pair.name);
+    const auto record = m_inputs.runState.interfaces.find(m_unit.name);
     const bool recorded = record != m_inputs.runState.interfaces.end() && !record->second.Empty();
-    if (!recorded && !IsOurs()) {
+    const bool inherits = !m_kinship.LegaciesOf(m_unit.name).empty();
+    if ((!recorded && !inherits && !IsOurs()) || !m_kinship.HeirOf(m_unit.name).empty()) {
         return;
     }
-    m_pair.target = Target::kPlain;
-    m_pair.removeUnwanted = true;
-    m_pair.takeDown = true;
+    m_unit.target = Target::kPlain;
+    m_unit.removeUnwanted = true;
+    m_unit.takeDown = true;
 }
 
 void Decider::ChooseForStart()
 {
-    const InterfaceFile* file = File(m_pair.bridge);
-    if (file != nullptr && file->use == FileUse::kBridge) {
-        m_pair.target = Target::kSwitch;
-        m_pair.file = file;
-    } else if (file == nullptr || !BridgeIsLive()) {
+    const auto found = m_inputs.files.find(m_unit.bridge);
+    const InterfaceFile* file = found == m_inputs.files.end() ? nullptr : &found->second;
+    const bool usable = file != nullptr && file->use == FileUse::kBridge;
+    if (usable && !file->slave) {
+        m_unit.target = Target::kSwitch;
+        m_unit.file = file;
+    } else if (file == nullptr || usable || !BridgeIsLive()) {
         ChooseWithoutBridgeFile();
     }
-    if (m_pair.target == Target::kSwitch && m_inputs.request.withoutSwitch.contains(m_pair.name)) {
-        m_pair.target = Target::kPlain;
+    if (m_unit.target == Target::kSwitch && m_inputs.request.withoutSwitch.contains(m_unit.name)) {
+        m_unit.target = Target::kPlain;
     }
-    m_pair.addWanted = m_pair.file != nullptr;
-    m_pair.removeUnwanted = m_pair.file != nullptr && m_pair.file->whole;
+    m_unit.addWanted = m_unit.file != nullptr;
+    m_unit.removeUnwanted = m_unit.file != nullptr && m_unit.file->whole;
 }
 
 void Decider::ChooseWithoutBridgeFile()
 {
-    const InterfaceFile* file = File(m_pair.name);
-    if (file == nullptr) {
-        if (IsOurs()) {
-            m_pair.target = Target::kPlain; // nothing asks for the bridge any more
+    const auto found = m_inputs.files.find(m_unit.name);
+    if (found == m_inputs.files.end()) {
+        if (IsOurs() && m_kinship.LiveMembersOf(m_unit.name).empty()) {
+            m_unit.target = Target::kPlain; // nothing asks for the bridge any more
         }
         return;
     }
-    if (file->use != FileUse::kPlain) {
+    const InterfaceFile& file = found->second;
+    if (file.use != FileUse::kPlain || m_kinship.HasUnclearMaster(m_unit.name)) {
         return;
     }
-    if (!file->bridge.empty()) {
-        Say(Severity::kWarning, "ifcfg-" + file->name + " names the bridge " + file->bridge +
+    if (!file.bridge.empty() && !file.slave && !m_inputs.files.contains(m_unit.bridge)) {
+        Say(Severity::kWarning, "ifcfg-" + file.name + " names the bridge " + file.bridge +
                                     ", which has no usable file");
         if (BridgeIsLive()) {
             return;
         }
     }
-    m_pair.target = Target::kPlain;
-    m_pair.file = file;
+    m_unit.target = Target::kPlain;
+    m_unit.file = &file;
 }
 
 /** A bridge of that name that somebody else made is used when asked for, but never dissolved. */
 void Decider::GiveUpOnForeignBridge()
 {
-    if (m_pair.target != Target::kPlain || IsOurs() || m_anyBridge == nullptr) {
+    if (m_unit.target != Target::kPlain || IsOurs() || m_anyBridge == nullptr) {
         return;
     }
-    if (m_anyBridge->FindPort(m_pair.name) != nullptr) {
-        Say(Severity::kWarning, m_pair.name + " is a port of " + m_pair.bridge +
+    if (m_anyBridge->FindPort(m_unit.name) != nullptr) {
+        Say(Severity::kWarning, m_unit.name + " is a port of " + m_unit.bridge +
                                     ", which another program made; it is left as it is");
-        m_pair.target = Target::kLeaveAlone;
+        m_unit.target = Target::kLeaveAlone;
     }
-    m_pair.switchBridge = nullptr;
-    m_pair.bridgeLink = nullptr;
+    m_unit.switchBridge = nullptr;
+    m_unit.bridgeLink = nullptr;
+}
+
+bool Decider::IsAsked() const
+{
+    return m_inputs.request.verb == Verb::kStart &&
+           (!m_inputs.request.names.empty() || (m_unit.file != nullptr && m_unit.file->onBoot));
+}
+
+/** An interface that has its bond's address meanwhile is still the one that its file means. */
+bool Decider::HasRequiredMac() const
+{
+    if (m_unit.file == nullptr || m_unit.file->requiredMac.empty() || m_unit.port == nullptr ||
+        m_unit.kind == UnitKind::kBond || m_unit.kind == UnitKind::kSwitchBond) {
+        return true;
+    }
+    const std::string& wanted = m_unit.file->requiredMac;
+    const auto record = m_inputs.runState.interfaces.find(m_unit.name);
+    const auto bond = m_inputs.live.bonds.find(m_inputs.live.NameOf(m_unit.port->master));
+    std::string own;
+    if (record != m_inputs.runState.interfaces.end()) {
+        own = record->second.ownMac;
+    }
+    if (bond != m_inputs.live.bonds.end() && bond->second.ownMacs.contains(m_unit.name)) {
+        own = bond->second.ownMacs.at(m_unit.name);
+    }
+    return wanted == m_unit.port->mac || wanted == own;
 }
 
 void Decider::CheckPort()
 {
-    if (m_pair.target == Target::kLeaveAlone) {
+    if (m_unit.target == Target::kLeaveAlone) {
         return;
     }
-    const bool asked =
-        m_inputs.request.verb == Verb::kStart &&
-        (!m_inputs.request.names.empty() || (m_pair.file != nullptr && m_pair.file->onBoot));
-    if (m_pair.port == nullptr) {
-        Say(asked ? Severity::kError : Severity::kWarning, "there is no interface " + m_pair.name);
-        m_pair.target = Target::kLeaveAlone;
-    } else if (m_pair.file != nullptr && !m_pair.file->requiredMac.empty() &&
-               m_pair.file->requiredMac != m_pair.port->mac) {
-        Say(Severity::kError, "ifcfg-" + m_pair.file->name +
-                                  ": HWADDR=" + m_pair.file->requiredMac + ", but " + m_pair.name +
-                                  " has " + m_pair.port->mac + "; it is left as it is");
-        m_pair.target = Target::kLeaveAlone;
+    const bool isMade = m_unit.kind == UnitKind::kBond || m_unit.kind == UnitKind::kVlan;
+    if (m_unit.port == nullptr && !(isMade && m_inputs.request.verb == Verb::kStart)) {
+        Say(IsAsked() ? Severity::kError : Severity::kWarning,
+            m_unit.kind == UnitKind::kSwitchBond ? m_unit.bridge + " has no member that exists"
+                                                 : "there is no interface " + m_unit.name);
+        m_unit.target = Target::kLeaveAlone;
+    } else if (!HasRequiredMac()) {
+        Say(Severity::kError, "ifcfg-" + m_unit.file->name +
+                                  ": HWADDR=" + m_unit.file->requiredMac + ", but " + m_unit.name +
+                                  " has " + m_unit.port->mac + "; it is left as it is");
+        m_unit.target = Target::kLeaveAlone;
     } else {
         CheckMaster();
     }
 }
 
+/** Whether what an interface is a member of is one of the things that go together. */
+bool Decider::IsOwnMaster(const std::string& master) const
+{
+    const std::string plain = PlainOf(master);
+    return master == m_unit.bridge || plain == m_unit.name ||
+           m_kinship.HeirOf(plain) == m_unit.name ||
+           (m_unit.heldDown && !m_kinship.HeirOf(plain).empty()) ||
+           (!m_kinship.HeirOf(plain).empty() && m_kinship.LiveMasterOf(m_unit.name) == plain) ||
+           (m_kinship.IsWantedBond(plain) && m_kinship.LiveMasterOf(m_unit.name) == plain);
+}
+
 /** An interface that belongs to something else cannot go on our bridge. */
 void Decider::CheckMaster()
 {
-    std::string owner;
-    const std::string master = m_inputs.live.NameOf(m_pair.port->master);
-    if (!master.empty() && master != kDatapathLink) {
-        owner = master;
-    }
-    for (const SwitchBridge& bridge : m_inputs.switchState.bridges) {
-        if (bridge.name != m_pair.bridge && bridge.FindPort(m_pair.name) != nullptr) {
-            owner = bridge.name;
+    const std::vector<const Link*> ports =
+        m_unit.kind == UnitKind::kBond ? m_unit.members : m_unit.Ports();
+    for (const Link* port : ports) {
+        std::string owner;
+        const std::string master = m_inputs.live.NameOf(port->master);
+        if (!master.empty() && master != kDatapathLink && !IsOwnMaster(master)) {
+            owner = master;
         }
-    }
-    if (!owner.empty()) {
-        Say(m_pair.target == Target::kSwitch ? Severity::kError : Severity::kWarning,
-            m_pair.name + " is a port of " + owner + "; it is left as it is");
-        m_pair.target = Target::kLeaveAlone;
+        for (const SwitchBridge& bridge : m_inputs.switchState.bridges) {
+            const bool carries =
+                std::any_of(bridge.ports.begin(), bridge.ports.end(), [&](const SwitchPort& each) {
+                    return std::find(each.interfaces.begin(), each.interfaces.end(), port->name) !=
+                           each.interfaces.end();
+                });
+            const bool own = bridge.name == BridgeOf(port->name) || IsOwnMaster(bridge.name);
+            if (carries && bridge.name != m_unit.bridge && !(own && bridge.marked)) {
+                owner = bridge.name;
+            }
+        }
+        if (!owner.empty() && m_unit.target != Target::kLeaveAlone) {
+            Say(m_unit.target == Target::kSwitch ? Severity::kError : Severity::kWarning,
+                port->name + " is a port of " + owner + "; it is left as it is");
+            m_unit.target = Target::kLeaveAlone;
+        }
     }
 }
 
 /** Without ONBOOT an interface is not brought up, but one that is live keeps what it carries. */
 void Decider::RespectOnBoot()
 {
-    if (m_pair.target == Target::kLeaveAlone || m_pair.file == nullptr || m_pair.file->onBoot ||
+    if (m_unit.target == Target::kLeaveAlone || m_unit.file == nullptr || m_unit.file->onBoot ||
         !m_inputs.request.names.empty()) {
         return;
     }
-    m_pair.addWanted = false;
-    m_pair.removeUnwanted = false;
-    if (!m_pair.port->up && m_pair.switchBridge == nullptr) {
-        m_pair.target = Target::kLeaveAlone;
+    m_unit.addWanted = false;
+    m_unit.removeUnwanted = false;
+    const bool live = m_unit.port != nullptr && m_unit.port->up;
+    if (!live && m_unit.switchBridge == nullptr) {
+        m_unit.target = Target::kLeaveAlone;
     }
 }
 
@@ -206,24 +310,45 @@ void Decider::RespectOnBoot()
 void Decider::CheckSwitch()
 {
     const SwitchState& state = m_inputs.switchState;
-    if (m_pair.target == Target::kLeaveAlone || state.running) {
+    if (m_unit.target == Target::kLeaveAlone || state.running) {
         return;
     }
-    const bool isLive = m_pair.bridgeLink != nullptr;
+    const bool isLive = m_unit.bridgeLink != nullptr;
     if (!state.hung) {
-        m_pair.waitsForSwitch = isLive || m_pair.target == Target::kSwitch;
+        m_unit.waitsForSwitch = isLive || m_unit.target == Target::kSwitch;
     } else if (isLive) {
-        Say(Severity::kError, "the switch does not answer; " + m_pair.bridge + " is left as it is");
-        m_pair.target = Target::kLeaveAlone;
-    } else if (m_pair.target == Target::kSwitch) {
-        Say(Severity::kError, "the switch does not answer; the addresses of " + m_pair.name +
+        Say(Severity::kError, "the switch does not answer; " + m_unit.bridge + " is left as it is");
+        m_unit.target = Target::kLeaveAlone;
+    } else if (m_unit.target == Target::kSwitch) {
+        Say(Severity::kError, "the switch does not answer; the addresses of " + m_unit.name +
                                   " stay on the plain interface");
-        m_pair.target = Target::kPlain;
+        m_unit.target = Target::kPlain;
     }
 }
 
-Pair Decider::Decide()
+/** While a conversion is under way the tag of the VLAN stands in no file. */
+void Decider::ChooseTag()
 {
+    if (m_unit.addWanted && m_unit.file->vlanId && *m_unit.file->vlanId != 0) {
+        m_unit.tag = m_unit.file->vlanId;
+    }
+    const auto owed = m_inputs.handover.tags.find(m_unit.name);
+    if (m_unit.tag || !m_unit.addWanted || owed == m_inputs.handover.tags.end()) {
+        return;
+    }
+    const FileVlan settled{m_unit.name, owed->second};
+    if (std::none_of(m_inputs.files.begin(), m_inputs.files.end(), [&](const auto& entry) {
+            return entry.second.use == FileUse::kPlain && entry.second.vlan == settled;
+        })) {
+        m_unit.tag = owed->second;
+    }
+}
+
+Unit Decider::Decide()
+{
+    if (IsPartOfABond()) {
+        return m_unit;
+    }
     if (m_inputs.request.verb == Verb::kStop) {
         ChooseForStop();
     } else {
@@ -233,7 +358,11 @@ Pair Decider::Decide()
     CheckPort();
     RespectOnBoot();
     CheckSwitch();
-    return m_pair;
+    ChooseTag();
+    if (m_unit.target != Target::kLeaveAlone) {
+        FindSources(m_inputs, m_kinship, m_unit);
+    }
+    return m_unit;
 }
 
 std::set<std::string> NamesToDecide(const Inputs& inputs)
@@ -253,69 +382,62 @@ std::set<std::string> NamesToDecide(const Inputs& inputs)
     return names;
 }
 
+bool IsExcused(const Inputs& inputs, const Kinship& kinship, const std::string& name)
+{
+    return inputs.request.known.contains(name) || !kinship.HeirOf(name).empty() ||
+           !kinship.MasterOf(name).empty();
+}
+
+/** In the order in which they came up, so that routes are made in the order in which they stood. */
+int Rank(const Unit& unit)
+{
+    if (unit.port != nullptr) {
+        return unit.port->index;
+    }
+    return unit.members.empty() ? kAfterAllLinks : unit.members.front()->index;
+}
+
 } // namespace
 
-std::string BridgeOf(const std::string& plainName)
+std::set<std::string> Concerned(const Inputs& inputs)
 {
-    return kBridgePrefix + plainName;
+    return Kinship(inputs).Closure(inputs.request.names);
 }
 
-std::string PlainOf(const std::string& name)
-{
-    return name.rfind(kBridgePrefix, 0) == 0 ? name.substr(sizeof kBridgePrefix - 1) : name;
-}
-
-std::vector<std::string> Pair::ForeignPorts() const
-{
-    std::vector<std::string> ports;
-    if (switchBridge != nullptr) {
-        for (const SwitchPort& each : switchBridge->ports) {
-            if (each.name != name && each.name != bridge) {
-                ports.push_back(each.name);
-            }
-        }
-    }
-    return ports;
-}
-
-bool Pair::SourceStays() const
-{
-    return target == Target::kSwitch || switchBridge == nullptr || !switchBridge->marked ||
-           !ForeignPorts().empty();
-}
-
-std::vector<Pair> DecidePairs(const Inputs& inputs, std::vector<Remark>& remarks)
+std::vector<Unit> DecideUnits(const Inputs& inputs, const Kinship& kinship,
+                              std::vector<Remark>& remarks)
 {
     const std::set<std::string> known = NamesToDecide(inputs);
     const std::set<std::string>& asked = inputs.request.names;
-    std::vector<Pair> pairs;
-    for (const std::string& name : asked.empty() ? known : asked) {
-        if (!known.contains(name) && inputs.request.verb == Verb::kStart) {
-            remarks.push_back({Severity::kError, name + " has no configuration file"});
+    const bool starts = inputs.request.verb == Verb::kStart;
+    std::vector<Unit> units;
+    for (const std::string& name : asked.empty() ? known : kinship.Closure(asked)) {
+        const bool named = asked.contains(name);
+        if (!known.contains(name)) {
+            if (starts && named && !IsExcused(inputs, kinship, name)) {
+                remarks.push_back({Severity::kError, name + " has no configuration file"});
+            }
             continue;
         }
-        Pair pair = Decider(inputs, name, remarks).Decide();
-        if (pair.target != Target::kLeaveAlone) {
-            pairs.push_back(std::move(pair));
-        } else if (!asked.empty() && inputs.request.verb == Verb::kStart) {
+        Unit unit = Decider(inputs, kinship, name, remarks).Decide();
+        if (unit.target != Target::kLeaveAlone) {
+            units.push_back(std::move(unit));
+        } else if (named && starts && !IsExcused(inputs, kinship, name)) {
             remarks.push_back({Severity::kError, name + " was not started"});
         }
     }
-    // Interfaces in the order in which they came up, so that routes are made in the order in which
-    // they stood.
-    std::sort(pairs.begin(), pairs.end(), [](const Pair& one, const Pair& other) {
-        return one.port->index < other.port->index;
-    });
-    return pairs;
+    std::stable_sort(units.begin(), units.end(),
+                     [](const Unit& one, const Unit& other) { return Rank(one) < Rank(other); });
+    return units;
 }
 
 std::set<std::string> NotOnSwitch(const Inputs& inputs)
 {
     std::vector<Remark> remarks;
     std::set<std::string> names;
-    for (const Pair& pair : DecidePairs(inputs, remarks)) {
-        if (pair.target == Target::kSwitch && !pair.joined) {
-            names.insert(pair.name);
+    for (const Unit& unit : DecideUnits(inputs, Kinship(inputs), remarks)) {
+        if (unit.target == Target::kSwitch && !unit.joined) {
+            names.insert(unit.name);
         }
     }
     return names;

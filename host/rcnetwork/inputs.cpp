@@ -1,6 +1,9 @@
 #include "inputs.h"
 
+#include "kinship.h"
+
 #include "support/keyvaluefile.h"
+#include "support/remembered.h"
 
 #include <cerrno>
 #include <cstring>
@@ -119,12 +122,35 @@ void ReadRunState(Inputs& inputs)
     inputs.runState = ParseRunState(text.str());
 }
 
+/** Of every name that a bond has now or may have had. */
+void ReadFormerBonds(Inputs& inputs)
+{
+    std::set<std::string> names;
+    for (const auto& [name, file] : inputs.files) {
+        names.insert(PlainOf(name));
+        names.insert(PlainOf(file.master));
+    }
+    for (const SwitchBridge& bridge : inputs.switchState.bridges) {
+        names.insert(PlainOf(bridge.name));
+    }
+    for (const Link& link : inputs.live.links) {
+        names.insert(link.name);
+    }
+    for (const std::string& name : names) {
+        const auto bond = name.empty() ? std::nullopt : RememberedBond::Load(name);
+        if (bond) {
+            inputs.formerBonds[name] = {bond->slaves, bond->mac, SwitchColumns(bond->options)};
+        }
+    }
+}
+
 void ReadAllSettings(Inputs& inputs)
 {
     ReadSettings(kNewInterface, inputs.live);
     for (const Link& link : inputs.live.links) {
         const std::string plain = PlainOf(link.name);
-        if (inputs.files.contains(plain) || inputs.files.contains(BridgeOf(plain)) ||
+        if (IsTagDevice(link) || link.kind == "bond" || link.kind == "vlan" ||
+            inputs.files.contains(plain) || inputs.files.contains(BridgeOf(plain)) ||
             inputs.runState.interfaces.contains(plain) || plain != link.name ||
             inputs.live.FindLink(BridgeOf(plain)) != nullptr) {
             ReadSettings(link.name, inputs.live);
@@ -150,6 +176,7 @@ std::optional<Inputs> ReadInputs(const Request& request, std::vector<Remark>& re
     ReadGateways(inputs, remarks);
     ReadSwitchState(inputs, remarks);
     ReadRunState(inputs);
+    inputs.handover = LoadHandover();
     auto live = ReadLiveState();
     if (!live) {
         remarks.push_back({Severity::kError, "cannot read the kernel's network"});
@@ -157,6 +184,7 @@ std::optional<Inputs> ReadInputs(const Request& request, std::vector<Remark>& re
     }
     inputs.live = std::move(*live);
     ReadAllSettings(inputs);
+    ReadFormerBonds(inputs);
     return inputs;
 }
 

@@ -1,5 +1,7 @@
 #include "livestate.h"
 
+#include "support/bondoptions.h"
+
 #include <algorithm>
 #include <array>
 #include <filesystem>
@@ -10,12 +12,50 @@ namespace vornhost {
 namespace {
 
 constexpr char kSettingsFolder[] = "/proc/sys/net/";
+constexpr char kBondFolder[] = "/proc/net/bonding/";
 constexpr std::array kSettingGroups{"ipv4.conf", "ipv4.neigh", "ipv6.conf", "ipv6.neigh"};
 
 std::string GroupFolder(const std::string& interface, std::string group)
 {
     std::replace(group.begin(), group.end(), '.', '/');
     return kSettingsFolder + group + "/" + interface;
+}
+
+/** The kernel tells nowhere else what a member's link address was. */
+std::map<std::string, std::string> ReadOwnMacs(const std::string& bond)
+{
+    constexpr std::string_view kMember = "Slave Interface: ";
+    constexpr std::string_view kAddress = "Permanent HW addr: ";
+    std::map<std::string, std::string> macs;
+    std::ifstream file(kBondFolder + bond);
+    std::string member;
+    for (std::string line; std::getline(file, line);) {
+        if (line.rfind(kMember, 0) == 0) {
+            member = line.substr(kMember.size());
+        } else if (line.rfind(kAddress, 0) == 0) {
+            macs[member] = line.substr(kAddress.size());
+        }
+    }
+    return macs;
+}
+
+LiveBond ReadBond(const Link& bond, const std::vector<Link>& links)
+{
+    LiveBond read;
+    if (const auto members = ReadLiveSlaves(bond.name)) {
+        read.members = *members;
+    } else {
+        for (const Link& link : links) {
+            if (link.master == bond.index) {
+                read.members.push_back(link.name);
+            }
+        }
+    }
+    read.ownMacs = ReadOwnMacs(bond.name);
+    if (const auto options = BondOptions::ReadLive(bond.name)) {
+        read.options = options->values;
+    }
+    return read;
 }
 
 } // namespace
@@ -63,6 +103,11 @@ std::optional<LiveState> ReadLiveState()
     live.addresses = std::move(*addresses);
     live.routes = std::move(*routes);
     live.neighbours = std::move(*neighbours);
+    for (const Link& link : live.links) {
+        if (link.kind == "bond") {
+            live.bonds[link.name] = ReadBond(link, live.links);
+        }
+    }
     return live;
 }
 

@@ -19,11 +19,19 @@ using Settings = std::map<std::string, std::string>;
 /** Stands for the settings that a new interface begins with. */
 constexpr char kNewInterface[] = "default";
 
+/** A bond of the kernel. */
+struct LiveBond {
+    std::vector<std::string> members;           ///< In the order in which they joined.
+    std::map<std::string, std::string> ownMacs; ///< What members are called again when they leave.
+    std::map<std::string, std::string> options{}; ///< As the kernel writes them.
+};
+
 struct LiveState {
     std::vector<Link> links;
     std::vector<Address> addresses;
     std::vector<Route> routes;
     std::vector<Neighbour> neighbours;
+    std::map<std::string, LiveBond> bonds;
     std::map<std::string, Settings> settings; ///< By interface, for those that a plan may concern.
 
     const Link* FindLink(const std::string& name) const;

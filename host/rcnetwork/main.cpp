@@ -1,3 +1,4 @@
+#include "handover.h"
 #include "hold.h"
 #include "reconcile.h"
 #include "report.h"
@@ -26,11 +27,16 @@ constexpr char kLockPath[] = "/run/vornovs/network.lock";
 constexpr std::chrono::seconds kLockWait{90};
 constexpr std::chrono::milliseconds kLockPoll{50};
 constexpr int kUsageError = 2;
+constexpr char kBondVerb[] = "set-ovs-bond";
+/** Of the hook program that is told of conversions: "begin" or "end". */
+constexpr char kHandoverVerb[] = "handover";
 
 constexpr char kUsage[] =
     "Usage: rc.network [--dry-run] start|stop [interface...]\n"
+    "       rc.network set-ovs-bond bond\n"
     "Brings the network to what the files in /etc/sysconfig/network-scripts ask for (start),\n"
-    "or takes down what start made (stop); without interfaces, all of them.\n"
+    "or takes down what start made (stop); without interfaces, all of them. set-ovs-bond brings\n"
+    "the options of a bond on the switch to what its file says, while it goes on to work.\n"
     "  --dry-run   print what would be done and change nothing\n"
     "Exit status: 0 all of it is so now, 1 something is not (it says what), 2 wrong usage.\n";
 
@@ -73,6 +79,7 @@ struct CommandLine {
     std::string verb;
     Request request;
     std::string token; ///< Of the holder.
+    std::string bond;  ///< Of the verb for bonds.
     bool dryRun = false;
 };
 
@@ -86,7 +93,11 @@ bool ParseCommandLine(int count, char** arguments, CommandLine& line)
             line.verb = argument;
         } else if (line.verb == kHolderVerb) {
             line.token = argument;
-        } else if (IsInterfaceName(argument)) {
+        } else if (line.verb == kHandoverVerb && line.token.empty()) {
+            line.token = argument;
+        } else if (line.verb == kBondVerb && line.bond.empty() && IsInterfaceName(argument)) {
+            line.bond = argument;
+        } else if (line.verb != kBondVerb && IsInterfaceName(argument)) {
             line.request.names.insert(PlainOf(argument));
         } else {
             (void)std::fprintf(stderr, "rc.network: \"%s\" is no interface name\n", arguments[i]);
@@ -95,6 +106,8 @@ bool ParseCommandLine(int count, char** arguments, CommandLine& line)
     }
     line.request.verb = line.verb == "stop" ? Verb::kStop : Verb::kStart;
     return line.verb == "start" || line.verb == "stop" ||
+           (line.verb == kBondVerb && !line.bond.empty() && !line.dryRun) ||
+           (line.verb == kHandoverVerb && (line.token == "begin" || line.token == "end")) ||
            (line.verb == kHolderVerb && !line.token.empty());
 }
 
@@ -107,21 +120,23 @@ int Fail(const std::string& text)
 int Start(const Request& request)
 {
     // The hold lasts until all is done: if this run is killed, its holder finishes the work.
+    const std::set<std::string> concerned = ConcernedBy(request);
     if (!Reconcile(request)) {
         return EXIT_FAILURE;
     }
-    EndHold(request.names);
+    EndHold(concerned);
     return EXIT_SUCCESS;
 }
 
 int Stop(const Request& request)
 {
-    if (std::getenv(kHoldMark) != nullptr) {
+    if (IsPartOfConversion()) {
+        const bool kept = KeepTags();
         return BeginHold(request)
-                   ? EXIT_SUCCESS
+                   ? (kept ? EXIT_SUCCESS : EXIT_FAILURE)
                    : Fail(std::string("cannot hold the network: ") + std::strerror(errno));
     }
-    EndHold(request.names);
+    EndHold(ConcernedBy(request));
     return Reconcile(request) ? EXIT_SUCCESS : EXIT_FAILURE;
 }
 
@@ -155,6 +170,12 @@ int Run(const CommandLine& line)
     const NetworkLock lock;
     if (!lock.Held()) {
         return Fail(std::string("cannot get the lock ") + kLockPath);
+    }
+    if (line.verb == kBondVerb) {
+        return SetSwitchBond(line.bond) ? EXIT_SUCCESS : EXIT_FAILURE;
+    }
+    if (line.verb == kHandoverVerb) {
+        return BeginHandover(line.token == "begin") ? EXIT_SUCCESS : EXIT_FAILURE;
     }
     return line.request.verb == Verb::kStop ? Stop(line.request) : Start(line.request);
 }

@@ -2,8 +2,8 @@
 
 #include "decision.h"
 #include "inputs.h"
-#include "pairplan.h"
 #include "routeplan.h"
+#include "unitplan.h"
 
 #include <algorithm>
 #include <sstream>
@@ -18,6 +18,18 @@ void AddStage(Plan& plan, StageKind kind, const std::string& title, std::vector<
     }
 }
 
+/** A bridge may be left by several at once. */
+std::vector<std::string> Once(const std::vector<std::string>& lines)
+{
+    std::vector<std::string> once;
+    for (const std::string& line : lines) {
+        if (std::find(once.begin(), once.end(), line) == once.end()) {
+            once.push_back(line);
+        }
+    }
+    return once;
+}
+
 /** What is on disk while the plan runs: it may be cut short after any step. */
 InterfaceRecord Both(const InterfaceRecord& former, const InterfaceRecord& next)
 {
@@ -26,6 +38,8 @@ InterfaceRecord Both(const InterfaceRecord& former, const InterfaceRecord& next)
     both.routes.insert(next.routes.begin(), next.routes.end());
     both.unchecked.insert(next.unchecked.begin(), next.unchecked.end());
     both.formerSettings.insert(next.formerSettings.begin(), next.formerSettings.end());
+    both.made = former.made || next.made;
+    both.ownMac = next.ownMac.empty() ? former.ownMac : next.ownMac;
     both.broughtUp = former.broughtUp || next.broughtUp;
     both.formerMtu = former.formerMtu ? former.formerMtu : next.formerMtu;
     both.tag = next.tag ? next.tag : former.tag;
@@ -56,11 +70,16 @@ void AddStages(const Steps& steps, Plan& plan)
     }
     AddStage(plan, StageKind::kSwitch, "make bridges", steps.makeBridges);
     AddStage(plan, StageKind::kWait, "wait for bridges", steps.waitFor);
+    AddStage(plan, StageKind::kBatch, "make devices", steps.devices.Lines());
     AddStage(plan, StageKind::kSettings, "settings before", steps.settingsBefore);
     AddStage(plan, StageKind::kBatch, "build beside", steps.beside.Lines());
-    AddStage(plan, StageKind::kSwitch, "join and leave", steps.joinAndLeave);
+    std::vector<std::string> joinAndLeave = Once(steps.leave);
+    joinAndLeave.insert(joinAndLeave.end(), steps.join.begin(), steps.join.end());
+    AddStage(plan, StageKind::kSwitch, "join and leave", joinAndLeave);
     AddStage(plan, StageKind::kBatch, "move", steps.move.Lines());
+    AddStage(plan, StageKind::kAnnounce, "announce", steps.announce);
     AddStage(plan, StageKind::kSettings, "settings after", steps.settingsAfter);
+    AddStage(plan, StageKind::kReady, "wait for partners", steps.negotiate);
     AddStage(plan, StageKind::kGateways, "forget gateways", steps.forgetGateways);
 }
 
@@ -77,12 +96,13 @@ Plan MakePlan(const Inputs& inputs)
 {
     Plan plan;
     plan.waitForSwitch = inputs.request.withoutSwitch.empty();
-    const std::vector<Pair> pairs = DecidePairs(inputs, plan.remarks);
+    const Kinship kinship(inputs);
+    const std::vector<Unit> units = DecideUnits(inputs, kinship, plan.remarks);
     Steps steps;
-    for (const Pair& pair : pairs) {
-        PairPlanner(inputs, pair, steps, plan.remarks).Run();
+    for (const Unit& unit : units) {
+        UnitPlanner(inputs, kinship, unit, steps, plan.remarks).Run();
     }
-    RoutePlanner(inputs, pairs, steps).Run();
+    RoutePlanner(inputs, units, steps).Run();
     AddStages(steps, plan);
     AddRecords(inputs, steps, plan);
     return plan;

@@ -5,6 +5,7 @@
 #ifndef VORNHOST_RCNETWORK_PLAN_H
 #define VORNHOST_RCNETWORK_PLAN_H
 
+#include "handover.h"
 #include "livestate.h"
 #include "report.h"
 #include "runstate.h"
@@ -27,7 +28,8 @@ struct Request {
     std::set<std::string> names; ///< Plain interfaces; none: everything.
     /** Interfaces that the switch could not be made to carry: they stay reachable without it. */
     std::set<std::string> withoutSwitch;
-    bool switchHung = false; ///< It was asked before and did not answer.
+    bool switchHung = false;     ///< It was asked before and did not answer.
+    std::set<std::string> known; ///< Named ones that were there when the run began.
 };
 
 /** What is known of the switch. */
@@ -39,6 +41,13 @@ struct SwitchState {
     const SwitchBridge* Find(const std::string& bridge) const;
 };
 
+/** A bond of the kernel that the switch stands in for, as it was. */
+struct FormerBond {
+    std::vector<std::string> members;
+    std::string mac;
+    SwitchValues columns; ///< What its options are called on the switch.
+};
+
 /** All that a plan depends on. */
 struct Inputs {
     Request request;
@@ -47,6 +56,8 @@ struct Inputs {
     LiveState live;
     SwitchState switchState;
     RunState runState;
+    std::map<std::string, FormerBond> formerBonds; ///< By the bond's plain name.
+    Handover handover;
 };
 
 /** How the lines of a stage are carried out. */
@@ -56,6 +67,8 @@ enum class StageKind {
     kWait,     ///< "INTERFACE MAC" that must exist before anything goes on.
     kSettings, ///< "INTERFACE SETTING VALUE"
     kBatch,    ///< Lines of one "ip -batch".
+    kAnnounce, ///< "INTERFACE" whose place the network outside is told.
+    kReady,    ///< "BRIDGE PORT" of the switch whose partner must agree on LACP.
     kGateways  ///< "INTERFACE" whose gateway records are dropped.
 };
 

@@ -17,6 +17,15 @@ namespace {
 
 constexpr int kTries = 2;
 constexpr mode_t kPrivate = 0600;
+constexpr char kLacpMode[] = "802.3ad";
+
+void WriteHandover(const Handover& handover)
+{
+    if (!SaveHandover(handover)) {
+        Say({Severity::kWarning,
+             std::string("cannot write ") + kHandoverPath + ": " + std::strerror(errno)});
+    }
+}
 
 class Reconciler {
 public:
@@ -28,6 +37,9 @@ private:
     std::optional<Inputs> Read();
     void StartServices();
     bool Attempt();
+    void UpdateHandover(Inputs& inputs);
+    void SettleHandover(const Inputs& inputs);
+    void RememberNames(const Inputs& inputs);
     void Save(const RunState& former, const RunState& state);
     void StayWithoutSwitch();
     bool ReportRest();
@@ -57,7 +69,69 @@ std::optional<Inputs> Reconciler::Read()
     SayOnce(remarks);
     m_canGoOn = inputs.has_value();
     m_request.switchHung = inputs && inputs->switchState.hung;
+    if (inputs) {
+        RememberNames(*inputs);
+        UpdateHandover(*inputs);
+    }
     return inputs;
+}
+
+/** What this run itself takes away is no interface without a file afterwards. */
+void Reconciler::RememberNames(const Inputs& inputs)
+{
+    for (const std::string& name : m_request.names) {
+        const Kinship kinship(inputs);
+        const Link* link = inputs.live.FindLink(name);
+        const bool made = link != nullptr && (link->kind == "bond" || link->kind == "vlan");
+        if (made || !kinship.LiveMembersOf(name).empty() ||
+            inputs.runState.interfaces.contains(name)) {
+            m_request.known.insert(name);
+        }
+    }
+}
+
+/** In a conversion the other members of a bond that is taken apart wait for it in silence. */
+void Reconciler::UpdateHandover(Inputs& inputs)
+{
+    if (!IsPartOfConversion() || m_request.verb != Verb::kStart) {
+        return;
+    }
+    const Handover former = inputs.handover;
+    const Kinship kinship(inputs);
+    for (const auto& [name, bond] : inputs.live.bonds) {
+        const std::string heir = kinship.HeirOf(name);
+        const Link* link = inputs.live.FindLink(name);
+        if (heir.empty() || kinship.IsWantedBond(heir) || link == nullptr) {
+            continue;
+        }
+        const auto mode = bond.options.find("mode");
+        const bool lacp = mode != bond.options.end() && mode->second == kLacpMode;
+        inputs.handover.bonds[name] = {bond.members, link->mac, lacp};
+    }
+    if (inputs.handover != former) {
+        WriteHandover(inputs.handover);
+    }
+}
+
+/** What stands in a file again is owed no more. */
+void Reconciler::SettleHandover(const Inputs& inputs)
+{
+    Handover handover = inputs.handover;
+    const Kinship kinship(inputs);
+    const std::set<std::string> concerned = kinship.Closure(m_request.names);
+    std::erase_if(handover.bonds, [&](const auto& entry) {
+        return kinship.IsWantedBond(entry.first) &&
+               (concerned.empty() || concerned.contains(entry.first));
+    });
+    std::erase_if(handover.tags, [&](const auto& entry) {
+        const FileVlan vlan{entry.first, entry.second};
+        return std::any_of(inputs.files.begin(), inputs.files.end(), [&](const auto& each) {
+            return each.second.use == FileUse::kPlain && each.second.vlan == vlan;
+        });
+    });
+    if (handover != inputs.handover) {
+        WriteHandover(handover);
+    }
 }
 
 void Reconciler::Save(const RunState& former, const RunState& state)
@@ -79,6 +153,7 @@ bool Reconciler::Attempt()
     SayOnce(plan.remarks);
     if (plan.Empty()) {
         Save(inputs->runState, plan.recordAfter);
+        SettleHandover(*inputs);
         return true;
     }
     Save(inputs->runState, plan.recordBefore);
@@ -132,6 +207,7 @@ bool Reconciler::ReportRest()
     const Plan plan = MakePlan(*inputs);
     if (plan.Empty()) {
         Save(inputs->runState, plan.recordAfter);
+        SettleHandover(*inputs);
         return true;
     }
     for (const Stage& stage : plan.stages) {
@@ -175,6 +251,13 @@ bool PrintPlan(const Request& request)
 bool Reconcile(const Request& request)
 {
     return Reconciler(request).Run();
+}
+
+std::set<std::string> ConcernedBy(const Request& request)
+{
+    std::vector<Remark> remarks;
+    const auto inputs = ReadInputs(request, remarks);
+    return inputs && !request.names.empty() ? Concerned(*inputs) : request.names;
 }
 
 } // namespace vornhost

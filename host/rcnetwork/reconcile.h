@@ -21,6 +21,27 @@ bool PrintPlan(const Request& request);
  */
 bool Reconcile(const Request& request);
 
+/** @return  the interfaces that the request concerns, named or not; none: all of them. */
+std::set<std::string> ConcernedBy(const Request& request);
+
+/**
+ * Gives the switch the tags back that a conversion is going to give back elsewhere.
+ * @return  false when that failed, which was said.
+ */
+bool KeepTags();
+
+/**
+ * Writes down what a conversion back to plain networking is about to take away from the switch, or
+ * forgets it. @return  false when that failed, which was said.
+ */
+bool BeginHandover(bool back);
+
+/**
+ * Brings the options of a bond on the switch to what its file says, while it goes on to work.
+ * @return  whether they are so now; what is not was said.
+ */
+bool SetSwitchBond(const std::string& bridge);
+
 } // namespace vornhost
 
 #endif

@@ -12,6 +12,7 @@ namespace vornhost {
 namespace {
 
 constexpr unsigned kIpv6DefaultMetric = 1024;
+constexpr char kBridgeKind[] = "openvswitch";
 
 /** Whether the first bits of two addresses are the same. */
 bool SamePrefix(int family, const std::string& one, const std::string& other, unsigned length)
@@ -38,22 +39,28 @@ bool HasHopOn(const Route& route, const Link* link)
                        [&](const NextHop& hop) { return hop.index == link->index; });
 }
 
+bool HasHopOnSource(const Route& route, const Unit& unit)
+{
+    return std::any_of(unit.sources.begin(), unit.sources.end(),
+                       [&](const Source& source) { return HasHopOn(route, source.link); });
+}
+
 } // namespace
 
-RoutePlanner::RoutePlanner(const Inputs& inputs, const std::vector<Pair>& pairs, Steps& steps)
-    : m_inputs(inputs), m_pairs(pairs), m_steps(steps)
+RoutePlanner::RoutePlanner(const Inputs& inputs, const std::vector<Unit>& units, Steps& steps)
+    : m_inputs(inputs), m_units(units), m_steps(steps)
 {
-    for (const Pair& pair : pairs) {
-        m_wanted[pair.name] = WantedRoutes(pair);
+    for (const Unit& unit : units) {
+        m_wanted[unit.name] = WantedRoutes(unit);
     }
 }
 
-bool RoutePlanner::IsOnLink(const Pair& pair, int family, const std::string& gateway) const
+bool RoutePlanner::IsOnLink(const Unit& unit, int family, const std::string& gateway) const
 {
     if (family == AF_INET6 && SamePrefix(AF_INET6, gateway, "fe80::", 10)) {
         return true;
     }
-    for (const WantedAddress& wanted : pair.file->addresses) {
+    for (const WantedAddress& wanted : unit.file->addresses) {
         if (wanted.family == family &&
             SamePrefix(family, wanted.local, gateway, wanted.prefixLength)) {
             return true;
@@ -61,20 +68,21 @@ bool RoutePlanner::IsOnLink(const Pair& pair, int family, const std::string& gat
     }
     return std::any_of(m_inputs.live.addresses.begin(), m_inputs.live.addresses.end(),
                        [&](const Address& live) {
-                           return PairOf(live.index) == &pair && live.family == family &&
+                           return UnitOf(live.index) == &unit && live.family == family &&
                                   SamePrefix(family, live.peer.empty() ? live.local : live.peer,
                                              gateway, live.prefixLength);
                        });
 }
 
-void RoutePlanner::AddWantedDefault(const Pair& pair, int family, std::vector<Route>& routes) const
+void RoutePlanner::AddWantedDefault(const Unit& unit, int family, std::vector<Route>& routes) const
 {
     const AddressFamily storeFamily =
         family == AF_INET ? AddressFamily::kIPv4 : AddressFamily::kIPv6;
-    std::string gateway = family == AF_INET ? pair.file->gateway : pair.file->gateway6;
-    std::optional<unsigned> metric = pair.file->metric;
+    std::string gateway = family == AF_INET ? unit.file->gateway : unit.file->gateway6;
+    std::optional<unsigned> metric = unit.file->metric;
+    const std::string& holder = unit.target == Target::kSwitch ? unit.bridge : unit.name;
     for (const GatewayRecord& record : m_inputs.gateways) {
-        if (record.interface == pair.TargetName() && record.family == storeFamily) {
+        if (record.interface == holder && record.family == storeFamily) {
             gateway = record.gateway.address;
             metric = record.gateway.metric ? record.gateway.metric : metric;
         }
@@ -90,68 +98,69 @@ void RoutePlanner::AddWantedDefault(const Pair& pair, int family, std::vector<Ro
     NextHop hop;
     hop.gateway = gateway;
     hop.gatewayFamily = family;
-    hop.onLink = !IsOnLink(pair, family, gateway);
+    hop.onLink = !IsOnLink(unit, family, gateway);
     route.nextHops.push_back(std::move(hop));
     routes.push_back(std::move(route));
 }
 
-std::vector<Route> RoutePlanner::WantedRoutes(const Pair& pair) const
+std::vector<Route> RoutePlanner::WantedRoutes(const Unit& unit) const
 {
     std::vector<Route> routes;
-    if (pair.file != nullptr) {
-        AddWantedDefault(pair, AF_INET, routes);
-        AddWantedDefault(pair, AF_INET6, routes);
+    if (unit.file != nullptr) {
+        AddWantedDefault(unit, AF_INET, routes);
+        AddWantedDefault(unit, AF_INET6, routes);
     }
     return routes;
 }
 
-const Pair* RoutePlanner::PairOf(int index) const
+const Unit* RoutePlanner::UnitOf(int index) const
 {
-    const auto found = std::find_if(m_pairs.begin(), m_pairs.end(), [&](const Pair& pair) {
-        return pair.port->index == index ||
-               (pair.bridgeLink != nullptr && pair.bridgeLink->index == index);
+    const auto found = std::find_if(m_units.begin(), m_units.end(), [&](const Unit& unit) {
+        return (unit.port != nullptr && unit.port->index == index) ||
+               (unit.bridgeLink != nullptr && unit.bridgeLink->index == index) ||
+               (unit.carrierLink != nullptr && unit.carrierLink->index == index) ||
+               unit.SourceOf(index) != nullptr;
     });
-    return found == m_pairs.end() ? nullptr : &*found;
+    return found == m_units.end() ? nullptr : &*found;
 }
 
-/** @return  the first pair from whose source the route leaves, null when it needs no move. */
-const Pair* RoutePlanner::SourcePairOf(const Route& route) const
+/** @return  the first unit from whose source the route leaves, null when it needs no move. */
+const Unit* RoutePlanner::SourceUnitOf(const Route& route) const
 {
-    const auto found = std::find_if(m_pairs.begin(), m_pairs.end(), [&](const Pair& pair) {
-        return HasHopOn(route, pair.SourceLink());
-    });
-    return found == m_pairs.end() ? nullptr : &*found;
+    const auto found = std::find_if(m_units.begin(), m_units.end(),
+                                    [&](const Unit& unit) { return HasHopOnSource(route, unit); });
+    return found == m_units.end() ? nullptr : &*found;
 }
 
 /** Made by an earlier run, and nothing asks for it any more. */
-bool RoutePlanner::IsUnwanted(const Pair& pair, const Route& route) const
+bool RoutePlanner::IsUnwanted(const Unit& unit, const Route& route) const
 {
-    const auto record = m_inputs.runState.interfaces.find(pair.name);
-    if (!pair.removeUnwanted || record == m_inputs.runState.interfaces.end() ||
+    const auto record = m_inputs.runState.interfaces.find(unit.name);
+    if (!unit.removeUnwanted || record == m_inputs.runState.interfaces.end() ||
         !record->second.routes.contains(RouteKeyText(route))) {
         return false;
     }
-    const auto& wanted = m_wanted.at(pair.name);
-    return pair.takeDown || std::none_of(wanted.begin(), wanted.end(), [&](const Route& each) {
+    const auto& wanted = m_wanted.at(unit.name);
+    return unit.takeDown || std::none_of(wanted.begin(), wanted.end(), [&](const Route& each) {
                return RouteKeyText(each) == RouteKeyText(route);
            });
 }
 
 /** Whether a route that is asked for replaces this one, because only one of them can be in use. */
-bool RoutePlanner::GivesWay(const Pair& pair, const Route& route) const
+bool RoutePlanner::GivesWay(const Unit& unit, const Route& route) const
 {
-    const auto& wanted = m_wanted.at(pair.name);
-    return pair.addWanted && std::any_of(wanted.begin(), wanted.end(), [&](const Route& each) {
+    const auto& wanted = m_wanted.at(unit.name);
+    return unit.addWanted && std::any_of(wanted.begin(), wanted.end(), [&](const Route& each) {
                return RouteSlot(each) == RouteSlot(route) &&
                       RouteKeyText(each) != RouteKeyText(route);
            });
 }
 
-bool RoutePlanner::IsAlreadyCarried(const Pair& pair, const Route& route) const
+bool RoutePlanner::IsAlreadyCarried(const Unit& unit, const Route& route) const
 {
     const auto& all = m_inputs.live.routes;
     return std::any_of(all.begin(), all.end(), [&](const Route& each) {
-        return RouteKeyText(each) == RouteKeyText(route) && HasHopOn(each, pair.TargetLink());
+        return RouteKeyText(each) == RouteKeyText(route) && HasHopOn(each, unit.carrierLink);
     });
 }
 
@@ -163,10 +172,18 @@ bool RoutePlanner::IsAlone(const Route& route) const
            }) == 1;
 }
 
-/** Onto the switch routes follow their port; back they are there before it leaves. */
-BatchParts& RoutePlanner::PartsOf(const Pair& pair) const
+/**
+ * Onto the switch routes follow their port; back they are there before it leaves, and before a
+ * bridge that goes as a whole has gone.
+ */
+BatchParts& RoutePlanner::PartsOf(const Unit& unit) const
 {
-    return pair.target == Target::kSwitch ? m_steps.move : m_steps.beside;
+    const bool follows =
+        unit.target == Target::kSwitch &&
+        std::none_of(unit.sources.begin(), unit.sources.end(), [](const Source& source) {
+            return !source.stays && source.link->kind == kBridgeKind;
+        });
+    return follows || unit.late ? m_steps.move : m_steps.beside;
 }
 
 /** The default routes come last, when everything that leads to their gateways stands. */
@@ -177,27 +194,31 @@ void RoutePlanner::Put(BatchParts& parts, const Route& route, const std::string&
 
 void RoutePlanner::RemoveRoute(const Route& route)
 {
-    const Pair* source = SourcePairOf(route);
-    if (source != nullptr && !source->SourceStays()) {
+    const Unit* source = SourceUnitOf(route);
+    if (source != nullptr &&
+        std::none_of(route.nextHops.begin(), route.nextHops.end(), [&](const NextHop& hop) {
+            const Source* from = source->SourceOf(hop.index);
+            return from == nullptr || from->stays;
+        })) {
         return; // it goes with its interface
     }
     const NameOfIndex nameOf = [&](int index) { return m_inputs.live.NameOf(index); };
     m_steps.move.removedRoutes.push_back("route del " + RouteArguments(route, nameOf));
 }
 
-void RoutePlanner::CarryRoute(const Pair& pair, const Route& route)
+void RoutePlanner::CarryRoute(const Unit& unit, const Route& route)
 {
     const NameOfIndex nameOf = [&](int index) {
-        const Pair* owner = PairOf(index);
-        return owner == nullptr ? m_inputs.live.NameOf(index) : owner->TargetName();
+        const Unit* owner = UnitOf(index);
+        return owner == nullptr ? m_inputs.live.NameOf(index) : owner->carrier;
     };
-    if (IsAlreadyCarried(pair, route)) {
+    if (IsAlreadyCarried(unit, route)) {
         RemoveRoute(route);
         return;
     }
     // A replacement never leaves a moment without the route, but takes the first one of its slot.
     const bool alone = IsAlone(route);
-    Put(PartsOf(pair), route,
+    Put(PartsOf(unit), route,
         (alone ? "route replace " : "route append ") + RouteArguments(route, nameOf));
     if (!alone) {
         RemoveRoute(route);
@@ -206,44 +227,44 @@ void RoutePlanner::CarryRoute(const Pair& pair, const Route& route)
 
 void RoutePlanner::PlanLiveRoute(const Route& route)
 {
-    const Pair* source = SourcePairOf(route);
-    const Pair* pair = source;
-    if (pair == nullptr && route.nextHops.size() == 1) {
-        pair = PairOf(route.nextHops[0].index);
+    const Unit* source = SourceUnitOf(route);
+    const Unit* unit = source;
+    if (unit == nullptr && route.nextHops.size() == 1) {
+        unit = UnitOf(route.nextHops[0].index);
     }
-    if (pair == nullptr || GivesWay(*pair, route)) {
+    if (unit == nullptr || GivesWay(*unit, route)) {
         return;
     }
-    if (IsUnwanted(*pair, route)) {
+    if (IsUnwanted(*unit, route)) {
         RemoveRoute(route);
     } else if (source != nullptr) {
         CarryRoute(*source, route);
     }
 }
 
-void RoutePlanner::MakeWantedRoute(const Pair& pair, const Route& wanted)
+void RoutePlanner::MakeWantedRoute(const Unit& unit, const Route& wanted)
 {
     const auto& all = m_inputs.live.routes;
     bool slotIsElsewhere = false;
     for (const Route& live : all) {
-        const bool here = HasHopOn(live, pair.TargetLink()) || HasHopOn(live, pair.SourceLink());
+        const bool here = HasHopOn(live, unit.carrierLink) || HasHopOnSource(live, unit);
         if (here && RouteKeyText(live) == RouteKeyText(wanted)) {
             return;
         }
         slotIsElsewhere = slotIsElsewhere || (!here && RouteSlot(live) == RouteSlot(wanted));
     }
-    const NameOfIndex nameOf = [&](int) { return pair.TargetName(); };
-    Put(PartsOf(pair), wanted,
+    const NameOfIndex nameOf = [&](int) { return unit.carrier; };
+    Put(PartsOf(unit), wanted,
         (slotIsElsewhere ? "route append " : "route replace ") + RouteArguments(wanted, nameOf));
-    m_steps.records[pair.name].routes.insert(RouteKeyText(wanted));
+    m_steps.records[unit.name].routes.insert(RouteKeyText(wanted));
 }
 
 void RoutePlanner::Run()
 {
-    for (const Pair& pair : m_pairs) {
-        if (pair.removeUnwanted) {
-            std::erase_if(m_steps.records[pair.name].routes, [&](const std::string& key) {
-                const auto& wanted = m_wanted.at(pair.name);
+    for (const Unit& unit : m_units) {
+        if (unit.removeUnwanted) {
+            std::erase_if(m_steps.records[unit.name].routes, [&](const std::string& key) {
+                const auto& wanted = m_wanted.at(unit.name);
                 return std::none_of(wanted.begin(), wanted.end(),
                                     [&](const Route& each) { return RouteKeyText(each) == key; });
             });
@@ -252,10 +273,10 @@ void RoutePlanner::Run()
     for (const Route& route : m_inputs.live.routes) {
         PlanLiveRoute(route);
     }
-    for (const Pair& pair : m_pairs) {
-        for (const Route& wanted : m_wanted.at(pair.name)) {
-            if (pair.addWanted) {
-                MakeWantedRoute(pair, wanted);
+    for (const Unit& unit : m_units) {
+        for (const Route& wanted : m_wanted.at(unit.name)) {
+            if (unit.addWanted) {
+                MakeWantedRoute(unit, wanted);
             }
         }
     }

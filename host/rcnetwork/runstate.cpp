@@ -21,6 +21,8 @@ InterfaceRecord ReadRecord(const Json& object)
     record.routes = object.at("routes").get<std::set<std::string>>();
     record.unchecked = object.at("unchecked").get<std::set<std::string>>();
     record.broughtUp = object.at("broughtUp").get<bool>();
+    record.made = object.value("made", false);
+    record.ownMac = object.value("ownMac", "");
     record.formerMtu = ReadNumber(object, "formerMtu");
     record.tag = ReadNumber(object, "tag");
     record.formerSettings = object.at("formerSettings").get<std::map<std::string, std::string>>();
@@ -34,6 +36,12 @@ Json WriteRecord(const InterfaceRecord& record)
                    {"unchecked", record.unchecked},
                    {"broughtUp", record.broughtUp},
                    {"formerSettings", record.formerSettings}};
+    if (record.made) {
+        object["made"] = true;
+    }
+    if (!record.ownMac.empty()) {
+        object["ownMac"] = record.ownMac;
+    }
     if (record.formerMtu) {
         object["formerMtu"] = *record.formerMtu;
     }
@@ -47,8 +55,8 @@ Json WriteRecord(const InterfaceRecord& record)
 
 bool InterfaceRecord::Empty() const
 {
-    return addresses.empty() && routes.empty() && unchecked.empty() && !broughtUp && !formerMtu &&
-           !tag && formerSettings.empty();
+    return addresses.empty() && routes.empty() && unchecked.empty() && !broughtUp && !made &&
+           ownMac.empty() && !formerMtu && !tag && formerSettings.empty();
 }
 
 RunState ParseRunState(const std::string& text)

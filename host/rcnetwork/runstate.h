@@ -21,7 +21,9 @@ struct InterfaceRecord {
     /** IPv6 addresses that are being moved without the check for duplicates. */
     std::set<std::string> unchecked;
     bool broughtUp = false; ///< The link was down before.
+    bool made = false;      ///< The link itself: a bond, a VLAN.
     std::optional<unsigned> formerMtu;
+    std::string ownMac;          ///< Of an interface that has its bond's address.
     std::optional<unsigned> tag; ///< The VLAN tag that was set on the bridge's port.
     /** Settings of the plain interface as they were, by name, such as "ipv6.conf.accept_ra". */
     std::map<std::string, std::string> formerSettings;

@@ -16,6 +16,7 @@ namespace {
 constexpr char kFilePrefix[] = "ifcfg-";
 constexpr char kBridgePrefix[] = "ovs_";
 constexpr unsigned kMostNumberedAddresses = 256;
+constexpr unsigned kMostVlan = 4095;
 
 std::string Lower(std::string text)
 {
@@ -103,6 +104,9 @@ private:
     std::optional<bool> YesOrNo(const std::string& key);
     std::optional<unsigned> Number(const std::string& key, unsigned least, unsigned most);
     bool IsOwnFile();
+    void ReadStructure();
+    void ReadBondOptions();
+    void ReadVlan();
     void DecideUse();
     void ReadLinkKeys();
     void ReadIpv4();
@@ -181,30 +185,80 @@ bool Parser::IsOwnFile()
     return true;
 }
 
+void Parser::ReadStructure()
+{
+    InterfaceFile& file = m_parsed.file;
+    file.primary = Value("PRIMARY");
+    file.bridge = Value("BRIDGE");
+    file.slave = Lower(Value("SLAVE")) == "yes";
+    file.master = file.slave ? Value("MASTER") : "";
+    std::istringstream slaves(Value("SLAVE_LIST"));
+    for (std::string slave; slaves >> slave;) {
+        file.slaveList.push_back(slave);
+    }
+    ReadBondOptions();
+    const std::string type = Lower(Value("TYPE"));
+    const std::string bonding = Lower(Value("BONDING_MASTER"));
+    const auto& options = file.bondOptions;
+    file.bond = type == "bond" || bonding == "yes" ||
+                std::any_of(options.begin(), options.end(),
+                            [](const auto& option) { return option.first == "mode"; });
+    ReadVlan();
+}
+
+void Parser::ReadBondOptions()
+{
+    std::istringstream options(Value("BONDING_OPTS"));
+    for (std::string option; options >> option;) {
+        const auto equals = option.find('=');
+        if (equals == std::string::npos || equals == 0) {
+            Refuse("BONDING_OPTS", "\"" + option + "\" is not NAME=VALUE");
+            continue;
+        }
+        m_parsed.file.bondOptions.emplace_back(option.substr(0, equals), option.substr(equals + 1));
+    }
+}
+
+/** A VLAN's interface is called PARENT.ID, or its file says what its parent and its id are. */
+void Parser::ReadVlan()
+{
+    InterfaceFile& file = m_parsed.file;
+    const auto dot = file.name.rfind('.');
+    const bool named = dot != std::string::npos && dot > 0;
+    std::string parent = Value("PHYSDEV");
+    std::string id = Value("VLAN_ID");
+    if (named) {
+        parent = parent.empty() ? file.name.substr(0, dot) : parent;
+        id = id.empty() ? file.name.substr(dot + 1) : id;
+    }
+    const auto number = ToNumber(id, 0, kMostVlan);
+    if (!parent.empty() && number && file.name.rfind(kBridgePrefix, 0) != 0) {
+        file.vlan = FileVlan{parent, *number};
+    }
+}
+
 void Parser::DecideUse()
 {
     InterfaceFile& file = m_parsed.file;
     const bool bridgeName = file.name.rfind(kBridgePrefix, 0) == 0;
-    const std::string type = Value("TYPE");
-    file.primary = Value("PRIMARY");
-    file.bridge = Value("BRIDGE");
+    const bool bridgeType = Value("TYPE") == "OVS";
+    const bool ofBond = !file.slaveList.empty(); // may have any name
     const std::string protocol = Lower(Value("BOOTPROTO"));
 
-    if (bridgeName != (type == "OVS")) {
-        Leave(bridgeName ? "ignored, because its TYPE is not OVS"
-                         : "ignored, because a plain interface cannot have TYPE=OVS");
-    } else if (bridgeName && kBridgePrefix + file.primary != file.name) {
+    if (bridgeName && !bridgeType) {
+        Leave("ignored, because its TYPE is not OVS");
+    } else if (bridgeType && !bridgeName && !ofBond) {
+        Leave("ignored, because a plain interface cannot have TYPE=OVS");
+    } else if (bridgeType && !ofBond && kBridgePrefix + file.primary != file.name) {
         Leave("ignored, because its PRIMARY is \"" + file.primary + "\"");
-    } else if (Lower(Value("SLAVE")) == "yes") {
-        Leave("it belongs to a bond");
     } else if (protocol == "dhcp" || protocol == "bootp") {
         Leave("BOOTPROTO=" + protocol + " is not supported yet");
     } else if (!protocol.empty() && protocol != "none" && protocol != "static") {
         Leave("BOOTPROTO=" + protocol + " is unknown");
-    } else if (!bridgeName && !file.bridge.empty() && file.bridge != kBridgePrefix + file.name) {
+    } else if (!bridgeType && !file.bridge.empty() && file.bridge != kBridgePrefix + file.name) {
         Leave("BRIDGE=" + file.bridge + " is not supported yet");
     } else {
-        file.use = bridgeName ? FileUse::kBridge : FileUse::kPlain;
+        file.use = bridgeType ? FileUse::kBridge : FileUse::kPlain;
     }
 }
 
@@ -214,7 +268,7 @@ void Parser::ReadLinkKeys()
     file.onBoot = YesOrNo("ONBOOT").value_or(true);
     file.mtu = Number("MTU", 68, 65535);
     file.metric = Number("METRIC", 0, UINT32_MAX);
-    file.vlanId = Number("OVS_VLAN_ID", 0, 4095);
+    file.vlanId = Number("OVS_VLAN_ID", 0, kMostVlan);
     file.requiredMac = Lower(Value("HWADDR"));
     if (!Value("MACADDR").empty()) {
         Refuse("MACADDR", "changing the link address is not supported yet");
@@ -308,6 +362,7 @@ ParsedFile Parser::Parse()
     if (!IsOwnFile()) {
         return m_parsed;
     }
+    ReadStructure();
     DecideUse();
     if (m_parsed.file.use != FileUse::kLeaveAlone) {
         ReadLinkKeys();

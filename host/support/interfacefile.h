@@ -30,17 +30,32 @@ struct WantedAddress {
     bool operator==(const WantedAddress&) const = default;
 };
 
+/** The VLAN that an interface of its own stands for. */
+struct FileVlan {
+    std::string parent;
+    unsigned id = 0;
+
+    bool operator==(const FileVlan&) const = default;
+};
+
 /** What one file asks for. */
 struct InterfaceFile {
     std::string name;
     FileUse use = FileUse::kNone;
-    std::string primary; ///< The plain interface of a bridge file.
-    std::string bridge;  ///< The bridge that a plain file names.
+    std::string primary;                ///< The plain interface of a bridge file.
+    std::string bridge;                 ///< The bridge that a plain file names.
+    bool slave = false;                 ///< A member of a bond, or the bridge of one.
+    std::string master;                 ///< The bond of a plain file.
+    bool bond = false;                  ///< A plain file that says of itself to be a bond's.
+    std::vector<std::string> slaveList; ///< The members of the switch bond of a bridge file.
+    /** BONDING_OPTS in its order: options of the kernel's bond or columns of the switch's. */
+    std::vector<std::pair<std::string, std::string>> bondOptions;
+    std::optional<FileVlan> vlan; ///< Of a plain file.
     bool onBoot = true;
     bool whole = true; ///< No value was refused: what is missing here is really not wanted.
     std::optional<unsigned> mtu;
     std::optional<unsigned> metric;
-    std::optional<unsigned> vlanId;
+    std::optional<unsigned> vlanId; ///< The tag of the switch's port that carries the addresses.
     std::optional<bool> autoconf; ///< Whether IPv6 addresses are taken from routers.
     std::string requiredMac;      ///< The interface must have this link address.
     std::vector<WantedAddress> addresses;

@@ -15,7 +15,7 @@ lab_programs=(
 )
 
 # What the kernel needs for the lab, in any order: what they need in turn is found below.
-lab_modules=(openvswitch bonding 8021q dummy veth virtio_net virtio_pci)
+lab_modules=(openvswitch bonding 8021q bridge dummy veth virtio_net virtio_pci)
 
 lab_busybox()
 {

@@ -124,8 +124,6 @@ INSTANTIATE_TEST_SUITE_P(
                   "ignored, because its PRIMARY is \"\""},
         LeftAlone{"PlainWithBridgeType", "eth0", "DEVICE=eth0\nTYPE=OVS\n",
                   "ignored, because a plain interface cannot have TYPE=OVS"},
-        LeftAlone{"BondSlave", "eth1", "DEVICE=eth1\nSLAVE=yes\nMASTER=bond0\n",
-                  "it belongs to a bond"},
         LeftAlone{"Dhcp", "eth0", "BOOTPROTO=DHCP\n", "BOOTPROTO=dhcp is not supported yet"},
         LeftAlone{"OtherBridge", "wlan0", "BRIDGE=br0\n", "BRIDGE=br0 is not supported yet"},
         LeftAlone{"UnknownProtocol", "eth0", "BOOTPROTO=magic\n", "BOOTPROTO=magic is unknown"}),

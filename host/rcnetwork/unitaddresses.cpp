@@ -1,4 +1,4 @@
-#include "pairplan.h"
+#include "unitplan.h"
 
 #include "ipcommand.h"
 
@@ -34,7 +34,7 @@ std::string WantedText(const WantedAddress& wanted)
 
 } // namespace
 
-const Address* PairPlanner::FindOn(const Link* link, const Address& like) const
+const Address* UnitPlanner::FindOn(const Link* link, const Address& like) const
 {
     if (link == nullptr) {
         return nullptr;
@@ -46,50 +46,50 @@ const Address* PairPlanner::FindOn(const Link* link, const Address& like) const
     return found == all.end() ? nullptr : &*found;
 }
 
-bool PairPlanner::IsWanted(const Address& address) const
+bool UnitPlanner::IsWanted(const Address& address) const
 {
-    if (m_pair.file == nullptr) {
+    if (m_unit.file == nullptr) {
         return false;
     }
-    const auto& wanted = m_pair.file->addresses;
+    const auto& wanted = m_unit.file->addresses;
     return std::any_of(wanted.begin(), wanted.end(), [&](const WantedAddress& each) {
         return each.family == address.family && WantedText(each) == AddressText(address);
     });
 }
 
 /** Made by an earlier run, and nothing asks for it any more. */
-bool PairPlanner::IsUnwanted(const Address& address) const
+bool UnitPlanner::IsUnwanted(const Address& address) const
 {
-    return m_pair.removeUnwanted && m_former.addresses.contains(AddressText(address)) &&
-           (m_pair.takeDown || !IsWanted(address));
+    return m_unit.removeUnwanted && m_former.addresses.contains(AddressText(address)) &&
+           (m_unit.takeDown || !IsWanted(address));
 }
 
-bool PairPlanner::IsCarried(const Address& address) const
+bool UnitPlanner::IsCarried(const Address& address) const
 {
-    if (IsUnwanted(address) || FindOn(m_pair.TargetLink(), address) != nullptr) {
+    if (IsUnwanted(address) || FindOn(m_unit.carrierLink, address) != nullptr) {
         return false;
     }
     if (!IsLinkLocal(address)) {
         return true;
     }
     // The kernel makes the link-local address of a port as soon as that has a carrier.
-    if (!ToSwitch() && !m_pair.port->carrier) {
+    if (!ToSwitch() && !WireHasCarrier()) {
         return false;
     }
     const auto& all = m_inputs.live.addresses;
-    const Link* target = m_pair.TargetLink();
+    const Link* target = m_unit.carrierLink;
     return m_moves &&
            (target == nullptr || std::none_of(all.begin(), all.end(), [&](const Address& each) {
                 return each.index == target->index && IsLinkLocal(each);
             }));
 }
 
-void PairPlanner::CarryAddress(const Address& address)
+void UnitPlanner::CarryAddress(const Address& address, const Source& source)
 {
+    const std::string& from = source.link->name;
     // A port without carrier checks for duplicates once it has one, as it would have done.
-    const bool settled = ToSwitch() || m_pair.port->carrier;
-    m_steps.beside.addresses.push_back("addr add " +
-                                       AddressArguments(address, Target(), Source(), settled));
+    const bool settled = ToSwitch() || WireHasCarrier();
+    Build().addresses.push_back("addr add " + AddressArguments(address, Carrier(), from, settled));
     if (address.family != AF_INET6 || !settled) {
         return;
     }
@@ -100,27 +100,27 @@ void PairPlanner::CarryAddress(const Address& address)
     }
     if ((plain.flags & IFA_F_NODAD) == 0) {
         m_steps.move.addresses.push_back("addr change " +
-                                         AddressArguments(plain, Target(), Source(), false));
+                                         AddressArguments(plain, Carrier(), from, false));
         m_record.unchecked.insert(AddressText(address));
     }
 }
 
 /** Finishes what an earlier run that was cut short had moved. */
-void PairPlanner::SettleAddresses()
+void UnitPlanner::SettleAddresses()
 {
     for (const Address& address : m_inputs.live.addresses) {
-        if (m_pair.TargetLink() != nullptr && address.index == m_pair.TargetLink()->index &&
+        if (m_unit.carrierLink != nullptr && address.index == m_unit.carrierLink->index &&
             (address.flags & IFA_F_NODAD) != 0 &&
             m_former.unchecked.contains(AddressText(address)) && !IsUnwanted(address)) {
             Address plain = address;
             plain.flags &= ~std::uint32_t{IFA_F_NODAD};
             m_steps.move.addresses.push_back("addr change " +
-                                             AddressArguments(plain, Target(), Target(), false));
+                                             AddressArguments(plain, Carrier(), Carrier(), false));
         }
     }
 }
 
-void PairPlanner::RemoveAddress(const Address& address, const std::string& interface)
+void UnitPlanner::RemoveAddress(const Address& address, const std::string& interface)
 {
     const std::string peer = address.peer.empty() ? AddressText(address)
                                                   : address.local + " peer " + address.peer + "/" +
@@ -129,56 +129,55 @@ void PairPlanner::RemoveAddress(const Address& address, const std::string& inter
 }
 
 /** Later ones first: with its subnet's first address the kernel removes the others. */
-void PairPlanner::RemoveAddresses()
+void UnitPlanner::RemoveAddresses()
 {
     const auto& all = m_inputs.live.addresses;
-    const Link* source = m_pair.SourceLink();
-    const Link* target = m_pair.TargetLink();
-    bool removesFromTarget = false;
+    const Link* carrier = m_unit.carrierLink;
+    bool removesFromCarrier = false;
     for (const Address& address : std::vector<Address>(all.rbegin(), all.rend())) {
-        if (source != nullptr && address.index == source->index && m_pair.SourceStays()) {
+        const Source* source = m_unit.SourceOf(address.index);
+        if (source != nullptr && source->stays && !IsGathered(*source->link)) {
             // A port's link-local address goes with its IPv6 stack.
             if (!IsLinkLocal(address)) {
-                RemoveAddress(address, Source());
+                RemoveAddress(address, source->link->name);
             }
-        } else if (target != nullptr && address.index == target->index && IsUnwanted(address)) {
-            RemoveAddress(address, Target());
-            removesFromTarget = removesFromTarget || address.family == AF_INET;
+        } else if (carrier != nullptr && address.index == carrier->index && IsUnwanted(address)) {
+            RemoveAddress(address, Carrier());
+            removesFromCarrier = removesFromCarrier || address.family == AF_INET;
         }
     }
     // The other addresses of a subnet stay when its first one goes.
-    if (removesFromTarget && Live(Target(), kPromoteSecondaries) == "0") {
-        Set(m_steps.settingsBefore, Target(), kPromoteSecondaries, "1");
-        Set(m_steps.settingsAfter, Target(), kPromoteSecondaries, "0");
+    if (removesFromCarrier && Live(Carrier(), kPromoteSecondaries) == "0") {
+        Set(m_steps.settingsBefore, Carrier(), kPromoteSecondaries, "1");
+        Set(m_steps.settingsAfter, Carrier(), kPromoteSecondaries, "0");
     }
 }
 
-void PairPlanner::AddWantedAddress(const WantedAddress& wanted)
+void UnitPlanner::AddWantedAddress(const WantedAddress& wanted)
 {
     Address like;
     like.family = wanted.family;
     like.local = wanted.local;
     like.prefixLength = wanted.prefixLength;
-    const Address* present = FindOn(m_pair.TargetLink(), like);
-    if (present == nullptr) {
-        present = FindOn(m_pair.SourceLink(), like);
+    const Address* present = FindOn(m_unit.carrierLink, like);
+    for (const Source& source : m_unit.sources) {
+        present = present == nullptr ? FindOn(source.link, like) : present;
     }
     if (present != nullptr && present->prefixLength == wanted.prefixLength) {
         return;
     }
-    if (present != nullptr && m_pair.TargetLink() != nullptr &&
-        present->index == m_pair.TargetLink()->index) {
-        m_steps.beside.addresses.push_back("addr del " + AddressText(*present) + " dev " +
-                                           Target());
+    if (present != nullptr && m_unit.carrierLink != nullptr &&
+        present->index == m_unit.carrierLink->index) {
+        Build().addresses.push_back("addr del " + AddressText(*present) + " dev " + Carrier());
     }
     const bool broadcast = wanted.family == AF_INET && wanted.prefixLength <= 30;
-    m_steps.beside.addresses.push_back("addr add " + WantedText(wanted) +
-                                       (broadcast ? " brd +" : "") + " dev " + Target());
+    Build().addresses.push_back("addr add " + WantedText(wanted) + (broadcast ? " brd +" : "") +
+                                " dev " + Carrier());
     m_record.addresses.insert(WantedText(wanted));
 }
 
 /** The kernel lists IPv4 addresses in the order in which they were made, IPv6 ones against it. */
-void PairPlanner::CarryAddresses()
+void UnitPlanner::CarryAddressesOf(const Source& source)
 {
     const auto& all = m_inputs.live.addresses;
     std::vector<Address> inOrder;
@@ -189,27 +188,35 @@ void PairPlanner::CarryAddresses()
     }
     std::copy_if(all.rbegin(), all.rend(), std::back_inserter(inOrder),
                  [](const Address& address) { return address.family == AF_INET6; });
-    const Link* source = m_pair.SourceLink();
     for (const Address& address : inOrder) {
-        if (source != nullptr && address.index == source->index && IsCarried(address)) {
-            CarryAddress(address);
+        if (address.index == source.link->index && IsCarried(address) &&
+            m_carried.insert(IsLinkLocal(address) ? "link" : AddressText(address)).second) {
+            CarryAddress(address, source);
         }
     }
 }
 
-void PairPlanner::PlanAddresses()
+/** What is on several sources is the same address once. */
+void UnitPlanner::CarryAddresses()
+{
+    for (const Source& source : m_unit.sources) {
+        CarryAddressesOf(source);
+    }
+}
+
+void UnitPlanner::PlanAddresses()
 {
     CarryAddresses();
-    if (m_pair.removeUnwanted && m_pair.file != nullptr) {
-        const auto& wanted = m_pair.file->addresses;
+    if (m_unit.removeUnwanted && m_unit.file != nullptr) {
+        const auto& wanted = m_unit.file->addresses;
         std::erase_if(m_record.addresses, [&](const std::string& text) {
             return std::none_of(wanted.begin(), wanted.end(), [&](const WantedAddress& each) {
                 return WantedText(each) == text;
             });
         });
     }
-    if (m_pair.addWanted) {
-        for (const WantedAddress& wanted : m_pair.file->addresses) {
+    if (m_unit.addWanted) {
+        for (const WantedAddress& wanted : m_unit.file->addresses) {
             AddWantedAddress(wanted);
         }
     }
@@ -221,27 +228,27 @@ void PairPlanner::PlanAddresses()
  * Neighbours are known on the target from the first packet on. Otherwise an answer to the first
  * question could still arrive at the source and be lost, and the next question is a second away.
  */
-void PairPlanner::CarryNeighbours()
+void UnitPlanner::CarryNeighbours()
 {
-    const Link* source = m_pair.SourceLink();
-    const Link* target = m_pair.TargetLink();
+    const Link* carrier = m_unit.carrierLink;
     const auto& all = m_inputs.live.neighbours;
     for (const Neighbour& neighbour : all) {
+        const Source* source = m_unit.SourceOf(neighbour.index);
         const bool known =
-            target != nullptr && std::any_of(all.begin(), all.end(), [&](const Neighbour& each) {
-                return each.index == target->index && each.address == neighbour.address &&
+            carrier != nullptr && std::any_of(all.begin(), all.end(), [&](const Neighbour& each) {
+                return each.index == carrier->index && each.address == neighbour.address &&
                        each.mac == neighbour.mac;
             });
-        if (source == nullptr || neighbour.index != source->index || known) {
+        if (source == nullptr || known) {
             continue;
         }
-        m_steps.beside.neighbours.push_back(
-            "neigh replace " + neighbour.address + " lladdr " + neighbour.mac + " dev " + Target() +
-            (neighbour.permanent ? " nud permanent" : " nud stale") +
-            (neighbour.router ? " router" : ""));
-        if (neighbour.permanent && m_pair.SourceStays()) {
+        Build().neighbours.push_back("neigh replace " + neighbour.address + " lladdr " +
+                                     neighbour.mac + " dev " + Carrier() +
+                                     (neighbour.permanent ? " nud permanent" : " nud stale") +
+                                     (neighbour.router ? " router" : ""));
+        if (neighbour.permanent && source->stays && !IsGathered(*source->link)) {
             m_steps.move.removedNeighbours.push_back("neigh del " + neighbour.address + " dev " +
-                                                     Source());
+                                                     source->link->name);
         }
     }
 }

@@ -1,0 +1,143 @@
+#include "portcolumns.h"
+
+#include <algorithm>
+#include <array>
+#include <sstream>
+#include <string_view>
+
+namespace vornhost {
+namespace {
+
+constexpr char kOther[] = "other_config:";
+constexpr char kOtherToo[] = "other-config:";
+constexpr std::array<std::string_view, 3> kModes{"active-backup", "balance-slb", "balance-tcp"};
+constexpr std::array<std::string_view, 3> kLacp{"active", "passive", "off"};
+
+bool StartsWith(const std::string& text, const char* beginning)
+{
+    return text.rfind(beginning, 0) == 0;
+}
+
+std::string LiveValue(const SwitchPort& live, const std::string& name)
+{
+    const bool other = StartsWith(name, kOther);
+    const SwitchValues& values = other ? live.otherConfig : live.columns;
+    const auto found = values.find(other ? name.substr(sizeof kOther - 1) : name);
+    return found == values.end() ? std::string() : found->second;
+}
+
+std::vector<std::string> Split(const std::string& text)
+{
+    std::istringstream stream(text);
+    std::vector<std::string> parts;
+    for (std::string part; std::getline(stream, part, ',');) {
+        parts.push_back(part);
+    }
+    return parts;
+}
+
+template <std::size_t N>
+bool IsOneOf(const std::array<std::string_view, N>& words, const std::string& word)
+{
+    return std::find(words.begin(), words.end(), word) != words.end();
+}
+
+/** Quoted whole, so that the tool takes it for one value. */
+std::string Quoted(const std::string& value)
+{
+    const bool plain =
+        value.find_first_not_of("abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ"
+                                "0123456789_-") == std::string::npos;
+    return plain ? value : "\"" + value + "\"";
+}
+
+} // namespace
+
+PortColumns::PortColumns(const InterfaceFile& file, const FormerBond* former)
+{
+    m_hasOptions = !file.bondOptions.empty();
+    if (former != nullptr) {
+        m_values = former->columns;
+    }
+    for (const auto& [name, value] : file.bondOptions) {
+        const bool other = StartsWith(name, kOtherToo);
+        m_values[other ? kOther + name.substr(sizeof kOtherToo - 1) : name] = value;
+    }
+    // The kernel's bond carries traffic to a partner that does not speak the protocol, too.
+    if (SpeaksLacp()) {
+        m_values.try_emplace(std::string(kOther) + "lacp-fallback-ab", "true");
+    }
+}
+
+std::string PortColumns::Get(const std::string& name) const
+{
+    const auto found = m_values.find(name);
+    return found == m_values.end() ? std::string() : found->second;
+}
+
+bool PortColumns::SpeaksLacp() const
+{
+    return Get("lacp") == "active" || Get("lacp") == "passive";
+}
+
+std::string PortColumns::Objection() const
+{
+    if (!m_hasOptions) {
+        return "BONDING_OPTS is empty";
+    }
+    const std::string mode = Get("bond_mode");
+    if (!IsOneOf(kModes, mode)) {
+        return "the switch has no bond mode \"" + mode + "\"";
+    }
+    const std::string lacp = Get("lacp");
+    if (!lacp.empty() && !IsOneOf(kLacp, lacp)) {
+        return "lacp=" + lacp + " is neither active nor passive nor off";
+    }
+    return {};
+}
+
+std::string PortColumns::Keys() const
+{
+    std::string keys;
+    for (const auto& [name, value] : m_values) {
+        keys += (keys.empty() ? "" : ",") + name;
+    }
+    return keys;
+}
+
+std::string PortColumns::Changes(const SwitchPort* live, bool wanted) const
+{
+    if (!wanted || !Objection().empty()) {
+        return {};
+    }
+    std::string changes;
+    for (const auto& [name, value] : m_values) {
+        if (live == nullptr || LiveValue(*live, name) != value) {
+            changes += " " + name + "=" + Quoted(value);
+        }
+    }
+    const bool same = live != nullptr && live->externalIds.contains(kOptionsKey) &&
+                      live->externalIds.at(kOptionsKey) == Keys();
+    return same ? changes : changes + " external_ids:" + kOptionsKey + "=" + Quoted(Keys());
+}
+
+std::vector<std::string> PortColumns::Removals(const std::string& port, const SwitchPort* live,
+                                               bool wanted) const
+{
+    std::vector<std::string> removals;
+    if (live == nullptr || !wanted || !Objection().empty() ||
+        !live->externalIds.contains(kOptionsKey)) {
+        return removals;
+    }
+    for (const std::string& name : Split(live->externalIds.at(kOptionsKey))) {
+        if (m_values.contains(name) || LiveValue(*live, name).empty()) {
+            continue;
+        }
+        removals.push_back(StartsWith(name, kOther) ? "remove Port " + port + " other_config " +
+                                                          name.substr(sizeof kOther - 1)
+                                                    : "clear Port " + port + " " + name);
+    }
+    return removals;
+}
+
+} // namespace vornhost

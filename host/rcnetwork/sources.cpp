@@ -1,0 +1,214 @@
+#include "sources.h"
+
+#include <algorithm>
+
+#include <linux/rtnetlink.h>
+
+namespace vornhost {
+namespace {
+
+class SourceFinder {
+public:
+    SourceFinder(const Inputs& inputs, const Kinship& kinship, Unit& unit)
+        : m_inputs(inputs), m_kinship(kinship), m_unit(unit)
+    {
+    }
+    void Run();
+
+private:
+    void Absorb();
+    void NameCarrier();
+    std::string TagDevice() const;
+    void Look(const std::string& base);
+    void Add(const Link* link, bool stays);
+    bool BelongsToAVlan(const Link& device, const std::string& base) const;
+    bool HasAddresses(const Link& link) const;
+    bool IsLate() const;
+    bool IsOnWrongParent() const;
+
+    const Inputs& m_inputs;
+    const Kinship& m_kinship;
+    Unit& m_unit;
+};
+
+void SourceFinder::Absorb()
+{
+    auto& absorbed = m_unit.absorbed;
+    for (const std::string& member : m_kinship.MembersOf(m_unit.name)) {
+        absorbed.push_back(member);
+    }
+    for (const std::string& bond : m_kinship.LegaciesOf(m_unit.name)) {
+        absorbed.push_back(bond);
+    }
+    if (m_unit.tag) {
+        for (const Link& link : m_inputs.live.links) {
+            if (link.kind == "vlan" && !IsTagDevice(link) && m_unit.port != nullptr &&
+                link.parent == m_unit.port->index && link.vlanId == static_cast<int>(*m_unit.tag) &&
+                !m_kinship.HasFile(link.name)) {
+                absorbed.push_back(link.name);
+            }
+        }
+    }
+}
+
+/** One that is there keeps its name; a new one is named after an interface that nobody else is. */
+std::string SourceFinder::TagDevice() const
+{
+    const Link* owner = m_unit.port;
+    for (const Link& link : m_inputs.live.links) {
+        if (owner != nullptr && IsTagDevice(link) && link.parent == owner->index &&
+            link.vlanId == static_cast<int>(*m_unit.tag)) {
+            return link.name;
+        }
+    }
+    if (owner == nullptr && !m_unit.members.empty()) {
+        owner = m_unit.members.back();
+    }
+    return "tag" + std::to_string(owner == nullptr ? 0 : owner->index) + "." +
+           std::to_string(*m_unit.tag);
+}
+
+void SourceFinder::NameCarrier()
+{
+    if (m_unit.target == Target::kSwitch) {
+        m_unit.carrier = m_unit.bridge;
+    } else if (m_unit.tag) {
+        m_unit.carrier = TagDevice();
+    } else if (m_unit.kind == UnitKind::kSwitchBond) {
+        m_unit.carrier = m_unit.port->name;
+    } else {
+        m_unit.carrier = m_unit.name;
+    }
+    m_unit.carrierLink = m_unit.target == Target::kSwitch ? m_unit.bridgeLink
+                                                          : m_inputs.live.FindLink(m_unit.carrier);
+}
+
+bool SourceFinder::HasAddresses(const Link& link) const
+{
+    const auto& addresses = m_inputs.live.addresses;
+    return std::any_of(addresses.begin(), addresses.end(), [&](const Address& address) {
+        return address.index == link.index && address.scope == RT_SCOPE_UNIVERSE;
+    });
+}
+
+void SourceFinder::Add(const Link* link, bool stays)
+{
+    if (link == nullptr || link->name == m_unit.carrier ||
+        m_unit.SourceOf(link->index) != nullptr) {
+        return;
+    }
+    m_unit.sources.push_back({link, stays});
+}
+
+/** What a file asks for as the VLAN's own interface takes over what the tag stood for. */
+bool SourceFinder::BelongsToAVlan(const Link& device, const std::string& base) const
+{
+    const auto& files = m_inputs.files;
+    return std::any_of(files.begin(), files.end(), [&](const auto& entry) {
+        const InterfaceFile& file = entry.second;
+        return file.use == FileUse::kPlain && file.name != m_unit.name && file.vlan &&
+               file.vlan->parent == base && static_cast<int>(file.vlan->id) == device.vlanId;
+    });
+}
+
+void SourceFinder::Look(const std::string& base)
+{
+    const Link* link = m_inputs.live.FindLink(base);
+    const bool legacy = base != m_unit.name && m_inputs.live.bonds.contains(base) &&
+                        !m_kinship.HeirOf(base).empty();
+    const bool replaced = m_unit.kind == UnitKind::kSwitchBond && base == m_unit.name;
+    const bool device = link != nullptr && link->kind == "vlan" && base != m_unit.name;
+    if (base != m_unit.bridge) {
+        Add(link, !legacy && !replaced && !device);
+    }
+    for (const Link& each : m_inputs.live.links) {
+        if (link != nullptr && IsTagDevice(each) && each.parent == link->index &&
+            !BelongsToAVlan(each, base)) {
+            Add(&each, false);
+        }
+    }
+    const std::string bridge = m_kinship.BridgeFor(base);
+    if (base == m_unit.name) {
+        Add(m_unit.bridgeLink, m_unit.BridgeStays());
+        return;
+    }
+    Unit other;
+    other.name = base;
+    other.bridge = bridge;
+    other.target = Target::kPlain;
+    other.switchBridge = m_inputs.switchState.Find(bridge);
+    if (other.switchBridge != nullptr && other.switchBridge->marked) {
+        Add(m_inputs.live.FindLink(bridge), other.BridgeStays());
+    }
+}
+
+/** A VLAN's interface whose bond has gone, or has gone on to the switch. */
+bool SourceFinder::IsOnWrongParent() const
+{
+    if (m_unit.kind != UnitKind::kVlan || m_unit.port == nullptr || !m_unit.addWanted) {
+        return false;
+    }
+    const FileVlan& vlan = *m_kinship.UsableFile(m_unit.name)->vlan;
+    const std::string parent = m_kinship.ParentFor(vlan);
+    return m_inputs.live.FindLink(parent) != nullptr &&
+           m_inputs.live.NameOf(m_unit.port->parent) != parent;
+}
+
+/** Whether the carrier cannot carry anything before something else has gone or come. */
+bool SourceFinder::IsLate() const
+{
+    if (m_unit.target == Target::kSwitch) {
+        return false;
+    }
+    const bool replaces =
+        std::any_of(m_unit.sources.begin(), m_unit.sources.end(), [&](const Source& source) {
+            const bool sameVlan = source.link->kind == "vlan" && m_unit.carrierLink == nullptr &&
+                                  (m_unit.tag || m_unit.kind == UnitKind::kVlan);
+            return !source.stays && (sameVlan || source.link->kind == "bond");
+        });
+    const bool gathers =
+        m_unit.kind == UnitKind::kBond &&
+        std::any_of(m_unit.members.begin(), m_unit.members.end(), [&](const Link* member) {
+            return m_unit.port == nullptr || member->master != m_unit.port->index;
+        });
+    return replaces || gathers;
+}
+
+void SourceFinder::Run()
+{
+    Absorb();
+    NameCarrier();
+    if (IsOnWrongParent()) {
+        m_unit.rebuilt = true;
+        if (m_unit.carrierLink == m_unit.port) {
+            m_unit.carrierLink = nullptr;
+            m_unit.sources.push_back({m_unit.port, false});
+        }
+    }
+    Look(m_unit.name);
+    for (const std::string& base : m_unit.absorbed) {
+        Look(base);
+    }
+    if (m_unit.kind == UnitKind::kVlan) {
+        const InterfaceFile* file = m_kinship.UsableFile(m_unit.name);
+        for (const Link& each : m_inputs.live.links) {
+            if (file != nullptr && IsTagDevice(each) &&
+                each.vlanId == static_cast<int>(file->vlan->id) &&
+                m_inputs.live.NameOf(each.parent) == file->vlan->parent) {
+                Add(&each, false);
+            }
+        }
+    }
+    std::stable_partition(m_unit.sources.begin(), m_unit.sources.end(),
+                          [&](const Source& source) { return HasAddresses(*source.link); });
+    m_unit.late = IsLate();
+}
+
+} // namespace
+
+void FindSources(const Inputs& inputs, const Kinship& kinship, Unit& unit)
+{
+    SourceFinder(inputs, kinship, unit).Run();
+}
+
+} // namespace vornhost

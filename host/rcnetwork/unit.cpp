@@ -1,0 +1,64 @@
+#include "unit.h"
+
+#include <algorithm>
+
+namespace vornhost {
+namespace {
+
+constexpr char kBridgePrefix[] = "ovs_";
+constexpr char kBondSuffix[] = "-bond";
+
+} // namespace
+
+std::string BridgeOf(const std::string& plainName)
+{
+    return kBridgePrefix + plainName;
+}
+
+std::string PlainOf(const std::string& name)
+{
+    return name.rfind(kBridgePrefix, 0) == 0 ? name.substr(sizeof kBridgePrefix - 1) : name;
+}
+
+std::vector<std::string> Unit::ForeignPorts() const
+{
+    std::vector<std::string> ports;
+    if (switchBridge != nullptr) {
+        for (const SwitchPort& each : switchBridge->ports) {
+            if (each.name != name && each.name != bridge && !each.marked) {
+                ports.push_back(each.name);
+            }
+        }
+    }
+    return ports;
+}
+
+bool Unit::BridgeStays() const
+{
+    return target == Target::kSwitch || switchBridge == nullptr || !switchBridge->marked ||
+           !ForeignPorts().empty();
+}
+
+const Source* Unit::SourceOf(int index) const
+{
+    const auto found = std::find_if(sources.begin(), sources.end(), [&](const Source& source) {
+        return source.link->index == index;
+    });
+    return found == sources.end() ? nullptr : &*found;
+}
+
+std::vector<const Link*> Unit::Ports() const
+{
+    if (kind == UnitKind::kSwitchBond || (kind == UnitKind::kBond && port == nullptr)) {
+        return members;
+    }
+    return port == nullptr ? std::vector<const Link*>() : std::vector{port};
+}
+
+/** The port that holds the members; a bridge of the same name has a port of its own. */
+std::string Unit::BondPort() const
+{
+    return bridge == name ? name + kBondSuffix : name;
+}
+
+} // namespace vornhost

@@ -1,0 +1,231 @@
+#include "unitplan.h"
+
+#include "support/bondoptions.h"
+
+#include <algorithm>
+#include <array>
+#include <set>
+
+namespace vornhost {
+namespace {
+
+/** The kernel takes the others only once these are set. */
+constexpr std::array kFirstOptions{"mode", "miimon", "arp_interval"};
+
+std::string OptionLine(const std::string& bond, const std::string& name, const std::string& value)
+{
+    return "link set dev " + bond + " type bond " + name + " " + value;
+}
+
+/** The options that the tool has no word for or that stand under another name already. */
+bool IsForTheTool(const std::string& name)
+{
+    return name != "mode" && name != "num_unsol_na";
+}
+
+BondOptions OptionsOf(const InterfaceFile& file)
+{
+    std::string text;
+    for (const auto& [name, value] : file.bondOptions) {
+        text += name + "=" + value + " ";
+    }
+    return BondOptions::Parse(text);
+}
+
+std::vector<std::string> InOrder(const BondOptions& options)
+{
+    std::vector<std::string> names(kFirstOptions.begin() + 1, kFirstOptions.end());
+    for (const auto& [name, value] : options.values) {
+        if (IsForTheTool(name) && std::find(names.begin(), names.end(), name) == names.end()) {
+            names.push_back(name);
+        }
+    }
+    std::erase_if(names, [&](const std::string& name) { return options.Get(name).empty(); });
+    return names;
+}
+
+} // namespace
+
+bool UnitPlanner::IsGathered(const Link& link) const
+{
+    const auto& members = m_unit.members;
+    return m_unit.kind == UnitKind::kBond && m_unit.addWanted &&
+           std::find(members.begin(), members.end(), &link) != members.end() &&
+           (m_unit.port == nullptr || link.master != m_unit.port->index);
+}
+
+void UnitPlanner::MakeVlan(const std::string& device, const std::string& parent, unsigned id)
+{
+    auto& lines = m_unit.late ? m_steps.move.links : m_steps.devices.links;
+    lines.push_back("link add link " + parent + " name " + device + " type vlan id " +
+                    std::to_string(id));
+    if (m_unit.late && m_moves) {
+        lines.push_back("link set dev " + device + " addrgenmode none");
+    }
+    Build().links.push_back("link set dev " + device + " up");
+}
+
+/** A second VLAN of one id on one parent cannot be made before the first one is gone. */
+void UnitPlanner::RemoveOldVlans()
+{
+    for (const Source& source : m_unit.sources) {
+        if (source.link->kind == "vlan" && !source.stays) {
+            auto& lines = m_unit.late ? m_steps.move.links : m_steps.move.linksDown;
+            lines.push_back("link del dev " + source.link->name);
+        }
+    }
+}
+
+void UnitPlanner::PlanDevices()
+{
+    RemoveOldVlans();
+    if (!m_unit.addWanted || m_unit.takeDown) {
+        return;
+    }
+    if (m_unit.kind == UnitKind::kBond) {
+        if (m_unit.port == nullptr) {
+            MakeBond();
+        } else {
+            AdjustBondOptions();
+        }
+        Gather();
+    }
+    if (m_unit.kind == UnitKind::kVlan && (m_unit.port == nullptr || m_unit.rebuilt)) {
+        const FileVlan& vlan = *m_inputs.files.at(m_unit.name).vlan;
+        MakeVlan(m_unit.name, m_kinship.ParentFor(vlan), vlan.id);
+        m_record.made = true;
+    } else if (m_unit.tag && !ToSwitch() && m_unit.carrierLink == nullptr) {
+        const bool noPort = m_unit.kind == UnitKind::kSwitchBond;
+        MakeVlan(m_unit.carrier, noPort ? m_unit.port->name : m_unit.name, *m_unit.tag);
+    }
+}
+
+void UnitPlanner::MakeBond()
+{
+    const BondOptions options = OptionsOf(m_inputs.files.at(m_unit.name));
+    auto& lines = m_steps.devices.links;
+    std::string line = "link add dev " + m_unit.name;
+    if (!WantedMac().empty()) {
+        line += " address " + WantedMac();
+    }
+    const unsigned mtu = WantedMtu();
+    line += " mtu " + std::to_string(mtu) + " type bond";
+    line += options.Get("mode").empty() ? "" : " mode " + options.Get("mode");
+    lines.push_back(line);
+    for (const std::string& name : InOrder(options)) {
+        lines.push_back(OptionLine(m_unit.name, name, options.Get(name)));
+    }
+    lines.push_back("link set dev " + m_unit.name + " up");
+    m_record.made = true;
+    m_record.broughtUp = true;
+}
+
+/** What the file does not mention stays as somebody may have set it. */
+void UnitPlanner::AdjustBondOptions()
+{
+    const auto live = m_inputs.live.bonds.find(m_unit.name);
+    const InterfaceFile& file = m_inputs.files.at(m_unit.name);
+    if (live == m_inputs.live.bonds.end() || live->second.options.empty()) {
+        return;
+    }
+    const BondOptions options = OptionsOf(file);
+    for (const auto& [name, value] : options.values) {
+        const auto has = live->second.options.find(name);
+        if (has != live->second.options.end() && has->second == value) {
+            continue;
+        }
+        if (name == "mode") {
+            m_remarks.push_back(
+                {Severity::kWarning, m_unit.name + " keeps its mode " +
+                                         (has == live->second.options.end() ? "" : has->second) +
+                                         " until it is stopped and started; ifcfg-" + m_unit.name +
+                                         " says " + value});
+            return;
+        }
+        if (IsForTheTool(name) && has != live->second.options.end()) {
+            m_steps.beside.links.push_back(OptionLine(m_unit.name, name, value));
+        }
+    }
+}
+
+void UnitPlanner::Gather()
+{
+    for (const Link* member : m_unit.members) {
+        if (IsGathered(*member)) {
+            GatherMember(*member);
+        }
+    }
+}
+
+/** Only an interface that is down can become a member; the bond brings it up again. */
+void UnitPlanner::GatherMember(const Link& member)
+{
+    auto& lines = m_steps.move.links;
+    InterfaceRecord& record = m_steps.records[member.name];
+    const auto& addresses = m_inputs.live.addresses;
+    if (std::any_of(addresses.begin(), addresses.end(),
+                    [&](const Address& address) { return address.index == member.index; })) {
+        lines.push_back("addr flush dev " + member.name);
+    }
+    if (member.up) {
+        lines.push_back("link set dev " + member.name + " down");
+    } else {
+        record.broughtUp = true;
+    }
+    const std::string own = record.ownMac;
+    if (!own.empty() && own != member.mac) {
+        lines.push_back("link set dev " + member.name + " address " + own);
+    }
+    record.ownMac.clear();
+    lines.push_back("link set dev " + member.name + " master " + m_unit.name);
+}
+
+void UnitPlanner::DissolveBonds()
+{
+    for (const std::string& bond : m_kinship.LegaciesOf(m_unit.name)) {
+        if (m_inputs.live.bonds.contains(bond)) {
+            DissolveBond(bond);
+        }
+    }
+    if (m_unit.kind == UnitKind::kSwitchBond && m_inputs.live.bonds.contains(m_unit.name)) {
+        DissolveBond(m_unit.name);
+    }
+}
+
+/** The members are free before the bond goes, so that the first one carries on at once. */
+void UnitPlanner::DissolveBond(const std::string& bond)
+{
+    auto& lines = ToSwitch() ? m_steps.beside.links : m_steps.move.links;
+    for (const std::string& member : m_inputs.live.bonds.at(bond).members) {
+        ReleaseMember(bond, member);
+    }
+    lines.push_back("link del dev " + bond);
+}
+
+void UnitPlanner::ReleaseMember(const std::string& bond, const std::string& member)
+{
+    auto& lines = ToSwitch() ? m_steps.beside.links : m_steps.move.links;
+    const LiveBond& live = m_inputs.live.bonds.at(bond);
+    const Link* bondLink = m_inputs.live.FindLink(bond);
+    const HandedBond* handed = m_inputs.handover.FirstOf(member);
+    const auto own = live.ownMacs.find(member);
+    lines.push_back("link set dev " + member + " nomaster");
+    InterfaceRecord record = member == m_unit.name ? m_record : FormerRecord(member);
+    if (handed != nullptr && bondLink != nullptr && own != live.ownMacs.end() &&
+        own->second != bondLink->mac) {
+        // Its neighbours go on to find the host where they know it.
+        lines.push_back("link set dev " + member + " address " + bondLink->mac);
+        record.ownMac = own->second;
+    }
+    const bool stopped = m_unit.takeDown && record.broughtUp;
+    if (!stopped && !m_inputs.handover.IsSilent(member)) {
+        lines.push_back("link set dev " + member + " up");
+    }
+    if (member == m_unit.name) {
+        m_record = record;
+    } else {
+        m_steps.records[member] = record;
+    }
+}
+
+} // namespace vornhost

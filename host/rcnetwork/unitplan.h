@@ -1,0 +1,140 @@
+/**
+ * The steps of one unit, sorted by the stage in which the whole host takes them.
+ */
+#ifndef VORNHOST_RCNETWORK_UNITPLAN_H
+#define VORNHOST_RCNETWORK_UNITPLAN_H
+
+#include "decision.h"
+
+#include <string>
+#include <vector>
+
+namespace vornhost {
+
+/** One "ip -batch", in the order in which its parts run. */
+struct BatchParts {
+    std::vector<std::string> links;
+    std::vector<std::string> addresses;
+    std::vector<std::string> neighbours;
+    std::vector<std::string> routes;
+    std::vector<std::string> defaultRoutes;
+    std::vector<std::string> removedRoutes;
+    std::vector<std::string> removedNeighbours;
+    std::vector<std::string> removedAddresses;
+    std::vector<std::string> linksDown;
+
+    std::vector<std::string> Lines() const;
+};
+
+/** What every interface contributes to the stages of the host's plan. */
+struct Steps {
+    bool needsSwitch = false;
+    std::vector<std::string> makeBridges;
+    std::vector<std::string> waitFor;
+    BatchParts devices; ///< Bonds and VLANs that are missing.
+    std::vector<std::string> settingsBefore;
+    BatchParts beside; ///< Made while traffic still takes its former way.
+    std::vector<std::string> leave;
+    std::vector<std::string> join;
+    BatchParts move; ///< Follows the ports.
+    std::vector<std::string> announce;
+    std::vector<std::string> settingsAfter;
+    std::vector<std::string> negotiate;
+    std::vector<std::string> forgetGateways;
+    std::map<std::string, InterfaceRecord> records; ///< What is made once they are done.
+};
+
+/** Plans one unit. */
+class UnitPlanner {
+public:
+    UnitPlanner(const Inputs& inputs, const Kinship& kinship, const Unit& unit, Steps& steps,
+                std::vector<Remark>& remarks);
+
+    /** Adds the steps of everything but the routes. */
+    void Run();
+
+private:
+    const std::string& Carrier() const { return m_unit.carrier; }
+    bool ToSwitch() const { return m_unit.target == Target::kSwitch; }
+    /** Where what the carrier is to carry is put on it: beside traffic, or when it can do so. */
+    BatchParts& Build() const { return m_unit.late ? m_steps.move : m_steps.beside; }
+    std::string MainSource() const;
+    bool WireHasCarrier() const;
+    bool HasGlobalAddress(const Link* link) const;
+    InterfaceRecord FormerRecord(const std::string& name) const;
+    void AbsorbRecords();
+    void KeepRecordsOfOthers();
+    std::string Live(const std::string& interface, const std::string& setting) const;
+
+    // unitswitch.cpp: bridges and ports
+    void PlanBridge();
+    void MakeBridge();
+    void AdjustBridge();
+    void LeaveBridges();
+    void LeaveBridge(const SwitchBridge& bridge, const Unit& owner);
+    void JoinPort();
+    void JoinBond();
+    void AdjustMembers(const SwitchPort& live, const std::vector<std::string>& members);
+    void ForgetGateways(const std::string& bridge);
+    const FormerBond* Remembered() const;
+    std::string WantedMac() const;
+    unsigned WantedMtu() const;
+
+    // unitdevices.cpp: bonds and VLANs of the kernel
+    void PlanDevices();
+    void MakeBond();
+    void Gather();
+    void GatherMember(const Link& member);
+    void AdjustBondOptions();
+    void DissolveBonds();
+    void DissolveBond(const std::string& bond);
+    void ReleaseMember(const std::string& bond, const std::string& member);
+    void MakeVlan(const std::string& device, const std::string& parent, unsigned id);
+    void RemoveOldVlans();
+
+    // unitsettings.cpp: links and the kernel's settings of an interface
+    void PlanLinks();
+    void PlanLink(const Link& link);
+    void PlanFormerLink();
+    void PlanFormerLink(const std::string& name);
+    bool IsReleased(const Link& link) const;
+    std::vector<std::string>& Settings() const;
+    void CarrySettings();
+    void MoveIpv6Stack();
+    void SilencePorts();
+    void SilencePort(const Link& port);
+    void RestorePort(const std::string& name);
+    void PlanAutoconf();
+    void Set(std::vector<std::string>& stage, const std::string& interface,
+             const std::string& setting, const std::string& value) const;
+
+    // unitaddresses.cpp: addresses and neighbours
+    void PlanAddresses();
+    void CarryAddresses();
+    bool IsGathered(const Link& link) const;
+    void CarryAddressesOf(const Source& source);
+    void CarryAddress(const Address& address, const Source& source);
+    void SettleAddresses();
+    bool IsCarried(const Address& address) const;
+    void AddWantedAddress(const WantedAddress& wanted);
+    void RemoveAddresses();
+    void RemoveAddress(const Address& address, const std::string& interface);
+    bool IsWanted(const Address& address) const;
+    bool IsUnwanted(const Address& address) const;
+    const Address* FindOn(const Link* link, const Address& like) const;
+    void CarryNeighbours();
+
+    const Inputs& m_inputs;
+    const Kinship& m_kinship;
+    const Unit& m_unit;
+    Steps& m_steps;
+    std::vector<Remark>& m_remarks;
+    InterfaceRecord m_former;
+    InterfaceRecord m_record;
+    std::set<std::string> m_carried; ///< Addresses that are on their way to the carrier.
+    bool m_moves = false;            ///< What the source carries goes to the target.
+};
+
+} // namespace vornhost
+
+#endif

@@ -9,6 +9,7 @@
 #include "bondfiles.h"
 #include "bondmodes.h"
 
+#include "support/fileslock.h"
 #include "support/filestates.h"
 #include "support/interfacename.h"
 #include "support/livesettings.h"
@@ -122,43 +123,66 @@ public:
 
     int Run()
     {
-        if (!Prepare()) {
-            return m_result;
+        const Step step = ChangeFiles();
+        if (step == Step::kRefused) {
+            return -1;
         }
-        if (!m_record.Save()) {
-            return FailWithReason(m_plan, "cannot be remembered, so it is not taken apart");
+        const bool changed = step == Step::kDone && vornhost::StartNetworkOf(NamesOf(m_plan));
+        if (!changed && !m_record.name.empty()) {
+            TakeBack();
         }
-        LogWhatIsLost();
-        if (!MoveGateways() ||
-            !vornhost::WriteFileStates(OrderApart(m_plan), m_record.state.moved) ||
-            !vornhost::StartNetworkOf(NamesOf(m_plan))) {
-            return TakeBack();
-        }
-        return 0;
+        return changed ? 0 : -1;
     }
 
 private:
-    bool Prepare()
+    enum class Step { kRefused, kFailed, kDone };
+
+    Step ChangeFiles()
+    {
+        const vornhost::FilesLock lock;
+        if (!lock) {
+            (void)Fail(m_plan, "somebody else is editing configuration files");
+            return Step::kRefused;
+        }
+        const Step prepared = Prepare();
+        if (prepared != Step::kDone || m_record.name.empty()) {
+            return prepared;
+        }
+        if (!m_record.Save()) {
+            (void)FailWithReason(m_plan, "cannot be remembered, so it is not taken apart");
+            return Step::kRefused;
+        }
+        LogWhatIsLost();
+        return MoveGateways() && vornhost::WriteFileStates(OrderApart(m_plan), m_record.state.moved)
+                   ? Step::kDone
+                   : Step::kFailed;
+    }
+
+    /** Finds out what there is. No record is made where the files are as they are to be. */
+    Step Prepare()
     {
         const auto options = vornhost::BondOptions::ReadLive(m_plan.name);
         const auto slaves = vornhost::ReadLiveSlaves(m_plan.name);
         AddSlaves(slaves.value_or(std::vector<std::string>()));
         const auto before = vornhost::ReadFileStates(NamesOf(m_plan));
         if (!before || m_plan.slaves.empty()) {
-            m_result = Fail(m_plan, before ? "has no slaves" : "its files cannot be read");
-            return false;
+            (void)Fail(m_plan, before ? "has no slaves" : "its files cannot be read");
+            return Step::kRefused;
         }
         const auto memory = RememberedBond::Load(m_plan.name);
         const bool known = memory && memory->HasSlaves(m_plan.slaves);
         if (!slaves && !before->at(m_plan.name).text) {
-            m_result = known ? Finish() : Fail(m_plan, "there is none to be taken apart");
-            return false;
+            // Apart already, though the network program may not have come to know of that?
+            if (!known) {
+                (void)Fail(m_plan, "there is none to be taken apart");
+            }
+            return known ? Step::kDone : Step::kRefused;
         }
         if (known && vornhost::IsHalfTakenApart(memory->state, *before)) {
             m_record = *memory;
-            return true;
+            return Step::kDone;
         }
-        return Remember(*before, options);
+        return Remember(*before, options) ? Step::kDone : Step::kRefused;
     }
 
     /** The caller's list decides about the order, but none may be left a slave of nothing. */
@@ -170,9 +194,6 @@ private:
             }
         }
     }
-
-    /** It is apart already; the network program may not have come to know of that. */
-    int Finish() const { return vornhost::StartNetworkOf(NamesOf(m_plan)) ? 0 : -1; }
 
     bool Remember(const FileStates& before, const std::optional<vornhost::BondOptions>& live)
     {
@@ -191,7 +212,7 @@ private:
         m_record.state.moved = vornhost::TakenApart(m_plan, before);
         const auto gateways = vornhost::ReadGatewayStates(CarriersOf(m_plan));
         if (!gateways) {
-            m_result = FailWithReason(m_plan, "the gateway records cannot be read");
+            (void)FailWithReason(m_plan, "the gateway records cannot be read");
             return false;
         }
         m_record.state.gateways = *gateways;
@@ -223,7 +244,7 @@ private:
     }
 
     /** The host had better keep its bond than stay between the two. */
-    int TakeBack() const
+    void TakeBack() const
     {
         (void)Fail(m_plan, "cannot be taken apart; it stays");
         const bool whole = vornhost::WriteFileStates(NamesOf(m_plan), m_record.state.before) &&
@@ -232,12 +253,10 @@ private:
         if (whole) {
             (void)RememberedBond::Forget(m_plan.name);
         }
-        return -1;
     }
 
     BondPlan m_plan;
     RememberedBond m_record;
-    int m_result = -1;
 };
 
 bool SharesSlave(const RememberedBond& memory, const std::vector<std::string>& slaves)
@@ -286,44 +305,74 @@ GatewaysForBond(const BondPlan& plan, const std::optional<RememberedBond>& memor
     return bonds;
 }
 
-int BuildOrChange(BondPlan plan)
-{
-    const auto current = vornhost::ReadFileStates(NamesOf(plan));
-    if (!current) {
-        return Fail(plan, "its files cannot be read");
-    }
-    const bool stands = IsWhole(plan, *current) && vornhost::ReadLiveSlaves(plan.name);
-    auto memory = stands ? std::nullopt : RememberedBond::Load(plan.name);
-    if (memory && !SharesSlave(*memory, plan.slaves)) {
-        memory.reset(); // another bond of that name
-    }
-    const LiveNetwork network = LiveNetwork::Read();
-    const std::string& carrier = plan.slaves[0];
-    plan.live = vornhost::LiveAddressing(network, carrier);
+/** Builds one bond, or changes it. */
+class Building {
+public:
+    explicit Building(BondPlan plan) : m_plan(std::move(plan)) {}
 
-    const vornhost::BuiltBond built = vornhost::Built(plan, *current, memory);
-    if (!stands) {
-        const auto gateways = GatewaysForBond(plan, memory);
-        if (!gateways || !vornhost::WriteGatewayStates(*gateways)) {
-            return FailWithReason(plan, "its gateways cannot be moved");
+    int Run()
+    {
+        if (!ChangeFiles()) {
+            return -1;
+        }
+        if (!vornhost::StartNetworkOf(NamesOf(m_plan))) {
+            return Fail(m_plan, "the network program cannot build it");
+        }
+        const vornhost::FilesLock lock;
+        if (!lock || !vornhost::WriteFileStates(OrderApart(m_plan), m_built.final)) {
+            return -1;
+        }
+        return RememberedBond::Forget(m_plan.name) ? 0
+                                                   : FailWithReason(m_plan, "cannot be forgotten");
+    }
+
+private:
+    bool ChangeFiles()
+    {
+        const vornhost::FilesLock lock;
+        const auto current = vornhost::ReadFileStates(NamesOf(m_plan));
+        if (!lock || !current) {
+            (void)Fail(m_plan, lock ? "its files cannot be read"
+                                    : "somebody else is editing configuration files");
+            return false;
+        }
+        const bool stands = IsWhole(m_plan, *current) && vornhost::ReadLiveSlaves(m_plan.name);
+        if (!stands) {
+            Remember();
+        }
+        m_plan.live = vornhost::LiveAddressing(LiveNetwork::Read(), m_plan.slaves[0]);
+        m_built = vornhost::Built(m_plan, *current, m_memory);
+        return (stands || MoveGateways()) &&
+               vornhost::WriteFileStates(NamesOf(m_plan), m_built.build);
+    }
+
+    void Remember()
+    {
+        m_memory = RememberedBond::Load(m_plan.name);
+        if (m_memory && !SharesSlave(*m_memory, m_plan.slaves)) {
+            m_memory.reset(); // another bond of that name
+        }
+        const std::string mode = vornhost::ModeOf(m_plan, m_memory);
+        if (mode != m_plan.mode) {
+            ::syslog(LOG_NOTICE, "vornnetsdk: bond %s is %s again, for which the switch had %s",
+                     m_plan.name.c_str(), mode.c_str(), m_plan.mode.c_str());
         }
     }
-    const std::string mode = vornhost::ModeOf(plan, memory);
-    if (mode != plan.mode) {
-        ::syslog(LOG_NOTICE, "vornnetsdk: bond %s is %s again, for which the switch had %s",
-                 plan.name.c_str(), mode.c_str(), plan.mode.c_str());
+
+    bool MoveGateways() const
+    {
+        const auto gateways = GatewaysForBond(m_plan, m_memory);
+        if (gateways && vornhost::WriteGatewayStates(*gateways)) {
+            return true;
+        }
+        (void)FailWithReason(m_plan, "its gateways cannot be moved");
+        return false;
     }
-    if (!vornhost::WriteFileStates(NamesOf(plan), built.build)) {
-        return -1;
-    }
-    if (!vornhost::StartNetworkOf(NamesOf(plan))) {
-        return Fail(plan, "the network program cannot build it");
-    }
-    if (!vornhost::WriteFileStates(OrderApart(plan), built.final)) {
-        return -1;
-    }
-    return RememberedBond::Forget(plan.name) ? 0 : FailWithReason(plan, "cannot be forgotten");
-}
+
+    BondPlan m_plan;
+    std::optional<RememberedBond> m_memory;
+    vornhost::BuiltBond m_built;
+};
 
 int Set(const VORNLINKAGGROPT& opt)
 {
@@ -338,7 +387,7 @@ int Set(const VORNLINKAGGROPT& opt)
     if (plan.mode.empty()) {
         return Fail(plan, "its mode is none of the kernel's");
     }
-    return plan.slaves.empty() ? Fail(plan, "has no slaves") : BuildOrChange(std::move(plan));
+    return plan.slaves.empty() ? Fail(plan, "has no slaves") : Building(std::move(plan)).Run();
 }
 
 } // namespace

@@ -3,6 +3,7 @@
 #include "vlanfiles.h"
 #include "vlanrules.h"
 
+#include "support/fileslock.h"
 #include "support/filestates.h"
 #include "support/interfacename.h"
 #include "support/networkprogram.h"
@@ -74,7 +75,7 @@ public:
         if (vlan->mtu != parent->mtu) {
             m_plan.mtu = std::to_string(vlan->mtu);
         }
-        return Remember() ? Move() : -1;
+        return Move();
     }
 
 private:
@@ -143,24 +144,37 @@ private:
         return true;
     }
 
-    int Move() const
+    int Move()
     {
         const std::vector<std::string> names{m_plan.parent, m_plan.name};
-        if (MoveGateways() && WriteFileStates(names, m_record.state.moved) &&
-            StartNetworkOf(names)) {
+        {
+            const FilesLock lock;
+            if (!lock || !Remember()) {
+                return -1;
+            }
+            m_moved = MoveGateways() && WriteFileStates(names, m_record.state.moved);
+        }
+        if (m_moved && StartNetworkOf(names)) {
             return 0;
         }
         // The host had better keep its VLAN than stay between the two.
         (void)Fail(m_plan.name, "cannot be taken from its interface; it stays");
-        if (WriteFileStates({m_plan.name, m_plan.parent}, m_record.state.before) &&
-            WriteGatewayStates(m_record.state.gateways) && StartNetworkOf(names)) {
+        if (TakeBack() && StartNetworkOf(names)) {
             (void)RememberedVlan::Forget(m_plan.name);
         }
         return -1;
     }
 
+    bool TakeBack() const
+    {
+        const FilesLock lock;
+        return WriteFileStates({m_plan.name, m_plan.parent}, m_record.state.before) &&
+               WriteGatewayStates(m_record.state.gateways);
+    }
+
     VlanPlan m_plan;
     RememberedVlan m_record;
+    bool m_moved = false;
 };
 
 /** What is remembered of the VLAN that is wanted back; it may have got another number meanwhile. */
@@ -188,24 +202,19 @@ public:
         m_plan.name = sameName ? m_memory->name : parent + '.' + std::to_string(id);
     }
 
-    int Run() const
+    int Run()
     {
         if (!IsInterfaceName(m_plan.name)) {
             return Fail(m_plan.name, "the name is too long");
         }
-        const std::vector<std::string> names{m_plan.name, m_plan.parent};
-        const auto current = ReadFileStates(names);
-        if (!current) {
-            return Fail(m_plan.name, "the files cannot be read");
-        }
-        const BuiltVlan built = MovedToVlan(m_plan, *current, m_memory);
-        if (!MoveGateways() || !WriteFileStates(names, built.build)) {
-            return FailWithReason(m_plan.name, "cannot be written");
+        if (!ChangeFiles()) {
+            return -1;
         }
         if (!StartNetworkOf({m_plan.parent, m_plan.name})) {
             return Fail(m_plan.name, "the network program cannot make it");
         }
-        if (!WriteFileStates({m_plan.parent, m_plan.name}, built.final)) {
+        const FilesLock lock;
+        if (!lock || !WriteFileStates({m_plan.parent, m_plan.name}, m_built.final)) {
             return -1;
         }
         return !m_memory || RememberedVlan::Forget(m_memory->name)
@@ -214,6 +223,24 @@ public:
     }
 
 private:
+    bool ChangeFiles()
+    {
+        const std::vector<std::string> names{m_plan.name, m_plan.parent};
+        const FilesLock lock;
+        const auto current = ReadFileStates(names);
+        if (!lock || !current) {
+            (void)Fail(m_plan.name, lock ? "the files cannot be read"
+                                         : "somebody else is editing configuration files");
+            return false;
+        }
+        m_built = MovedToVlan(m_plan, *current, m_memory);
+        if (!MoveGateways() || !WriteFileStates(names, m_built.build)) {
+            (void)FailWithReason(m_plan.name, "cannot be written");
+            return false;
+        }
+        return true;
+    }
+
     bool MoveGateways() const
     {
         const auto parents = ReadGatewayStates({m_plan.parent});
@@ -236,6 +263,7 @@ private:
 
     VlanPlan m_plan;
     std::optional<RememberedVlan> m_memory;
+    BuiltVlan m_built;
 };
 
 } // namespace

@@ -20,6 +20,7 @@ struct Option {
     std::string_view named;   ///< Names of the values 0, 1...; or none.
     std::string_view modes;   ///< Where it counts; none: everywhere.
     bool twin = false;        ///< The switch has the like.
+    bool refused = false;     ///< The kernel refuses it where it does not count.
 };
 
 constexpr std::string_view kModeNames =
@@ -44,32 +45,32 @@ constexpr std::string_view kHashes = "layer2 layer3+4 layer2+3 encap2+3 encap3+4
 
 constexpr std::array kOptions{
     Option{"mode", "balance-rr", kModeNames, kAllModes, true},
-    Option{"ad_actor_sys_prio", "65535", kNumbers, kWithLacp, true},
-    Option{"ad_actor_system", "00:00:00:00:00:00", kNumbers, kWithLacp, true},
+    Option{"ad_actor_sys_prio", "65535", kNumbers, kWithLacp, true, true},
+    Option{"ad_actor_system", "00:00:00:00:00:00", kNumbers, kWithLacp, true, true},
     Option{"ad_select", "stable", kSelections, kWithLacp},
-    Option{"ad_user_port_key", "0", kNumbers, kWithLacp},
+    Option{"ad_user_port_key", "0", kNumbers, kWithLacp, false, true},
     Option{"all_slaves_active", "0", kNumbers, kAllModes},
     Option{"arp_all_targets", "any", kAnyAll, kWithArp},
-    Option{"arp_interval", "0", kNumbers, kWithArp},
+    Option{"arp_interval", "0", kNumbers, kWithArp, false, true},
     Option{"arp_ip_target", "", kNumbers, kWithArp},
     Option{"arp_missed_max", "2", kNumbers, kWithArp},
-    Option{"arp_validate", "none", kValidations, kWithArp},
+    Option{"arp_validate", "none", kValidations, kWithArp, false, true},
     Option{"downdelay", "0", kNumbers, kAllModes, true},
     Option{"fail_over_mac", "none", kMacPolicies, kAllModes},
-    Option{"lacp_active", "on", kNoYes, kWithLacp},
-    Option{"lacp_rate", "slow", kRates, kWithLacp, true},
+    Option{"lacp_active", "on", kNoYes, kWithLacp, false, true},
+    Option{"lacp_rate", "slow", kRates, kWithLacp, true, true},
     Option{"lp_interval", "1", kNumbers, kAllModes},
     Option{"miimon", "0", kNumbers, kAllModes, true},
     Option{"min_links", "0", kNumbers, kAllModes},
     Option{"ns_ip6_target", "", kNumbers, kWithArp},
     Option{"num_grat_arp", "1", kNumbers, kAllModes},
     Option{"num_unsol_na", "1", kNumbers, kAllModes},
-    Option{"packets_per_slave", "1", kNumbers, kRoundRobin},
+    Option{"packets_per_slave", "1", kNumbers, kRoundRobin, false, true},
     Option{"peer_notif_delay", "0", kNumbers, kAllModes},
-    Option{"primary", "", kNumbers, kWithPrimary, true},
+    Option{"primary", "", kNumbers, kWithPrimary, true, true},
     Option{"primary_reselect", "always", kReselections, kWithPrimary},
     Option{"resend_igmp", "1", kNumbers, kAllModes},
-    Option{"tlb_dynamic_lb", "1", kNumbers, kLearning},
+    Option{"tlb_dynamic_lb", "1", kNumbers, kLearning, false, true},
     Option{"updelay", "0", kNumbers, kAllModes, true},
     Option{"use_carrier", "1", kNumbers, kAllModes, true},
     Option{"xmit_hash_policy", "layer2", kHashes, kWithHash},
@@ -225,9 +226,12 @@ BondOptions BondOptions::WithMode(const std::string& mode) const
 BondOptions BondOptions::Chosen(const BondOptions& named) const
 {
     BondOptions chosen = *this;
+    const std::string mode = Get(kMode);
     std::erase_if(chosen.values, [&](const auto& entry) {
-        return entry.first != kMode && IsInitial(entry.first, entry.second) &&
-               !named.values.contains(entry.first);
+        const Option* const option = FindOption(entry.first);
+        const bool refused = option != nullptr && option->refused && !CountsIn(*option, mode);
+        return entry.first != kMode && !named.values.contains(entry.first) &&
+               (refused || IsInitial(entry.first, entry.second));
     });
     return chosen;
 }

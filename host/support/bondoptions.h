@@ -49,7 +49,10 @@ struct BondOptions {
      */
     BondOptions WithMode(const std::string& mode) const;
 
-    /** @return  those that are not what a new bond has anyway, and all that the other names. */
+    /**
+     * @return  those that are not what a new bond has anyway and that the kernel takes in their
+     *          mode, and all that the other names.
+     */
     BondOptions Chosen(const BondOptions& named) const;
 };
 

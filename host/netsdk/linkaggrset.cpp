@@ -25,7 +25,6 @@
 
 namespace {
 
-using vornhost::AddressFamily;
 using vornhost::BondPlan;
 using vornhost::FileStates;
 using vornhost::GatewayState;

@@ -25,8 +25,8 @@ struct Option {
 
 constexpr std::string_view kModeNames =
     "balance-rr active-backup balance-xor broadcast 802.3ad balance-tlb balance-alb";
-constexpr std::string_view kNumbers = "";
-constexpr std::string_view kAllModes = "";
+constexpr std::string_view kNumbers{};
+constexpr std::string_view kAllModes{};
 constexpr std::string_view kWithPrimary = "active-backup balance-tlb balance-alb";
 constexpr std::string_view kWithLacp = "802.3ad";
 constexpr std::string_view kWithHash = "balance-xor 802.3ad balance-tlb";
@@ -83,6 +83,21 @@ const Option* FindOption(std::string_view name)
     return found == kOptions.end() ? nullptr : found;
 }
 
+/** Both, with the separator between them where there are two. */
+std::string Joined(std::string list, const char* separator, const std::string& next)
+{
+    if (!list.empty()) {
+        list += separator;
+    }
+    return list.append(next);
+}
+
+std::string Assignment(std::string name, const std::string& value)
+{
+    name += '=';
+    return name.append(value);
+}
+
 std::vector<std::string> Words(std::string_view text)
 {
     std::istringstream stream{std::string(text)};
@@ -136,7 +151,7 @@ std::string LiveValue(const Option& option, const std::string& line)
     }
     std::string list;
     for (const std::string& word : words) {
-        list += (list.empty() ? "" : ",") + word;
+        list = Joined(list, ",", word);
     }
     return list;
 }
@@ -161,7 +176,7 @@ BondOptions BondOptions::Parse(std::string_view text)
         std::string value = word.substr(equals + 1);
         if (name == kArpTargets) {
             const std::string former = options.Get(name);
-            value = former + (former.empty() ? "" : ",") + WithoutSigns(value);
+            value = Joined(former, ",", WithoutSigns(value));
         }
         options.values[name] = NamedValue(name, value);
     }
@@ -190,10 +205,10 @@ std::string BondOptions::Get(const std::string& name) const
 std::string BondOptions::Text() const
 {
     // The mode comes first: it decides which others the kernel takes.
-    std::string text = values.contains(kMode) ? std::string(kMode) + '=' + Get(kMode) : "";
+    std::string text = values.contains(kMode) ? Assignment(kMode, Get(kMode)) : "";
     for (const auto& [name, value] : values) {
         if (name != kMode) {
-            text += (text.empty() ? "" : " ") + name + '=' + value;
+            text = Joined(text, " ", Assignment(name, value));
         }
     }
     return text;
@@ -285,7 +300,7 @@ std::vector<std::string> WithoutTwin(const BondOptions& options)
         const Option* const option = FindOption(name);
         const bool counts = option == nullptr || (!option->twin && CountsIn(*option, mode));
         if (counts && !IsInitial(name, value)) {
-            lost.push_back(name + '=' + value);
+            lost.push_back(Assignment(name, value));
         }
     }
     return lost;

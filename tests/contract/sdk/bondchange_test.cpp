@@ -237,6 +237,21 @@ TEST_F(BondChange, IsOnlyOfTheModeAndTheSlavesWhenTheBondStands)
     EXPECT_THAT(NetworkCalls(), ElementsAre("start bond0 eth0 eth1", "start bond0 eth0 eth1 eth2"));
 }
 
+TEST_F(BondChange, LeavesABondWithoutLinkMonitoringAsItWas)
+{
+    contract::EditFile("bond0", {{"BONDING_OPTS", "mode=balance-xor"}});
+    contract::ShowBond("bond0", {{"mode", "balance-xor 2"}, {"miimon", "0"}});
+    const Files host = ReadFiles();
+    ASSERT_EQ(Set(0), 0);
+    contract::HideBond("bond0");
+    contract::InstallNetworkProgram();
+
+    EXPECT_EQ(Set(3), 0);
+
+    EXPECT_EQ(contract::NetworkRuns(),
+              (std::vector<contract::NetworkRun>{{"start bond0 eth0 eth1", host}}));
+}
+
 TEST_F(BondChange, TakesInASlaveThatTheBondGotMeanwhile)
 {
     ASSERT_EQ(Set(0), 0);
@@ -259,6 +274,7 @@ TEST_F(BondChange, TakesApartTheSlavesThatTheCallerDoesNotKnowOfToo)
 
 TEST_F(BondChange, OfAnotherBondOfThatNameIsNotMixedUpWithWhatIsRemembered)
 {
+    contract::WriteFile(contract::IfcfgPath("bond0"), "# basement\n" + kHost.at("bond0"));
     ASSERT_EQ(Set(0), 0);
     contract::HideBond("bond0");
     contract::WriteFile(contract::IfcfgPath("eth2"), "DEVICE=eth2\nIPADDR=198.51.100.1/24\n");
@@ -267,6 +283,7 @@ TEST_F(BondChange, OfAnotherBondOfThatNameIsNotMixedUpWithWhatIsRemembered)
     EXPECT_EQ(Set(2, {"eth2", "eth3"}), 0);
 
     Files wanted = kApart;
+    wanted["eth0"] = "# basement\n" + kApart.at("eth0");
     wanted["bond0"] = "DEVICE=bond0\nIPADDR=198.51.100.1/24\n"
                       "BONDING_OPTS=\"mode=802.3ad miimon=100\"\n";
     wanted["eth2"] = "DEVICE=eth2\nMASTER=bond0\nSLAVE=yes\n";

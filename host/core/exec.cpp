@@ -1,3 +1,4 @@
+#include "core/arguments.h"
 #include "core/guard.h"
 #include "core/heldlocks.h"
 #include "core/program.h"
@@ -10,6 +11,7 @@
 
 namespace {
 
+using vornhost::CollectArguments;
 using vornhost::Guarded;
 using vornhost::ProgramRequest;
 using vornhost::RunnerReport;
@@ -27,15 +29,6 @@ int Run(std::vector<std::string> argv, bool wait = true)
     return report.startError == 0 && report.status == 0 ? 0 : -1;
 }
 
-std::vector<std::string> Collect(const char* path, va_list arguments)
-{
-    std::vector<std::string> argv = {path};
-    while (const char* argument = va_arg(arguments, const char*)) {
-        argv.emplace_back(argument);
-    }
-    return argv;
-}
-
 } // namespace
 
 int VLIBCExec(const char* path, ...)
@@ -45,7 +38,7 @@ int VLIBCExec(const char* path, ...)
     }
     va_list arguments;
     va_start(arguments, path);
-    const int result = Guarded(-1, [&] { return Run(Collect(path, arguments)); });
+    const int result = Guarded(-1, [&] { return Run(CollectArguments(path, arguments)); });
     va_end(arguments);
     return result;
 }
@@ -58,7 +51,7 @@ int VLIBCExecl(const char* path, int options, ...)
     }
     va_list arguments;
     va_start(arguments, options);
-    const int result = Guarded(-1, [&] { return Run(Collect(path, arguments)); });
+    const int result = Guarded(-1, [&] { return Run(CollectArguments(path, arguments)); });
     va_end(arguments);
     return result;
 }

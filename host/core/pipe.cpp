@@ -1,3 +1,4 @@
+#include "core/arguments.h"
 #include "core/guard.h"
 #include "core/heldlocks.h"
 #include "core/program.h"
@@ -112,7 +113,7 @@ FILE* OpenDirect(const std::vector<std::string>& argv)
 }
 
 /** The program's whole answer; its status in the report. */
-Descriptor Collect(const std::vector<std::string>& argv, RunnerReport& report)
+Descriptor ReadAnswer(const std::vector<std::string>& argv, RunnerReport& report)
 {
     Descriptor answer = AboveStandard(Descriptor(::memfd_create("answer", MFD_CLOEXEC)));
     report.startError = ENOMEM;
@@ -132,9 +133,9 @@ Descriptor Collect(const std::vector<std::string>& argv, RunnerReport& report)
 FILE* OpenCollected(const std::vector<std::string>& argv)
 {
     RunnerReport report;
-    Descriptor answer = Collect(argv, report);
+    Descriptor answer = ReadAnswer(argv, report);
     if (report.startError == 0 && report.status != 0 && report.timedOut == 0) {
-        answer = Collect(argv, report);
+        answer = ReadAnswer(argv, report);
     }
     if (report.startError != 0) {
         return nullptr;
@@ -152,10 +153,7 @@ FILE* VLIBCPopen(const char* path, const char* mode, ...)
     va_list arguments;
     va_start(arguments, mode);
     FILE* const stream = Guarded<FILE*>(nullptr, [&]() -> FILE* {
-        std::vector<std::string> argv = {path};
-        while (const char* argument = va_arg(arguments, const char*)) {
-            argv.emplace_back(argument);
-        }
+        const auto argv = vornhost::CollectArguments(path, arguments);
         const std::string_view how = mode;
         if (how == "rB" && ::faccessat(AT_FDCWD, path, X_OK, AT_EACCESS) == 0) {
             return OpenDirect(argv);

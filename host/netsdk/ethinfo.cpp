@@ -2,6 +2,7 @@
 #include "support/interfacefile.h"
 #include "support/netlink.h"
 #include "support/switchdatabase.h"
+#include "support/uplink.h"
 
 #include <algorithm>
 #include <cstdint>
@@ -60,9 +61,13 @@ std::optional<std::vector<std::string>> Uplinks(const std::vector<Link>& links,
 {
     const auto file = vornhost::LoadInterfaceFile(bridge);
     const bool fileOfBridge = file && file->Get("TYPE") == "OVS";
-    const std::string primary = fileOfBridge ? file->Get("PRIMARY").value_or("") : "";
-    if (Find(links, primary) != nullptr) {
-        return std::vector{primary};
+    auto named = fileOfBridge ? vornhost::ListedSlaves(bridge) : std::vector<std::string>();
+    if (fileOfBridge && named.empty()) {
+        named.push_back(file->Get("PRIMARY").value_or(""));
+    }
+    std::erase_if(named, [&](const std::string& name) { return Find(links, name) == nullptr; });
+    if (!named.empty()) {
+        return named;
     }
 
     const Link* const link = Find(links, bridge);
@@ -75,7 +80,7 @@ std::optional<std::vector<std::string>> Uplinks(const std::vector<Link>& links,
     }
     for (const vornhost::SwitchBridge& each : *bridges) {
         if (each.name == bridge) {
-            const vornhost::SwitchPort* const uplink = vornhost::FindUplink(each, primary);
+            const vornhost::SwitchPort* const uplink = vornhost::FindUplinkByFile(each);
             return uplink == nullptr ? std::vector<std::string>() : uplink->interfaces;
         }
     }

@@ -3,6 +3,7 @@
 #include "support/gatewaystore.h"
 #include "support/interfacefile.h"
 #include "support/netlink.h"
+#include "support/tagdevice.h"
 
 #include <algorithm>
 #include <arpa/inet.h>
@@ -78,7 +79,8 @@ bool FillGateway(const Link& link, const FamilyFields& fields, IpConfig& config)
     std::string gateway = LiveGateway(*routes, link, fields.family);
     if (gateway.empty()) {
         const auto store = vornhost::GatewayStore::Load();
-        const auto recorded = store ? store->Find(link.name, fields.storeFamily) : std::nullopt;
+        const auto recorded =
+            store ? store->Find(config.interface, fields.storeFamily) : std::nullopt;
         gateway = recorded ? recorded->address : "";
     }
     if (!gateway.empty() && Put(fields, gateway, fields.gateway)) {
@@ -90,6 +92,15 @@ bool FillGateway(const Link& link, const FamilyFields& fields, IpConfig& config)
 bool FillFamily(const Link& link, const FamilyFields& fields, IpConfig& config)
 {
     return FillAddress(link, fields, config) && FillGateway(link, fields, config);
+}
+
+// Where a tag puts an interface's addressing into a VLAN, a device of its own carries it.
+const Link& CarrierOf(const std::vector<Link>& links, const Link& link)
+{
+    const auto tag = std::find_if(links.begin(), links.end(), [&](const Link& each) {
+        return each.parent == link.index && vornhost::IsTagDevice(each);
+    });
+    return tag == links.end() ? link : *tag;
 }
 
 std::optional<IpConfig> ReadIpConfig(const std::string& name)
@@ -119,7 +130,8 @@ std::optional<IpConfig> ReadIpConfig(const std::string& name)
                             config.ipv6Gateway,
                             vornhost::kHasIPv6Address,
                             vornhost::kHasIPv6Gateway};
-    if (!FillFamily(*link, ipv4, config) || !FillFamily(*link, ipv6, config)) {
+    const Link& carrier = CarrierOf(links, *link);
+    if (!FillFamily(carrier, ipv4, config) || !FillFamily(carrier, ipv6, config)) {
         return std::nullopt;
     }
 

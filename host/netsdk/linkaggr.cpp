@@ -1,68 +1,118 @@
-/**
- * Bonds. This platform does not take them apart: a bond goes on to the switch as it is, as the port
- * of a bridge of its own, and comes back the same way. So none can be read to be rebuilt, and
- * making or changing one is refused. The names of the modes and the record itself are complete.
- */
+#include "bondmodes.h"
+
+#include "support/bondoptions.h"
+#include "support/interfacename.h"
+#include "support/switchdatabase.h"
+#include "support/uplink.h"
+
 #include <algorithm>
-#include <array>
 #include <cstring>
+#include <exception>
+#include <optional>
+#include <string>
 #include <syslog.h>
+#include <vector>
 #include <vornplatform/netsdk.h>
 
 namespace {
 
-struct ModeName {
-    VORN_LINK_AGGR_MODE mode;
-    const char* name;
+using vornhost::SwitchPort;
+
+struct Bond {
+    VORN_LINK_AGGR_MODE mode = VORN_LINK_AGGR_NONE;
+    std::vector<std::string> slaves;
 };
 
-// The kernel's own names, and the switch's under a prefix: two of them are called the same.
-constexpr std::array kModes{
-    ModeName{VORN_LINK_AGGR_BALANCE_RR, "balance-rr"},
-    ModeName{VORN_LINK_AGGR_8023AD, "802.3ad"},
-    ModeName{VORN_LINK_AGGR_BALANCE_XOR, "balance-xor"},
-    ModeName{VORN_LINK_AGGR_ACTIVE_BACKUP, "active-backup"},
-    ModeName{VORN_LINK_AGGR_BALANCE_ALB, "balance-alb"},
-    ModeName{VORN_LINK_AGGR_OVS_ACTIVE_BACKUP, "ovs-active-backup"},
-    ModeName{VORN_LINK_AGGR_OVS_BALANCE_SLB, "ovs-balance-slb"},
-    ModeName{VORN_LINK_AGGR_OVS_BALANCE_TCP, "ovs-balance-tcp"},
-};
+std::optional<Bond> KernelBond(const std::string& name)
+{
+    const auto options = vornhost::BondOptions::ReadLive(name);
+    const auto slaves = vornhost::ReadLiveSlaves(name);
+    if (!options || !slaves) {
+        return std::nullopt;
+    }
+    const std::string mode = options->Get("mode");
+    const Bond bond{vornhost::KernelModeNumber(mode), *slaves};
+    if (bond.mode == VORN_LINK_AGGR_NONE) {
+        ::syslog(LOG_WARNING,
+                 "vornnetsdk: bond %s is not taken apart: there is nothing like %s on the switch",
+                 name.c_str(), mode.c_str());
+        return std::nullopt;
+    }
+    return bond;
+}
+
+VORN_LINK_AGGR_MODE SwitchMode(const SwitchPort& port)
+{
+    const auto column = port.columns.find("bond_mode");
+    // Without a mode the switch takes the one that no partner can do harm to.
+    const std::string mode = column == port.columns.end() ? "active-backup" : column->second;
+    return VORNNetLinkAggrStringToMode(("ovs-" + mode).c_str());
+}
+
+/** The members as the file lists them; as the switch does when the file says something else. */
+std::vector<std::string> SwitchSlaves(const std::string& bridge, const SwitchPort& port)
+{
+    const std::vector<std::string> listed = vornhost::ListedSlaves(bridge);
+    std::vector<std::string> sorted = listed;
+    std::sort(sorted.begin(), sorted.end());
+    return sorted == port.interfaces ? listed : port.interfaces;
+}
+
+std::optional<Bond> SwitchBond(const std::string& name)
+{
+    const auto bridges = vornhost::ReadSwitch();
+    if (!bridges) {
+        return std::nullopt;
+    }
+    const auto bridge =
+        std::find_if(bridges->begin(), bridges->end(),
+                     [&](const vornhost::SwitchBridge& each) { return each.name == name; });
+    const SwitchPort* const port =
+        bridge == bridges->end() ? nullptr : vornhost::FindUplinkByFile(*bridge);
+    if (port == nullptr || !port->bond) {
+        return std::nullopt;
+    }
+    return Bond{SwitchMode(*port), SwitchSlaves(name, *port)};
+}
+
+int Get(const std::string& name, VORNLINKAGGROPT& opt)
+{
+    if (!vornhost::IsInterfaceName(name)) {
+        return -1;
+    }
+    const bool ofKernel = vornhost::ReadLiveSlaves(name).has_value();
+    const auto bond = ofKernel ? KernelBond(name) : SwitchBond(name);
+    if (!bond) {
+        ::syslog(LOG_INFO, "vornnetsdk: there is no bond %s to be read", name.c_str());
+        return -1;
+    }
+    VORNLINKAGGROPT filled{};
+    name.copy(filled.szMaster, VORN_NAME_SIZE - 1);
+    filled.mode = bond->mode;
+    for (const std::string& slave : bond->slaves) {
+        if (VORNNetLinkAggrOptSlsaveAdd(&filled, slave.c_str()) < 0) {
+            ::syslog(LOG_ERR, "vornnetsdk: bond %s has more slaves than a record holds",
+                     name.c_str());
+            return -1;
+        }
+    }
+    opt = filled;
+    return 0;
+}
 
 } // namespace
 
 int VORNNetLinkAggrGet(const char* name, VORNLINKAGGROPT* opt)
 {
-    if (name != nullptr && opt != nullptr) {
-        ::syslog(LOG_INFO, "vornnetsdk: bond %s goes on to the switch as it is", name);
+    if (name == nullptr || opt == nullptr) {
+        return -1;
     }
-    return -1;
-}
-
-int VORNNetLinkAggrSet(const VORNLINKAGGROPT* opt)
-{
-    constexpr int kLength = VORN_NAME_SIZE;
-    ::syslog(LOG_ERR,
-             "vornnetsdk: bond %.*s is not changed: this platform carries bonds as they are",
-             kLength, opt == nullptr ? "of no name" : opt->szMaster);
-    return -1;
-}
-
-VORN_LINK_AGGR_MODE VORNNetLinkAggrStringToMode(const char* text)
-{
-    if (text == nullptr) {
-        return VORN_LINK_AGGR_NONE;
+    try {
+        return Get(name, *opt);
+    } catch (const std::exception& error) {
+        ::syslog(LOG_ERR, "vornnetsdk: cannot read bond %s: %s", name, error.what());
+        return -1;
     }
-    const auto* const found = std::find_if(kModes.begin(), kModes.end(), [&](const ModeName& each) {
-        return std::strcmp(each.name, text) == 0;
-    });
-    return found == kModes.end() ? VORN_LINK_AGGR_NONE : found->mode;
-}
-
-const char* VORNNetLinkAggrModeToString(VORN_LINK_AGGR_MODE mode)
-{
-    const auto* const found = std::find_if(kModes.begin(), kModes.end(),
-                                           [&](const ModeName& each) { return each.mode == mode; });
-    return found == kModes.end() ? "unknown" : found->name;
 }
 
 int VORNNetLinkAggrOptSlsaveAdd(VORNLINKAGGROPT* opt, const char* slave)
@@ -81,10 +131,4 @@ int VORNNetLinkAggrOptSlsaveAdd(VORNLINKAGGROPT* opt, const char* slave)
     std::copy_n(slave, length, slot);
     ++opt->nSlave;
     return 0;
-}
-
-int VORNNetBondIPConflict(const char* /*bond*/, char* /*conflict*/, int /*size*/,
-                          unsigned int* /*out*/)
-{
-    return 0; // a bond that is never taken apart hands its address to nobody
 }

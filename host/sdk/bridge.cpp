@@ -1,6 +1,6 @@
-#include "support/interfacefile.h"
 #include "support/netlink.h"
 #include "support/switchdatabase.h"
+#include "support/uplink.h"
 
 #include <algorithm>
 #include <exception>
@@ -26,12 +26,6 @@ int BridgeIfIsMaster(const std::string& name)
     });
 }
 
-std::string PrimaryOf(const std::string& bridge)
-{
-    const auto file = vornhost::LoadInterfaceFile(bridge);
-    return file ? file->Get("PRIMARY").value_or("") : "";
-}
-
 int SwitchIfIsMaster(const std::string& name)
 {
     const auto bridges = vornhost::ReadSwitch();
@@ -46,7 +40,7 @@ int SwitchIfIsMaster(const std::string& name)
     if (bridge == bridges->end()) {
         return kNotOfTheSwitch;
     }
-    const vornhost::SwitchPort* const uplink = vornhost::FindUplink(*bridge, PrimaryOf(name));
+    const vornhost::SwitchPort* const uplink = vornhost::FindUplinkByFile(*bridge);
     if (uplink == nullptr) {
         return kNeither;
     }

@@ -1,7 +1,8 @@
 #include "selection.h"
+#include "vlanrules.h"
 
 #include "support/interfacefile.h"
-#include "support/netlink.h"
+#include "support/livesettings.h"
 
 #include <algorithm>
 #include <cstring>
@@ -26,11 +27,13 @@ bool HasEntry(const std::string& interface, const char* entry)
 std::vector<Candidate> ReadCandidates()
 {
     std::vector<Candidate> candidates;
-    for (const vornhost::Link& link : vornhost::ReadLinks()) {
+    const auto network = vornhost::LiveNetwork::Read();
+    for (const vornhost::Link& link : network.links) {
         Candidate candidate{link};
         candidate.hardware = HasEntry(link.name, "device");
         candidate.wireless = HasEntry(link.name, "wireless") || HasEntry(link.name, "phy80211");
         candidate.ownFile = vornhost::LoadInterfaceFile(link.name).has_value();
+        candidate.tag = link.kind == "vlan" && vornhost::ObstacleToTag(network, link).empty();
         candidates.push_back(candidate);
     }
     return candidates;

@@ -1,6 +1,7 @@
 #include "selection.h"
 
 #include "support/interfacename.h"
+#include "support/tagdevice.h"
 
 #include <algorithm>
 #include <map>
@@ -41,15 +42,16 @@ public:
     void Sort(const Candidate& candidate, Selection& selection) const
     {
         const Link& link = candidate.link;
-        if (link.loopback || link.name == kSwitchDevice || IsPortOfAnother(link) ||
-            !IsWorthListing(candidate)) {
+        if (link.loopback || link.name == kSwitchDevice || IsTagDevice(link) ||
+            IsPortOfAnother(link) || !IsWorthListing(candidate)) {
             return;
         }
         if (IsPassedOver(link)) {
             selection.passedOver.push_back(link.name);
         } else if (link.type != ARPHRD_ETHER || candidate.wireless) {
             selection.notEthernet.push_back(link.name);
-        } else if (kBridgePrefix.size() + link.name.size() > kLongestInterfaceName) {
+        } else if (!candidate.tag &&
+                   kBridgePrefix.size() + link.name.size() > kLongestInterfaceName) {
             selection.tooLong.push_back(link.name);
         } else {
             selection.convertible.push_back(link.name);

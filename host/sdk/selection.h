@@ -17,6 +17,7 @@ struct Candidate {
     bool hardware = false; /**< a device stands behind it */
     bool wireless = false;
     bool ownFile = false; /**< it has a configuration file of its own */
+    bool tag = false;     /**< a VLAN that becomes the tag of its parent's port */
 };
 
 /** The interfaces worth listing, each group in the order in which the kernel got to know them. */
@@ -32,7 +33,8 @@ struct Selection {
 /**
  * Sorts the interfaces. Convertible are Ethernet devices that hardware stands behind, bonds, VLANs
  * on these, and whatever else has a configuration file; not the ports of a Linux bridge or bond
- * (their master counts), nor wireless devices, which carry no other addresses than their own.
+ * (their master counts), nor wireless devices, which carry no other addresses than their own, nor
+ * what the network program made for a tag.
  */
 Selection SelectInterfaces(std::vector<Candidate> candidates);
 

@@ -20,12 +20,13 @@ struct Option {
     std::string_view named;   ///< Names of the values 0, 1...; or none.
     std::string_view modes;   ///< Where it counts; none: everywhere.
     bool twin = false;        ///< The switch has the like.
+    bool refused = false;     ///< The kernel refuses it where it does not count.
 };
 
 constexpr std::string_view kModeNames =
     "balance-rr active-backup balance-xor broadcast 802.3ad balance-tlb balance-alb";
-constexpr std::string_view kNumbers = "";
-constexpr std::string_view kAllModes = "";
+constexpr std::string_view kNumbers{};
+constexpr std::string_view kAllModes{};
 constexpr std::string_view kWithPrimary = "active-backup balance-tlb balance-alb";
 constexpr std::string_view kWithLacp = "802.3ad";
 constexpr std::string_view kWithHash = "balance-xor 802.3ad balance-tlb";
@@ -44,32 +45,32 @@ constexpr std::string_view kHashes = "layer2 layer3+4 layer2+3 encap2+3 encap3+4
 
 constexpr std::array kOptions{
     Option{"mode", "balance-rr", kModeNames, kAllModes, true},
-    Option{"ad_actor_sys_prio", "65535", kNumbers, kWithLacp, true},
-    Option{"ad_actor_system", "00:00:00:00:00:00", kNumbers, kWithLacp, true},
+    Option{"ad_actor_sys_prio", "65535", kNumbers, kWithLacp, true, true},
+    Option{"ad_actor_system", "00:00:00:00:00:00", kNumbers, kWithLacp, true, true},
     Option{"ad_select", "stable", kSelections, kWithLacp},
-    Option{"ad_user_port_key", "0", kNumbers, kWithLacp},
+    Option{"ad_user_port_key", "0", kNumbers, kWithLacp, false, true},
     Option{"all_slaves_active", "0", kNumbers, kAllModes},
     Option{"arp_all_targets", "any", kAnyAll, kWithArp},
-    Option{"arp_interval", "0", kNumbers, kWithArp},
+    Option{"arp_interval", "0", kNumbers, kWithArp, false, true},
     Option{"arp_ip_target", "", kNumbers, kWithArp},
     Option{"arp_missed_max", "2", kNumbers, kWithArp},
-    Option{"arp_validate", "none", kValidations, kWithArp},
+    Option{"arp_validate", "none", kValidations, kWithArp, false, true},
     Option{"downdelay", "0", kNumbers, kAllModes, true},
     Option{"fail_over_mac", "none", kMacPolicies, kAllModes},
-    Option{"lacp_active", "on", kNoYes, kWithLacp},
-    Option{"lacp_rate", "slow", kRates, kWithLacp, true},
+    Option{"lacp_active", "on", kNoYes, kWithLacp, false, true},
+    Option{"lacp_rate", "slow", kRates, kWithLacp, true, true},
     Option{"lp_interval", "1", kNumbers, kAllModes},
     Option{"miimon", "0", kNumbers, kAllModes, true},
     Option{"min_links", "0", kNumbers, kAllModes},
     Option{"ns_ip6_target", "", kNumbers, kWithArp},
     Option{"num_grat_arp", "1", kNumbers, kAllModes},
     Option{"num_unsol_na", "1", kNumbers, kAllModes},
-    Option{"packets_per_slave", "1", kNumbers, kRoundRobin},
+    Option{"packets_per_slave", "1", kNumbers, kRoundRobin, false, true},
     Option{"peer_notif_delay", "0", kNumbers, kAllModes},
-    Option{"primary", "", kNumbers, kWithPrimary, true},
+    Option{"primary", "", kNumbers, kWithPrimary, true, true},
     Option{"primary_reselect", "always", kReselections, kWithPrimary},
     Option{"resend_igmp", "1", kNumbers, kAllModes},
-    Option{"tlb_dynamic_lb", "1", kNumbers, kLearning},
+    Option{"tlb_dynamic_lb", "1", kNumbers, kLearning, false, true},
     Option{"updelay", "0", kNumbers, kAllModes, true},
     Option{"use_carrier", "1", kNumbers, kAllModes, true},
     Option{"xmit_hash_policy", "layer2", kHashes, kWithHash},
@@ -80,6 +81,21 @@ const Option* FindOption(std::string_view name)
     const auto* const found = std::find_if(kOptions.begin(), kOptions.end(),
                                            [&](const Option& each) { return each.name == name; });
     return found == kOptions.end() ? nullptr : found;
+}
+
+/** Both, with the separator between them where there are two. */
+std::string Joined(std::string list, const char* separator, const std::string& next)
+{
+    if (!list.empty()) {
+        list += separator;
+    }
+    return list.append(next);
+}
+
+std::string Assignment(std::string name, const std::string& value)
+{
+    name += '=';
+    return name.append(value);
 }
 
 std::vector<std::string> Words(std::string_view text)
@@ -135,7 +151,7 @@ std::string LiveValue(const Option& option, const std::string& line)
     }
     std::string list;
     for (const std::string& word : words) {
-        list += (list.empty() ? "" : ",") + word;
+        list = Joined(list, ",", word);
     }
     return list;
 }
@@ -160,7 +176,7 @@ BondOptions BondOptions::Parse(std::string_view text)
         std::string value = word.substr(equals + 1);
         if (name == kArpTargets) {
             const std::string former = options.Get(name);
-            value = former + (former.empty() ? "" : ",") + WithoutSigns(value);
+            value = Joined(former, ",", WithoutSigns(value));
         }
         options.values[name] = NamedValue(name, value);
     }
@@ -189,10 +205,10 @@ std::string BondOptions::Get(const std::string& name) const
 std::string BondOptions::Text() const
 {
     // The mode comes first: it decides which others the kernel takes.
-    std::string text = values.contains(kMode) ? std::string(kMode) + '=' + Get(kMode) : "";
+    std::string text = values.contains(kMode) ? Assignment(kMode, Get(kMode)) : "";
     for (const auto& [name, value] : values) {
         if (name != kMode) {
-            text += (text.empty() ? "" : " ") + name + '=' + value;
+            text = Joined(text, " ", Assignment(name, value));
         }
     }
     return text;
@@ -220,6 +236,19 @@ BondOptions BondOptions::WithMode(const std::string& mode) const
         changed.values["miimon"] = "100";
     }
     return changed;
+}
+
+BondOptions BondOptions::Chosen(const BondOptions& named) const
+{
+    BondOptions chosen = *this;
+    const std::string mode = Get(kMode);
+    std::erase_if(chosen.values, [&](const auto& entry) {
+        const Option* const option = FindOption(entry.first);
+        const bool refused = option != nullptr && option->refused && !CountsIn(*option, mode);
+        return entry.first != kMode && !named.values.contains(entry.first) &&
+               (refused || IsInitial(entry.first, entry.second));
+    });
+    return chosen;
 }
 
 std::optional<std::vector<std::string>> ReadLiveSlaves(const std::string& bond)
@@ -271,7 +300,7 @@ std::vector<std::string> WithoutTwin(const BondOptions& options)
         const Option* const option = FindOption(name);
         const bool counts = option == nullptr || (!option->twin && CountsIn(*option, mode));
         if (counts && !IsInitial(name, value)) {
-            lost.push_back(name + '=' + value);
+            lost.push_back(Assignment(name, value));
         }
     }
     return lost;

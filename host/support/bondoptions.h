@@ -48,6 +48,12 @@ struct BondOptions {
      *          ignores there, and with link monitoring if none is left.
      */
     BondOptions WithMode(const std::string& mode) const;
+
+    /**
+     * @return  those that are not what a new bond has anyway and that the kernel takes in their
+     *          mode, and all that the other names.
+     */
+    BondOptions Chosen(const BondOptions& named) const;
 };
 
 /**

@@ -56,8 +56,8 @@ struct InterfaceFile {
     std::optional<unsigned> mtu;
     std::optional<unsigned> metric;
     std::optional<unsigned> vlanId; ///< The tag of the switch's port that carries the addresses.
-    std::optional<bool> autoconf; ///< Whether IPv6 addresses are taken from routers.
-    std::string requiredMac;      ///< The interface must have this link address.
+    std::optional<bool> autoconf;   ///< Whether IPv6 addresses are taken from routers.
+    std::string requiredMac;        ///< The interface must have this link address.
     std::vector<WantedAddress> addresses;
     std::string gateway;
     std::string gateway6;

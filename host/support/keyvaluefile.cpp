@@ -103,14 +103,30 @@ bool KeyValueFile::IsValue(std::string_view value)
 
 std::optional<std::string> KeyValueFile::Get(std::string_view key) const
 {
+    const auto written = GetWritten(key);
+    return written ? std::optional<std::string>(WithoutQuotes(*written)) : std::nullopt;
+}
+
+std::optional<std::string> KeyValueFile::GetWritten(std::string_view key) const
+{
     const std::vector<Line> lines = LinesOf(key);
     if (lines.empty()) {
         return std::nullopt;
     }
-    const Line& last = lines.back();
-    const std::string_view line =
-        Content(std::string_view(m_text).substr(last.begin, last.end - last.begin));
-    return std::string(WithoutQuotes(line.substr(line.find('=') + 1)));
+    const std::string_view line = Content(TextOf(lines.back()));
+    return std::string(line.substr(line.find('=') + 1));
+}
+
+std::vector<std::string> KeyValueFile::Keys() const
+{
+    std::vector<std::string> keys;
+    for (const Line& line : Lines()) {
+        const std::string_view key = KeyOf(TextOf(line));
+        if (!key.empty() && std::find(keys.begin(), keys.end(), key) == keys.end()) {
+            keys.emplace_back(key);
+        }
+    }
+    return keys;
 }
 
 bool KeyValueFile::Set(std::string_view key, std::string_view value)
@@ -146,19 +162,29 @@ bool KeyValueFile::Remove(std::string_view key)
     return !lines.empty();
 }
 
-std::vector<KeyValueFile::Line> KeyValueFile::LinesOf(std::string_view key) const
+std::vector<KeyValueFile::Line> KeyValueFile::Lines() const
 {
     std::vector<Line> lines;
-    const std::string_view text = m_text;
-    for (size_t begin = 0; begin < text.size() && !key.empty();) {
-        const size_t feed = text.find('\n', begin);
-        const size_t end = feed == std::string_view::npos ? text.size() : feed + 1;
-        if (KeyOf(text.substr(begin, end - begin)) == key) {
-            lines.push_back({begin, end});
-        }
+    for (size_t begin = 0; begin < m_text.size();) {
+        const size_t feed = m_text.find('\n', begin);
+        const size_t end = feed == std::string::npos ? m_text.size() : feed + 1;
+        lines.push_back({begin, end});
         begin = end;
     }
     return lines;
+}
+
+std::vector<KeyValueFile::Line> KeyValueFile::LinesOf(std::string_view key) const
+{
+    std::vector<Line> lines = Lines();
+    std::erase_if(lines,
+                  [&](const Line& line) { return key.empty() || KeyOf(TextOf(line)) != key; });
+    return lines;
+}
+
+std::string_view KeyValueFile::TextOf(const Line& line) const
+{
+    return std::string_view(m_text).substr(line.begin, line.end - line.begin);
 }
 
 void KeyValueFile::Erase(const Line& line)

@@ -27,6 +27,12 @@ public:
     /** @return the key's value, nothing when no line has the key. */
     std::optional<std::string> Get(std::string_view key) const;
 
+    /** @return the key's value as it is written, with its quotes; nothing when there is none. */
+    std::optional<std::string> GetWritten(std::string_view key) const;
+
+    /** @return every key once, in the file's order. */
+    std::vector<std::string> Keys() const;
+
     /**
      * Makes a key present exactly once: its first line is replaced, where the administrator put it
      * and its comment; further ones go. A new key is appended.
@@ -53,7 +59,9 @@ private:
         size_t end;
     };
 
+    std::vector<Line> Lines() const;
     std::vector<Line> LinesOf(std::string_view key) const;
+    std::string_view TextOf(const Line& line) const;
     void Erase(const Line& line);
     void Append(const std::string& line);
     size_t LastLine() const;

@@ -324,6 +324,7 @@ Link ReadLink(rtnl_link* object)
     link.parent = rtnl_link_get_link(object);
     if (rtnl_link_is_vlan(object) != 0) {
         link.vlanId = rtnl_link_vlan_get_id(object);
+        link.vlanProtocol = ntohs(static_cast<std::uint16_t>(rtnl_link_vlan_get_protocol(object)));
     }
     return link;
 }

@@ -84,7 +84,8 @@ TEST(Exec, FailsWithoutAProgramOrAVector)
     const std::array<const char*, 1> empty = {nullptr};
     EXPECT_LT(VLIBCExec(nullptr, nullptr), 0);
     EXPECT_NE(VLIBCExecl(nullptr, kOptions, nullptr), 0);
-    EXPECT_NE(VLIBCExecv(nullptr, empty.data(), 1), 0);
+    EXPECT_EQ(VLIBCExecv(nullptr, empty.data(), 1), -1);
+    EXPECT_EQ(VLIBCExecv(nullptr, nullptr, 1), -1);
     EXPECT_NE(VLIBCExecv("/bin/true", nullptr, 1), 0);
     EXPECT_LT(VLIBCExec("", nullptr), 0);
 }

@@ -97,6 +97,28 @@ TEST(BondOptionsWithMode, PutsMonitoringInThePlaceOfOneThatTheModeRefuses)
               Options({{"mode", "balance-xor"}, {"arp_interval", "1000"}}));
 }
 
+TEST(BondOptionsChosen, AreWhatANewBondDoesNotHaveAndWhatTheOtherNames)
+{
+    const BondOptions live = BondOptions::Parse("mode=balance-rr miimon=50 updelay=0 downdelay=200 "
+                                                "min_links=0 new_option=1");
+
+    EXPECT_EQ(live.Chosen(BondOptions::Parse("updelay=100")).Text(),
+              "mode=balance-rr downdelay=200 miimon=50 new_option=1 updelay=0");
+}
+
+TEST(BondOptionsChosen, AreNotThoseThatTheKernelRefusesInTheirMode)
+{
+    const BondOptions live = BondOptions::Parse(
+        "mode=active-backup lacp_rate=fast tlb_dynamic_lb=0 xmit_hash_policy=layer3+4 primary=eth0 "
+        "arp_interval=1000");
+    EXPECT_EQ(live.Chosen({}).Text(), "mode=active-backup arp_interval=1000 primary=eth0 "
+                                      "xmit_hash_policy=layer3+4");
+
+    const BondOptions other = BondOptions::Parse(
+        "mode=802.3ad lacp_rate=fast packets_per_slave=2 primary=eth0 arp_interval=1000");
+    EXPECT_EQ(other.Chosen({}).Text(), "mode=802.3ad lacp_rate=fast");
+}
+
 /** The kernel's folder of interfaces, with a bond such as this kernel may not be able to make. */
 class LiveBond : public testing::Test {
 protected:

@@ -3,7 +3,6 @@
 #include <gtest/gtest.h>
 #include <set>
 #include <vornplatform/netsdk.h>
-#include <vornplatform/sdk.h>
 
 namespace {
 
@@ -96,27 +95,6 @@ TEST(LinkAggrOptSlsaveAdd, RefusesARecordWithAnImpossibleCount)
     EXPECT_LT(VORNNetLinkAggrOptSlsaveAdd(&opt, "eth0"), 0);
     EXPECT_LT(VORNNetLinkAggrOptSlsaveAdd(nullptr, "eth0"), 0);
     EXPECT_LT(VORNNetLinkAggrOptSlsaveAdd(&opt, nullptr), 0);
-}
-
-TEST(BondsAndVlans, AreCarriedAsTheyAre)
-{
-    _tag_VLIB_VLAN vlan{};
-    EXPECT_EQ(VLIBNetVlanGet("lo", &vlan), 0);
-    EXPECT_EQ(VLIBNetVlanGet(nullptr, &vlan), -1);
-    EXPECT_EQ(VLIBNetVlanGet("lo", nullptr), -1);
-    const VORNNETIPCONFIG config{};
-    EXPECT_LT(VLIBNetVlanCreate("lo", 10, &config), 0);
-    EXPECT_LT(VLIBNetVlanCreate(nullptr, 10, nullptr), 0);
-    EXPECT_LT(VLIBNetVlanRemove("lo.10"), 0);
-    EXPECT_LT(VLIBNetVlanRemove(nullptr), 0);
-
-    VORNLINKAGGROPT opt{};
-    EXPECT_LT(VORNNetLinkAggrGet("bond0", &opt), 0);
-    EXPECT_LT(VORNNetLinkAggrGet(nullptr, nullptr), 0);
-    EXPECT_LT(VORNNetLinkAggrSet(&opt), 0);
-    EXPECT_LT(VORNNetLinkAggrSet(nullptr), 0);
-    char name[32] = {};
-    EXPECT_NE(VORNNetBondIPConflict("bond0", name, sizeof(name), nullptr), 1);
 }
 
 } // namespace

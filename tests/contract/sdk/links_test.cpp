@@ -85,6 +85,20 @@ TEST_F(Links, OfABridgeAreItsPorts)
     EXPECT_EQ(Speed("ovs_port0"), -1);
 }
 
+TEST_F(Links, OfABondsBridgeAreUpWhileOneOfItsMembersIs)
+{
+    MakeBridge();
+    Plug();
+    Ip("link set ovs_port0 up");
+    WriteFile(contract::IfcfgPath("ovs_port0"), "DEVICE=ovs_port0\nTYPE=OVS\nPRIMARY=absent0\n"
+                                                "SLAVE_LIST=\"absent0 port0 \"\n");
+
+    EXPECT_EQ(Speed("ovs_port0"), 10000);
+
+    Ip("link set wire0 down");
+    EXPECT_EQ(Speed("ovs_port0"), -1);
+}
+
 TEST_F(Links, OfABridgeWhosePortIsGoneAreNotUp)
 {
     MakeBridge();

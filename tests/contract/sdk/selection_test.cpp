@@ -163,6 +163,26 @@ TEST(SelectInterfaces, NamesWhatHasNoRoomForTheBridgesPrefix)
               (Selection{{"enp0s31f6n1"}, {"ovs_enp0s31f6n1"}, {"enp0s31f6np1"}, {}}));
 }
 
+TEST(SelectInterfaces, NeverTakesWhatWasMadeForATag)
+{
+    Candidate tag = WithFile(Vlan(3, "tag2.10", 2));
+    tag.link.vlanId = 10;
+
+    EXPECT_EQ(SelectInterfaces({Card(2, "eth0"), tag}), Convertible({"eth0"}));
+}
+
+TEST(SelectInterfaces, TakesAVlanOfAnyNameThatBecomesItsParentsTag)
+{
+    Candidate vlan = Vlan(3, "enp0s31f6.1000", 2);
+    vlan.tag = true;
+    EXPECT_EQ(SelectInterfaces({Card(2, "enp0s31f6"), vlan}),
+              Convertible({"enp0s31f6", "enp0s31f6.1000"}));
+
+    vlan.tag = false;
+    EXPECT_EQ(SelectInterfaces({Card(2, "enp0s31f6"), vlan}),
+              (Selection{{"enp0s31f6"}, {}, {"enp0s31f6.1000"}, {}}));
+}
+
 TEST(SelectInterfaces, KeepsTheKernelsOrderWhateverTheOrderOfTheList)
 {
     std::vector<Candidate> cards;

@@ -78,6 +78,81 @@ TEST_F(SwitchBridges, AreTheSameWithPortsOfClients)
     EXPECT_EQ(VLIBNetOVSIfIsMaster("ovs_eth0"), 0);
 }
 
+// The bridge of a bond as the network program and the library leave it.
+void WriteBondFile(const std::string& slaves)
+{
+    WriteFile(contract::IfcfgPath("ovs_bond0"),
+              "DEVICE=ovs_bond0\nTYPE=OVS\nPRIMARY=eth1\nSLAVE_LIST=\"" + slaves + " \"\n");
+}
+
+TEST_F(SwitchBridges, CarryTheBondWhoseMembersTheirFileLists)
+{
+    Vsctl({"add-br", "ovs_bond0", "--", "add-bond", "ovs_bond0", "uplink", "eth0", "eth1", "--",
+           "add-bond", "ovs_bond0", "clients", "tap0", "tap1"});
+    EXPECT_EQ(VLIBNetOVSIfIsMaster("ovs_bond0"), 0) << "without a file both may be clients'";
+
+    WriteBondFile("eth1 eth0");
+    EXPECT_EQ(VLIBNetOVSIfIsMaster("ovs_bond0"), 2);
+
+    Vsctl({"del-port", "uplink"});
+    EXPECT_EQ(VLIBNetOVSIfIsMaster("ovs_bond0"), 0);
+}
+
+TEST_F(SwitchBridges, CarryTheBondThatTheNetworkProgramMarkedBesideAClientsBond)
+{
+    Vsctl({"add-br", "ovs_bond0", "--", "add-bond", "ovs_bond0", "clients", "tap0", "tap1", "--",
+           "add-bond", "ovs_bond0", "uplink", "eth0", "eth1", "--", "set", "port", "uplink",
+           kMark});
+
+    EXPECT_EQ(VLIBNetOVSIfIsMaster("ovs_bond0"), 2);
+}
+
+TEST_F(SwitchBridges, OfOthersCarryNothingThatIsOurs)
+{
+    Vsctl({"add-br", "lan", "--", "add-port", "lan", "eth3", "--", "add-bond", "lan", "theirs",
+           "eth4", "eth5"});
+
+    EXPECT_EQ(VLIBNetOVSIfIsMaster("lan"), 0);
+    VORNLINKAGGROPT opt{};
+    EXPECT_EQ(VORNNetLinkAggrGet("lan", &opt), -1);
+}
+
+TEST_F(SwitchBridges, HaveTheirBondReadWithItsModeAndItsFilesOrder)
+{
+    Vsctl({"add-br", "ovs_bond0", "--", "add-bond", "ovs_bond0", "uplink", "eth0", "eth1", "--",
+           "set", "port", "uplink", kMark});
+    WriteBondFile("eth1 eth0");
+    const std::pair<const char*, int> rows[] = {
+        {"bond_mode=active-backup", 6}, {"bond_mode=balance-slb", 7}, {"bond_mode=balance-tcp", 8}};
+    for (const auto& [column, mode] : rows) {
+        Vsctl({"set", "port", "uplink", column});
+        VORNLINKAGGROPT opt{};
+        EXPECT_EQ(VORNNetLinkAggrGet("ovs_bond0", &opt), 0);
+        EXPECT_STREQ(opt.szMaster, "ovs_bond0");
+        EXPECT_EQ(opt.mode, mode);
+        EXPECT_EQ(opt.nSlave, 2);
+        EXPECT_STREQ(opt.rgszSlave[0], "eth1");
+        EXPECT_STREQ(opt.rgszSlave[1], "eth0");
+    }
+
+    Vsctl({"clear", "port", "uplink", "bond_mode"});
+    WriteBondFile("eth1 eth2");
+    VORNLINKAGGROPT opt{};
+    EXPECT_EQ(VORNNetLinkAggrGet("ovs_bond0", &opt), 0);
+    EXPECT_EQ(opt.mode, 6) << "what the switch does without a mode";
+    EXPECT_STREQ(opt.rgszSlave[0], "eth0") << "the file says something else than the switch";
+}
+
+TEST_F(SwitchBridges, WithOneInterfaceHaveNoBondToBeRead)
+{
+    Vsctl({"add-br", "ovs_eth0", "--", "add-port", "ovs_eth0", "eth0"});
+    WriteBridgeFile("eth0");
+    VORNLINKAGGROPT opt{};
+
+    EXPECT_EQ(VORNNetLinkAggrGet("ovs_eth0", &opt), -1);
+    EXPECT_EQ(VORNNetLinkAggrGet("ovs_eth1", &opt), -1);
+}
+
 TEST_F(SwitchBridges, AreOnlyThoseOfTheSwitch)
 {
     Vsctl({"add-br", "ovs_eth0", "--", "add-port", "ovs_eth0", "eth0"});

@@ -1,0 +1,22 @@
+/**
+ * The VLAN interfaces by which a plain interface's addressing is put into a VLAN. The network
+ * program makes them; nobody converts them, and nobody is shown them as VLANs of the host.
+ */
+#ifndef VORNHOST_SUPPORT_TAGDEVICE_H
+#define VORNHOST_SUPPORT_TAGDEVICE_H
+
+#include "netlink.h"
+
+#include <string>
+
+namespace vornhost {
+
+/** @return  the name of the one for a VLAN on the interface of that index: "tag2.10". */
+std::string TagDeviceName(int parentIndex, unsigned vlanId);
+
+/** Tells whether an interface is one: its name says what it is by its kind. */
+bool IsTagDevice(const Link& link);
+
+} // namespace vornhost
+
+#endif

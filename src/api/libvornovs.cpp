@@ -1,10 +1,9 @@
 #include <vornovs/vornovs.h>
 
 #include "api/configlock.h"
+#include "api/countnames.h"
 #include "state/statefiles.h"
 #include "system/log.h"
-
-#include <vornplatform/core.h>
 
 #include <unistd.h>
 
@@ -16,17 +15,6 @@ namespace {
 
 constexpr char kLogFile[] = "libvornovs.cpp";
 
-constexpr char kLockPath[] = "/tmp/ovs_config.lock";
-constexpr int kLockExclusive = 1;
-constexpr int kLockSeconds = 5;
-
-/** @return number of registered names; negative: memory ran out. */
-int CountNames(OVSRegConf& registry)
-{
-    std::set<std::string> names;
-    return registry.GetRegNames(names);
-}
-
 void PrimeBondModes(OVSManager& manager, const std::map<std::string, std::string>& bondModes)
 {
     for (const auto& [bond, mode] : bondModes) {
@@ -35,24 +23,6 @@ void PrimeBondModes(OVSManager& manager, const std::map<std::string, std::string
 }
 
 } // namespace
-
-ConfigLock::ConfigLock()
-    : m_taken(VLIBCFileLockTimeByFile(kLockPath, kLockExclusive, kLockSeconds, &m_handle) >= 0)
-{
-    if (!m_taken) {
-        OVS_ERR("Failed to lock%s", kLockPath);
-        OVS_ERR("Failed to lock the file");
-    }
-}
-
-ConfigLock::~ConfigLock()
-{
-    // By the handle alone: a failed attempt that left one behind is given back, too.
-    if (m_handle != -1 && VLIBCFileUnlockByFile(m_handle) < 0) {
-        OVS_ERR("Failed to unlock%s", kLockPath);
-        OVS_ERR("Failed to unlock the file");
-    }
-}
 
 int IsRegister(const std::string& name)
 try {

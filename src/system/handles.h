@@ -11,6 +11,7 @@
 namespace VORN::OVS {
 
 constexpr int kHashSize = 1024;
+constexpr int kListSize = 512;
 
 // The option word of the platform's standard way of running a system script.
 constexpr int kExecOptions = 0xBB;
@@ -36,6 +37,33 @@ public:
 
 private:
     VLIBCSzHash* m_hash;
+};
+
+class SzList {
+public:
+    SzList() : m_list(VLIBCSzListAlloc(kListSize)) {}
+    ~SzList()
+    {
+        if (m_list != nullptr) {
+            VLIBCSzListFree(m_list);
+        }
+    }
+    SzList(const SzList&) = delete;
+    SzList& operator=(const SzList&) = delete;
+
+    explicit operator bool() const { return m_list != nullptr; }
+    [[nodiscard]] int Count() const { return m_list->nItem; }
+    /** @return the item at an index below the count; the list keeps it. */
+    [[nodiscard]] const char* At(int index) const { return VLIBCSzListGet(m_list, index); }
+
+    // As with the hash, the platform may move the list as it grows.
+    void Split(const char* text, const char* separator)
+    {
+        (void)VLIBCStrSep(text, separator, &m_list);
+    }
+
+private:
+    VLIBCSzList* m_list;
 };
 
 /** The readable output of a program. */

@@ -29,11 +29,34 @@ static_assert(kIs<int (*)(Name, Map), decltype(&Register)>);
 static_assert(kIs<int (*)(Name, Map), decltype(&UnRegister)>);
 static_assert(kIs<void (*)(), decltype(&OVSSetDefault)>);
 
+using Mode = VORN_LINK_AGGR_MODE;
+using NameList = std::vector<std::string>;
+static_assert(kIs<int (*)(Name), decltype(&RemoveInterface)>);
+static_assert(kIs<int (*)(Name), decltype(&AddInterface)>);
+static_assert(kIs<int (*)(Names&), decltype(&ListInterface)>);
+static_assert(kIs<int (*)(Name, Name), decltype(&AttachPort)>);
+static_assert(kIs<int (*)(Name, Name), decltype(&DetachPort)>);
+
+static_assert(kIs<int (*)(Mode, Name, NameList&), decltype(&OVSBondCreate)>);
+static_assert(kIs<int (*)(Name, VORNLINKAGGROPT*), decltype(&OVSBondRemove)>);
+static_assert(kIs<int (*)(Name, VORNLINKAGGROPT*), decltype(&OVSBondGet)>);
+static_assert(kIs<int (*)(Mode, Name), decltype(&OVSBodChMode)>);
+static_assert(kIs<Mode (*)(const char*), decltype(&StrToMode)>);
+static_assert(kIs<void (*)(Mode, std::string&), decltype(&ModeToStr)>);
+static_assert(kIs<bool (*)(Mode), decltype(&CheckModeSupport)>);
+static_assert(kIs<int (*)(std::string&), decltype(&GetUniqueBondName)>);
+
+static_assert(kIs<int (*)(Name, _tag_VLIB_VLAN*), decltype(&OVSVlanGet)>);
+static_assert(kIs<int (*)(Name, Name), decltype(&OVSVlanSet)>);
+static_assert(kIs<int (*)(Name), decltype(&OVSVlanClear)>);
+static_assert(kIs<int (*)(Name, Name), decltype(&OVSVlanCreate)>);
+static_assert(kIs<int (*)(Name), decltype(&OVSVlanRemove)>);
+
 static_assert(kIs<bool (*)(), decltype(&IsDaemonAlive)>);
 static_assert(kIs<bool (*)(), decltype(&StartOVSDaemon)>);
 static_assert(kIs<bool (*)(), decltype(&StopOVSBaemon)>);
-static_assert(kIs<bool (*)(const std::vector<std::string>&), decltype(&StartNetwork)>);
-static_assert(kIs<bool (*)(const std::vector<std::string>&), decltype(&StopNetwork)>);
+static_assert(kIs<bool (*)(const NameList&), decltype(&StartNetwork)>);
+static_assert(kIs<bool (*)(const NameList&), decltype(&StopNetwork)>);
 static_assert(kIs<bool (*)(Name), decltype(&IsInterfaceExist)>);
 static_assert(kIs<int (*)(const char*, const char*), decltype(&CopyGatewayInfo)>);
 static_assert(kIs<int (*)(const char*), decltype(&RemoveGateWayInfo)>);
@@ -57,15 +80,16 @@ static_assert(std::is_base_of_v<vornnetsdk::hook::BaseHook, OVSChangeHook>);
 static_assert(sizeof(OVSChangeHook) == sizeof(vornnetsdk::hook::BaseHook));
 static_assert(sizeof(vornnetsdk::hook::BaseHook) == 2 * sizeof(void*));
 
-static_assert(kIs<VORN_LINK_AGGR_MODE (*)(Name), decltype(&BondManager::StrToMode)>);
-static_assert(kIs<void (*)(VORN_LINK_AGGR_MODE, std::string&), decltype(&BondManager::ModeToStr)>);
-static_assert(
-    kIs<void (*)(VORN_LINK_AGGR_MODE, std::string&), decltype(&BondManager::ModeToBondOPT)>);
-static_assert(kIs<bool (*)(VORN_LINK_AGGR_MODE), decltype(&BondManager::CheckModeSupport)>);
-static_assert(
-    kIs<VORN_LINK_AGGR_MODE (*)(VORN_LINK_AGGR_MODE), decltype(&BondManager::DefaultModeConvert)>);
+static_assert(kIs<Mode (*)(Name), decltype(&BondManager::StrToMode)>);
+static_assert(kIs<void (*)(Mode, std::string&), decltype(&BondManager::ModeToStr)>);
+static_assert(kIs<void (*)(Mode, std::string&), decltype(&BondManager::ModeToBondOPT)>);
+static_assert(kIs<bool (*)(Mode), decltype(&BondManager::CheckModeSupport)>);
+static_assert(kIs<Mode (*)(Mode), decltype(&BondManager::DefaultModeConvert)>);
 static_assert(kIs<bool (*)(Name, VORNLINKAGGROPT*), decltype(&BondManager::Get)>);
-static_assert(kIs<bool (*)(VORN_LINK_AGGR_MODE, Name), decltype(&BondManager::BondChMode)>);
+static_assert(kIs<bool (*)(Mode, Name), decltype(&BondManager::BondChMode)>);
+static_assert(kIs<bool (*)(Mode, Name, NameList&, bool), decltype(&BondManager::Create)>);
+static_assert(kIs<bool (*)(Name, VORNLINKAGGROPT*, bool), decltype(&BondManager::Remove)>);
+static_assert(kIs<bool (*)(std::string&), decltype(&BondManager::GetUniqueName)>);
 
 static_assert(kIs<int (*)(Name, _tag_VLIB_VLAN*), decltype(&VlanManager::Get)>);
 static_assert(kIs<int (*)(Name, Name), decltype(&VlanManager::Set)>);
@@ -86,11 +110,13 @@ static_assert(kIs<bool (OVSManager::*)(), decltype(&OVSManager::CreateAll)>);
 static_assert(kIs<int (OVSManager::*)(Name) const, decltype(&OVSManager::CreateOVS)>);
 static_assert(kIs<int (OVSManager::*)(const char*, const char*, const char*, const char*) const,
                   decltype(&OVSManager::CreateOVSForGeneral)>);
+static_assert(kIs<int (OVSManager::*)(), decltype(&OVSManager::CreateOVSBond)>);
 static_assert(kIs<int (OVSManager::*)() const, decltype(&OVSManager::CreateOVSVlan)>);
 static_assert(kIs<int (OVSManager::*)(), decltype(&OVSManager::RemoveLinuxBond)>);
 static_assert(kIs<int (OVSManager::*)() const, decltype(&OVSManager::RemoveLinuxVlan)>);
 static_assert(kIs<bool (OVSManager::*)(), decltype(&OVSManager::DeleteAll)>);
 static_assert(kIs<int (OVSManager::*)(Name) const, decltype(&OVSManager::DestroyOVS)>);
+static_assert(kIs<int (OVSManager::*)(), decltype(&OVSManager::RemoveOVSBond)>);
 static_assert(kIs<int (OVSManager::*)() const, decltype(&OVSManager::RemoveOVSVlan)>);
 static_assert(kIs<int (OVSManager::*)(), decltype(&OVSManager::CreateLinuxBond)>);
 static_assert(kIs<int (OVSManager::*)() const, decltype(&OVSManager::CreateLinuxVlan)>);

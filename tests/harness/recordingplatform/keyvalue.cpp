@@ -37,6 +37,16 @@ int CarryOut(const Recorder& recorder, const std::string& path, const KeyValues&
     return !recorder.m_carryOutEdits || harness::EditFile(path, set, remove) ? 0 : -1;
 }
 
+std::optional<std::string> FindValue(const Recorder& recorder, const std::string& path,
+                                     const std::string& key)
+{
+    const auto set = recorder.m_values.find({path, key});
+    if (set != recorder.m_values.end()) {
+        return set->second;
+    }
+    return recorder.m_carryOutEdits ? harness::ReadKey(path, key) : std::nullopt;
+}
+
 /** Growing moves the hash: whoever kept the old handle is found out. */
 void MoveHash(Recorder& recorder, VLIBCSzHash** hash)
 {
@@ -62,7 +72,7 @@ int VLIBCFileGetKeyValue(const char* path, const char* key, char* value, int siz
     if (answer) {
         return *answer;
     }
-    const auto found = recorder.m_carryOutEdits ? harness::ReadKey(file, name) : std::nullopt;
+    const auto found = FindValue(recorder, file, name);
     if (!found) {
         return -1;
     }
@@ -236,6 +246,18 @@ void VLIBCSzListFree(VLIBCSzList* list)
     }
 }
 
+/** As with the hash. */
+List* MoveList(Recorder& recorder, VLIBCSzList** list)
+{
+    auto* const old = static_cast<List*>(*list);
+    auto* const moved = new List(std::move(*old));
+    recorder.m_open.erase(old);
+    delete old;
+    recorder.Open(moved, "a list", [moved] { delete moved; });
+    *list = moved;
+    return moved;
+}
+
 int VLIBCStrSep(const char* text, const char* separator, VLIBCSzList** list)
 {
     const HarnessAllocations guard;
@@ -246,25 +268,27 @@ int VLIBCStrSep(const char* text, const char* separator, VLIBCSzList** list)
     if (!recorder.IsOpen(*list, "VLIBCStrSep")) {
         return -1;
     }
-    auto* const items = static_cast<List*>(*list);
+    const std::optional<int> answer = recorder.Housekeeping(CallText("VLIBCStrSep", {source}));
+    List* const items = MoveList(recorder, list);
     for (std::size_t start = 0; start <= source.size();) {
         const std::size_t end = std::min(source.find(blank, start), source.size());
         items->items.push_back(source.substr(start, end - start));
         ++items->nItem;
         start = end + blank.size();
     }
-    return items->nItem;
+    return answer.value_or(items->nItem);
 }
 
 int VLIBCStrTrimSpace(const char* source, char* destination)
 {
     const HarnessAllocations guard;
-    (void)Recorder::Current("VLIBCStrTrimSpace");
+    Recorder& recorder = Recorder::Current("VLIBCStrTrimSpace");
     const std::string text = Text("VLIBCStrTrimSpace", source);
+    const std::optional<int> answer = recorder.Housekeeping(CallText("VLIBCStrTrimSpace", {text}));
     const std::size_t first = text.find_first_not_of(" \t\r\n");
     const std::size_t last = text.find_last_not_of(" \t\r\n");
     const std::string trimmed =
         first == std::string::npos ? std::string() : text.substr(first, last - first + 1);
     std::memcpy(destination, trimmed.c_str(), trimmed.size() + 1);
-    return 0;
+    return answer.value_or(0);
 }

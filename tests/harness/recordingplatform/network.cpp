@@ -210,6 +210,9 @@ int VORNNetLinkAggrOptSlsaveAdd(VORNLINKAGGROPT* opt, const char* slave)
     if (result >= 0 && opt->nSlave < VORN_LINK_AGGR_SLAVES) {
         char(&field)[VORN_NAME_SIZE] = opt->rgszSlave[opt->nSlave];
         field[name.copy(field, VORN_NAME_SIZE - 1)] = '\0';
+        if (recorder.m_fillNamesWhole) {
+            name.copy(field, VORN_NAME_SIZE);
+        }
         ++opt->nSlave;
     }
     return result;
@@ -220,8 +223,14 @@ int VORNNetBondIPConflict(const char* bond, char* conflict, int size, unsigned i
     const HarnessAllocations guard;
     Recorder& recorder = Recorder::Current("VORNNetBondIPConflict");
     Expect("VORNNetBondIPConflict", "size", size, kConflictSize);
-    conflict[0] = '\0';
-    *out = 0;
-    return recorder.Call(CallText("VORNNetBondIPConflict", {Text("VORNNetBondIPConflict", bond)}))
-        .value_or(0);
+    ExpectZeroed("VORNNetBondIPConflict", conflict, kConflictSize);
+    const std::string name = Text("VORNNetBondIPConflict", bond);
+    const std::optional<int> answer = recorder.Call(CallText("VORNNetBondIPConflict", {name}));
+    const auto found = recorder.m_conflicts.find(name);
+    if (found != recorder.m_conflicts.end()) {
+        // Filled to its last byte a buffer has no end.
+        found->second.copy(conflict, kConflictSize);
+    }
+    *out = 0x5A5A;
+    return answer.value_or(static_cast<int>(found != recorder.m_conflicts.end()));
 }

@@ -13,6 +13,7 @@
 #include <set>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 namespace harness {
@@ -97,11 +98,14 @@ public:
     std::vector<std::string> m_interfaces{"eth0"};
     std::map<std::string, _tag_VLIB_VLAN> m_vlans;
     std::map<std::string, VORNLINKAGGROPT> m_bonds;
+    std::map<std::string, std::string> m_conflicts;
+    std::map<std::pair<std::string, std::string>, std::string> m_values;
     std::map<std::string, Link> m_links;
     std::optional<int> m_lockHandle;
     int m_heldLock = -1;
     bool m_holdsPlatformLock = false;
     bool m_carryOutEdits = false;
+    bool m_fillNamesWhole = false;
 
 private:
     std::optional<int> AnswerFor(const std::string& text);

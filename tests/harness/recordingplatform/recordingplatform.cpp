@@ -98,9 +98,25 @@ void RecordingPlatform::Bond(const std::string& name, const VORNLINKAGGROPT& rec
     m_recorder->m_bonds[name] = record;
 }
 
+void RecordingPlatform::Conflict(const std::string& bond, const std::string& name)
+{
+    m_recorder->m_conflicts[bond] = name;
+}
+
+void RecordingPlatform::Value(const std::string& path, const std::string& key,
+                              const std::string& value)
+{
+    m_recorder->m_values[{path, key}] = value;
+}
+
 void RecordingPlatform::LinkSpeeds(const std::string& name, const std::vector<int>& speeds)
 {
     m_recorder->m_links[name] = {speeds, 0};
+}
+
+void RecordingPlatform::FillNamesWhole()
+{
+    m_recorder->m_fillNamesWhole = true;
 }
 
 void RecordingPlatform::LockHandle(int handle)

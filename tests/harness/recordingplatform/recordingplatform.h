@@ -86,8 +86,17 @@ public:
     /** The same with a record as it stands, whatever it says. */
     void Bond(const std::string& name, const VORNLINKAGGROPT& record);
 
+    /** The interface whose address conflicts with the bond's, up to 32 bytes; without one: none. */
+    void Conflict(const std::string& bond, const std::string& name);
+
+    /** A key's value in a file, whatever the file holds. */
+    void Value(const std::string& path, const std::string& key, const std::string& value);
+
     /** Link speeds that an interface reports one after the other; the last one stays. */
     void LinkSpeeds(const std::string& name, const std::vector<int>& speeds);
+
+    /** Slave names fill their field to its last byte, without an end, when they are that long. */
+    void FillNamesWhole();
 
     /** Handle that the lock call hands out, whatever its result; -1: none. */
     void LockHandle(int handle);

@@ -1,5 +1,5 @@
-#ifndef VORNOVS_SWITCH_RECORDS_H
-#define VORNOVS_SWITCH_RECORDS_H
+#ifndef VORNOVS_BOND_BONDRECORD_H
+#define VORNOVS_BOND_BONDRECORD_H
 
 #include "state/ifcfg.h"
 

@@ -4,6 +4,7 @@
 #include <array>
 #include <sstream>
 #include <string_view>
+#include <utility>
 
 namespace vornhost {
 namespace {
@@ -118,7 +119,10 @@ std::string PortColumns::Changes(const SwitchPort* live, bool wanted) const
     }
     const bool same = live != nullptr && live->externalIds.contains(kOptionsKey) &&
                       live->externalIds.at(kOptionsKey) == Keys();
-    return same ? changes : changes + " external_ids:" + kOptionsKey + "=" + Quoted(Keys());
+    if (!same) {
+        changes += std::string(" external_ids:") + kOptionsKey + "=" + Quoted(Keys());
+    }
+    return changes;
 }
 
 std::vector<std::string> PortColumns::Removals(const std::string& port, const SwitchPort* live,
@@ -133,9 +137,11 @@ std::vector<std::string> PortColumns::Removals(const std::string& port, const Sw
         if (m_values.contains(name) || LiveValue(*live, name).empty()) {
             continue;
         }
-        removals.push_back(StartsWith(name, kOther) ? "remove Port " + port + " other_config " +
-                                                          name.substr(sizeof kOther - 1)
-                                                    : "clear Port " + port + " " + name);
+        std::string removal = StartsWith(name, kOther) ? "remove Port " : "clear Port ";
+        removal += port;
+        removal += StartsWith(name, kOther) ? " other_config " : " ";
+        removal += StartsWith(name, kOther) ? name.substr(sizeof kOther - 1) : name;
+        removals.push_back(std::move(removal));
     }
     return removals;
 }

@@ -18,6 +18,8 @@ constexpr char kInterfaces[] = "/sys/class/net/";
 constexpr milliseconds kLinkDeadline{5000};
 constexpr milliseconds kPartnerDeadline{10000};
 constexpr milliseconds kPoll{10};
+/** Three seconds until a partner expects nothing any more, and as long until it acts on that. */
+constexpr milliseconds kAloneTime{6500};
 constexpr milliseconds kDatabaseLimit{5000};
 
 std::string FirstWord(const std::string& path)
@@ -73,7 +75,11 @@ bool WaitFor(const std::vector<std::string>& what)
     if (kind == "member") {
         return WaitUntil([&] { return IsInUse(name); }, kLinkDeadline);
     }
-    return WaitUntil([&] { return HasNegotiated(name, what.at(2)); }, kPartnerDeadline);
+    if (kind == "switch") {
+        return WaitUntil([&] { return HasNegotiated(name, what.at(2)); }, kPartnerDeadline);
+    }
+    std::this_thread::sleep_for(kAloneTime);
+    return true;
 }
 
 } // namespace vornhost

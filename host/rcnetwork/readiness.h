@@ -13,6 +13,8 @@ namespace vornhost {
  * Waits for one of these, each as long as it may take:
  *   link NAME          the interface has a carrier
  *   member NAME        the kernel's bond has the interface in use
+ *   alone NAME         the partner, of which nothing shows here what it thinks, takes the interface
+ *                      for one that is in no aggregate any more
  *   switch BRIDGE PORT the partner of the switch's bond has agreed on LACP
  * @return  whether it came.
  */

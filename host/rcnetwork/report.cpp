@@ -1,5 +1,7 @@
 #include "report.h"
 
+#include "handover.h"
+
 #include <cstdio>
 
 #include <syslog.h>
@@ -25,7 +27,10 @@ int Priority(Severity severity)
 void Say(const Remark& remark)
 {
     ::syslog(Priority(remark.severity), "%s", remark.text.c_str());
-    (void)std::fprintf(stderr, "rc.network: %s\n", remark.text.c_str());
+    // In a conversion the one that runs this program would log it once more.
+    if (!IsPartOfConversion()) {
+        (void)std::fprintf(stderr, "rc.network: %s\n", remark.text.c_str());
+    }
 }
 
 bool SayAll(const std::vector<Remark>& remarks)

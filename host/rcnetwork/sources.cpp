@@ -242,7 +242,10 @@ BondOptions BondOptionsOf(const InterfaceFile& file)
 {
     std::string text;
     for (const auto& [name, value] : file.bondOptions) {
-        text += name + "=" + value + " ";
+        text += name;
+        text += '=';
+        text += value;
+        text += ' ';
     }
     return BondOptions::Parse(text);
 }

@@ -122,7 +122,7 @@ void UnitPlanner::MakeBond()
         auto& stage = name == kJoinDelay ? m_steps.tidy.links : lines;
         stage.push_back(OptionLine(m_unit.name, name, options.Get(name)));
     }
-    if (BringsLinkLocal()) {
+    if (Carrier() == m_unit.name && BringsLinkLocal()) {
         lines.push_back("link set dev " + m_unit.name + " addrgenmode none");
     }
     lines.push_back("link set dev " + m_unit.name + " up");
@@ -256,6 +256,11 @@ void UnitPlanner::DissolveBond(const std::string& bond)
         if (member == m_unit.name && !m_unit.takeDown) {
             ReleaseMember(bond, member, m_steps.devices.links);
             m_steps.readyBefore.push_back("link " + member);
+            const auto mode = live.options.find("mode");
+            if (mode != live.options.end() && mode->second == "802.3ad" &&
+                live.members.size() > 1) {
+                m_steps.readyBefore.push_back("alone " + member);
+            }
         } else if (whole || !IsMember(member)) {
             ReleaseMember(bond, member, whole ? m_steps.beside.links : m_steps.tidy.links);
         }

@@ -92,6 +92,47 @@ TEST(ParseInterfaceFile, LeavesIpv6OutWhenTheFileTurnsItOff)
     EXPECT_EQ(parsed.file.gateway6, "");
 }
 
+TEST(ParseInterfaceFile, ReadsABondAndItsMember)
+{
+    const auto bond = ParseInterfaceFile(
+        "bond0", "DEVICE=bond0\nBONDING_OPTS=\"mode=802.3ad miimon=100\"\nIPADDR=192.0.2.5/24\n");
+    const auto member = ParseInterfaceFile("eth0", "DEVICE=eth0\nMASTER=bond0\nSLAVE=yes\n");
+
+    EXPECT_THAT(Texts(bond), IsEmpty());
+    EXPECT_EQ(bond.file.use, FileUse::kPlain);
+    EXPECT_TRUE(bond.file.bond);
+    EXPECT_THAT(bond.file.bondOptions,
+                ElementsAre(std::pair("mode", "802.3ad"), std::pair("miimon", "100")));
+    EXPECT_THAT(Texts(member), IsEmpty());
+    EXPECT_TRUE(member.file.slave);
+    EXPECT_EQ(member.file.master, "bond0");
+    EXPECT_FALSE(member.file.bond);
+}
+
+TEST(ParseInterfaceFile, ReadsABondOfTheSwitchOfAnyName)
+{
+    for (const char* name : {"ovs_bond0", "uplink"}) {
+        const auto parsed =
+            ParseInterfaceFile(name, std::string("DEVICE=") + name +
+                                         "\nTYPE=OVS\nPRIMARY=eth0\nSLAVE_LIST=\"eth0 eth1 \"\n"
+                                         "BONDING_OPTS=\"bond_mode=balance-slb lacp=off\"\n");
+
+        EXPECT_THAT(Texts(parsed), IsEmpty());
+        EXPECT_EQ(parsed.file.use, FileUse::kBridge) << name;
+        EXPECT_THAT(parsed.file.slaveList, ElementsAre("eth0", "eth1"));
+        EXPECT_FALSE(parsed.file.bond);
+    }
+}
+
+TEST(ParseInterfaceFile, ReadsAVlanByItsNameOrByItsKeys)
+{
+    EXPECT_EQ(ParseInterfaceFile("eth0.10", "DEVICE=eth0.10\n").file.vlan, (FileVlan{"eth0", 10}));
+    EXPECT_EQ(ParseInterfaceFile("office", "PHYSDEV=eth1\nVLAN_ID=20\n").file.vlan,
+              (FileVlan{"eth1", 20}));
+    EXPECT_EQ(ParseInterfaceFile("eth0.4096", "DEVICE=eth0.4096\n").file.vlan, std::nullopt);
+    EXPECT_EQ(ParseInterfaceFile("eth0", "DEVICE=eth0\n").file.vlan, std::nullopt);
+}
+
 struct LeftAlone {
     const char* description;
     const char* name;

@@ -27,3 +27,7 @@ lint_packages=(
     cppcheck
     shellcheck
 )
+
+coverage_packages=(
+    gcovr
+)

@@ -133,7 +133,7 @@ try {
 }
 
 int ListInterface(std::set<std::string>& out)
-try {
+{
     const int inUse = AskForClients();
     if (inUse <= 0) {
         return inUse;
@@ -143,12 +143,10 @@ try {
         return -1;
     }
     return 0;
-} catch (const std::exception&) {
-    return -1;
 }
 
 int AttachPort(const std::string& bridge, const std::string& port)
-try {
+{
     const ConfigLock lock;
     const int inUse = lock ? AskForClients() : -1;
     if (inUse <= 0) {
@@ -159,12 +157,10 @@ try {
         return -1;
     }
     return 1;
-} catch (const std::exception&) {
-    return -1;
 }
 
 int DetachPort(const std::string& bridge, const std::string& port)
-try {
+{
     const ConfigLock lock;
     const int inUse = lock ? AskForClients() : -1;
     if (inUse <= 0) {
@@ -175,8 +171,6 @@ try {
         return -1;
     }
     return 1;
-} catch (const std::exception&) {
-    return -1;
 }
 
 } // namespace VORN::OVS

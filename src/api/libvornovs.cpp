@@ -25,35 +25,29 @@ void PrimeBondModes(OVSManager& manager, const std::map<std::string, std::string
 } // namespace
 
 int IsRegister(const std::string& name)
-try {
+{
     OVSRegConf registry;
     if (registry.LoadFromConfig() < 0) {
         OVS_ERR("Failed to load the ovs config");
         return -1;
     }
     return registry.IsRegister(name) > 0 ? 0 : -1;
-} catch (const std::exception&) {
-    return -1;
 }
 
 int GetAllRegister(std::set<std::string>& names)
-try {
+{
     OVSRegConf registry;
     if (registry.LoadFromConfig() < 0) {
         OVS_ERR("Failed to load the ovs config");
         return 0;
     }
     return std::max(registry.GetRegNames(names), 0);
-} catch (const std::exception&) {
-    return 0;
 }
 
 bool IsOVSRunning()
-try {
+{
     std::set<std::string> names;
     return GetAllRegister(names) > 0;
-} catch (const std::exception&) {
-    return false;
 }
 
 int IsOVSSupport()
@@ -62,7 +56,7 @@ int IsOVSSupport()
 }
 
 int Register(const std::string& name, const std::map<std::string, std::string>& bondModes)
-try {
+{
     OVSRegConf registry;
     OVSManager manager;
     const int reason = NotSupportOVS();
@@ -102,12 +96,10 @@ try {
         (void)registry.UnRegister(name);
     }
     return 0;
-} catch (const std::exception&) {
-    return -1;
 }
 
 int UnRegister(const std::string& name, const std::map<std::string, std::string>& bondModes)
-try {
+{
     OVSRegConf registry;
     OVSManager manager;
     const ConfigLock lock;
@@ -142,8 +134,6 @@ try {
         OVS_ERR("Failed to delete all OVS interface");
     }
     return 0;
-} catch (const std::exception&) {
-    return -1;
 }
 
 void OVSSetDefault()

@@ -136,7 +136,8 @@ std::optional<int> Recorder::Call(const std::string& text)
 {
     m_calls.push_back(text);
     m_allCalls.push_back(text);
-    return AnswerFor(text);
+    const std::optional<int> answer = AnswerFor(text);
+    return answer || !m_reaction ? answer : m_reaction(text);
 }
 
 std::optional<int> Recorder::Housekeeping(const std::string& text)

@@ -83,6 +83,7 @@ public:
         int status;
     };
 
+    std::function<std::optional<int>(const std::string&)> m_reaction;
     std::vector<Rule> m_rules;
     std::vector<std::string> m_calls;
     std::vector<std::string> m_allCalls;

@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <cstring>
 #include <ostream>
+#include <utility>
 
 #include <syslog.h>
 
@@ -58,6 +59,17 @@ void RecordingPlatform::Answer(const std::string& call, int result)
     m_recorder->m_rules.push_back({call, 0, result, 0});
 }
 
+void RecordingPlatform::React(std::function<std::optional<int>(const std::string& call)> reaction)
+{
+    m_recorder->m_reaction = std::move(reaction);
+}
+
+void RecordingPlatform::NoVlansAndBonds()
+{
+    m_recorder->m_vlans.clear();
+    m_recorder->m_bonds.clear();
+}
+
 void RecordingPlatform::AnswerNth(const std::string& call, int nth, int result)
 {
     m_recorder->m_rules.push_back({call, nth, result, 0});
@@ -65,7 +77,9 @@ void RecordingPlatform::AnswerNth(const std::string& call, int nth, int result)
 
 void RecordingPlatform::Output(const std::string& call, const std::string& text, int status)
 {
-    m_recorder->m_outputs.emplace_back(call, Recorder::ProgramOutput{text, status});
+    auto& outputs = m_recorder->m_outputs;
+    std::erase_if(outputs, [&](const auto& output) { return output.first == call; });
+    outputs.emplace_back(call, Recorder::ProgramOutput{text, status});
 }
 
 void RecordingPlatform::Interfaces(const std::vector<std::string>& names)

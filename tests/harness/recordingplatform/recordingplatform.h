@@ -24,9 +24,11 @@
 
 #include <vornplatform/records.h>
 
+#include <functional>
 #include <iosfwd>
 #include <map>
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -65,7 +67,13 @@ public:
      */
     void Answer(const std::string& call, int result);
 
-    /** The same for the nth matching call from now on only, counted from 1. */
+    /**
+     * Has a simulation see every call that no answer was set for, and answer it or leave it to the
+     * platform. It may change what the platform knows while it is called.
+     */
+    void React(std::function<std::optional<int>(const std::string& call)> reaction);
+
+    /** The same as Answer() for the nth matching call from now on only, counted from 1. */
     void AnswerNth(const std::string& call, int nth, int result);
 
     /** What a program started with VLIBCPopen() prints, and the wait status it ends with. */
@@ -73,6 +81,9 @@ public:
 
     /** The host's interfaces, in the order listed. */
     void Interfaces(const std::vector<std::string>& names);
+
+    /** Forgets every VLAN and bond. */
+    void NoVlansAndBonds();
 
     /** Makes the interface a VLAN. */
     void Vlan(const std::string& name, const std::string& parent, int id);

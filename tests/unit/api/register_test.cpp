@@ -253,9 +253,19 @@ TEST(Register, CountsTheEmptyNameOfAnEmptyLineAsAClient)
 TEST(Register, StandsNamesOf5000Characters)
 {
     const RecordingPlatform platform;
-    EXPECT_EQ(Register(LongName(), {{LongName(), LongName()}}), 0);
+    EXPECT_EQ(Register(LongName(), {}), 0);
     EXPECT_EQ(ReadFile(kRegistry), LongName() + "\n");
     EXPECT_EQ(Register(LongName(), {}), 1);
+}
+
+TEST(Register, ForgetsTheNameWhenABondThatItNamesCannotBeBuilt)
+{
+    for (const std::string& bond : {std::string("bond9"), LongName()}) {
+        const RecordingPlatform platform;
+        EXPECT_EQ(Register("a", {{bond, LongName()}}), 0);
+        EXPECT_EQ(ReadFile(kRegistry), std::nullopt);
+        EXPECT_EQ(platform.Log().back(), Err(kFile, "Failed to CreateAll"));
+    }
 }
 
 TEST(Register, NamesALongNameThatCannotBeRecordedWhole)

@@ -2,7 +2,7 @@
 // so on until a run passes, once with that allocation alone failing and once with all that follow.
 #include <vornovs/vornovs.h>
 
-#include "support/support.h"
+#include "support/bondcalls.h"
 
 #include <algorithm>
 #include <cstdlib>
@@ -96,6 +96,7 @@ namespace {
 // Longer than a string holds without an allocation.
 const std::string kClient = "a client with a long name";
 const std::string kOther = "another client's long name";
+const std::string kBond = "ovs_bond-with-a-long-name";
 
 struct Entry {
     std::string name;
@@ -105,6 +106,8 @@ struct Entry {
     std::vector<int> failures;
     /** The host is in bridge topology. */
     bool topology = false;
+    /** A failure may leave the network stopped: that is what the call documents. */
+    bool mayStayStopped = false;
 
     friend void PrintTo(const Entry& entry, std::ostream* out) { *out << entry.name; }
 };
@@ -155,6 +158,11 @@ void PrepareHost(RecordingPlatform& platform)
     }
     WriteFile(kRegistry, kClient + "\n");
     WriteFile(kInterfaceList, "eth0\neth1\n");
+    unit::MakeLive(platform, {"ovs_eth0", "ovs_eth1", "ovs_eth2", "ovs_eth3"});
+    unit::RecordBond(platform, {kBond, 7, {"eth0", "eth1"}});
+    platform.Bond(kBond, 7, {"eth0", "eth1"});
+    platform.Conflict(kBond, "conflicting-interface");
+    platform.Answer("VLIBNetOVSIfIsMaster " + kBond, 2);
 }
 
 long CountCalls(const RecordingPlatform& platform, const std::string& function)
@@ -174,6 +182,17 @@ void ExpectWholeState()
     }
 }
 
+/** Whatever is stopped must be started again: a host must not go dark for want of memory. */
+void ExpectStartAfterEachStop(const RecordingPlatform& platform, long nth)
+{
+    bool stopped = false;
+    for (const std::string& call : platform.Calls()) {
+        const bool script = call.find(" /etc/rc.network ") != std::string::npos;
+        stopped = script ? call.find(" /etc/rc.network stop") != std::string::npos : stopped;
+    }
+    EXPECT_FALSE(stopped) << "at allocation " << nth;
+}
+
 TEST_P(WithoutMemory, AnswersItsFailureAndLeavesNothingOpen)
 {
     const auto& [entry, allThatFollow] = GetParam();
@@ -189,6 +208,9 @@ TEST_P(WithoutMemory, AnswersItsFailureAndLeavesNothingOpen)
                   CountCalls(platform, "VLIBCFileUnlockByFile"))
             << "at allocation " << nth;
         ExpectWholeState();
+        if (!entry.mayStayStopped) {
+            ExpectStartAfterEachStop(platform, nth);
+        }
         if (!g_failed) {
             EXPECT_EQ(result, entry.success);
             EXPECT_GT(nth, 1) << "nothing was allocated";
@@ -495,6 +517,112 @@ std::vector<Entry> BondsAndVlans()
     };
 }
 
+std::vector<Entry> SwitchBonds()
+{
+    const auto create = [](bool restart) {
+        return [restart] {
+            std::vector<std::string> slaves;
+            {
+                const HarnessAllocations guard;
+                slaves = {"eth0", "eth1"};
+            }
+            return AsInt(
+                BondManager::Create(VORN_LINK_AGGR_OVS_BALANCE_TCP, kLongName, slaves, restart));
+        };
+    };
+    const auto remove = [](bool restart) {
+        return [restart] {
+            VORNLINKAGGROPT record{};
+            return AsInt(BondManager::Remove(kBond, &record, restart));
+        };
+    };
+    return {
+        {"BondCreate", create(true), 1, {0, 1}},
+        {"BondCreateWithoutRestart", create(false), 1, {0, 1}},
+        {"BondRemove", remove(true), 1, {0, 1}},
+        {"BondRemoveWithoutRestart", remove(false), 1, {0, 1}},
+        {"OVSBondRemove",
+         [] {
+             VORNLINKAGGROPT record{};
+             return VORN::OVS::OVSBondRemove(kBond, &record);
+         },
+         0,
+         {0, -1}},
+        {"OVSBondGet",
+         [] {
+             VORNLINKAGGROPT record{};
+             return VORN::OVS::OVSBondGet("bond0", &record);
+         },
+         0,
+         {-1}},
+        {"CreateOVSBond",
+         [] {
+             OVSManager manager;
+             {
+                 const HarnessAllocations guard;
+                 (void)manager.InitBondOpt("bond0");
+             }
+             return manager.CreateOVSBond();
+         },
+         0,
+         {0, -1}},
+        {"RemoveOVSBond",
+         [] {
+             OVSManager manager;
+             {
+                 const HarnessAllocations guard;
+                 (void)manager.InitBondOpt(kBond);
+             }
+             return manager.RemoveOVSBond();
+         },
+         0,
+         {0, -1}},
+        {"StrToMode",
+         [] { return static_cast<int>(VORN::OVS::StrToMode("a-mode-with-a-long-name")); },
+         0,
+         {0}},
+    };
+}
+
+std::vector<Entry> InterfacesAndPorts()
+{
+    return {
+        {"RemoveInterface",
+         [] { return VORN::OVS::RemoveInterface("ovs_eth0"); },
+         0,
+         {0, -1},
+         false,
+         true},
+        {"RemoveInterfaceOfABond",
+         [] { return VORN::OVS::RemoveInterface(kBond); },
+         0,
+         {0, -1},
+         false,
+         true},
+        {"AddInterface",
+         [] {
+             {
+                 const HarnessAllocations guard;
+                 WriteFile(unit::kIgnoreList, "eth2\n");
+             }
+             return VORN::OVS::AddInterface("eth2");
+         },
+         0,
+         {0, -1},
+         false,
+         true},
+        {"ListInterface",
+         [] {
+             Names names;
+             return VORN::OVS::ListInterface(names);
+         },
+         0,
+         {0, -1}},
+        {"AttachPort", [] { return VORN::OVS::AttachPort("ovs_eth0", "tap0"); }, 1, {-1}},
+        {"DetachPort", [] { return VORN::OVS::DetachPort("ovs_eth0", "tap0"); }, 1, {-1}},
+    };
+}
+
 std::string NameOfRow(const testing::TestParamInfo<std::tuple<Entry, bool>>& row)
 {
     return std::get<0>(row.param).name + (std::get<1>(row.param) ? "FromThenOn" : "Once");
@@ -517,6 +645,12 @@ INSTANTIATE_TEST_SUITE_P(Managers, WithoutMemory,
                          NameOfRow);
 INSTANTIATE_TEST_SUITE_P(BondsAndVlans, WithoutMemory,
                          testing::Combine(testing::ValuesIn(BondsAndVlans()), testing::Bool()),
+                         NameOfRow);
+INSTANTIATE_TEST_SUITE_P(SwitchBonds, WithoutMemory,
+                         testing::Combine(testing::ValuesIn(SwitchBonds()), testing::Bool()),
+                         NameOfRow);
+INSTANTIATE_TEST_SUITE_P(InterfacesAndPorts, WithoutMemory,
+                         testing::Combine(testing::ValuesIn(InterfacesAndPorts()), testing::Bool()),
                          NameOfRow);
 
 } // namespace

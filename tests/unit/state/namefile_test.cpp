@@ -143,6 +143,47 @@ TEST_P(SavedNames, LeaveTheFileThatAnotherClientIsWriting)
                 ElementsAre(GetParam().FileName(), GetParam().FileName() + ".new"));
 }
 
+/** Files beside the store's that other clients are writing, as many as are looked at. */
+class HundredWriters {
+public:
+    explicit HundredWriters(const std::string& path)
+    {
+        for (std::size_t at = 0; at < m_files.size(); ++at) {
+            const std::string file = path + ".new" + (at == 0 ? "" : std::to_string(at));
+            m_files[at] = open(file.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0600);
+            EXPECT_EQ(flock(m_files[at], LOCK_EX | LOCK_NB), 0) << file;
+        }
+    }
+    ~HundredWriters()
+    {
+        for (const int file : m_files) {
+            (void)close(file);
+        }
+    }
+    HundredWriters(const HundredWriters&) = delete;
+    HundredWriters& operator=(const HundredWriters&) = delete;
+
+private:
+    std::array<int, 100> m_files{};
+};
+
+TEST_P(SavedNames, StayAsTheyWereBesideAHundredWriters)
+{
+    const RecordingPlatform platform;
+    WriteFile(GetParam().path, "a\n");
+    const HundredWriters writers(GetParam().path);
+    EXPECT_EQ(GetParam().add("b"), 0);
+    EXPECT_EQ(ReadFile(GetParam().path), "a\n");
+}
+
+TEST_P(SavedNames, AreRefusedBesideAHundredWritersWhenThereWasNoFile)
+{
+    const RecordingPlatform platform;
+    const HundredWriters writers(GetParam().path);
+    EXPECT_EQ(GetParam().add("b"), -1);
+    EXPECT_EQ(ReadFile(GetParam().path), std::nullopt);
+}
+
 TEST_P(SavedNames, TakeTheNewFilesModeFromTheUmask)
 {
     const RecordingPlatform platform;

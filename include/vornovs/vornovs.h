@@ -115,6 +115,186 @@ VORNOVS_API int UnRegister(const std::string& name,
  */
 VORNOVS_API void OVSSetDefault();
 
+/* Interfaces and ports. */
+
+/**
+ * Takes one interface, or a bond's slaves, off the switch: its bridge's addressing goes back to the
+ * plain interface, which is started on its own and listed in
+ * "/usr/vorn/etc/vornovs/ovs_ignore.conf". AddInterface() is the way back.
+ * @param bridge  the bridge, such as "ovs_eth0" or "ovs_bond0".
+ * @return  0 done, even when the network script failed (which is logged). Also 0 for a bridge that
+ *            carries neither an interface nor a bond: it is stopped and nothing else happens.
+ *         -1 not a bridge of the switch, and nothing was done; or a later step failed: what was
+ *            done by then stays and the interface's network is not started; or memory ran out.
+ * Lock:   not taken; a conversion in another process is not waited for.
+ * Blocks: until the network script has stopped and started the interfaces. No pause.
+ */
+VORNOVS_API int RemoveInterface(const std::string& bridge);
+
+/**
+ * Puts a plain interface back on the switch and takes it off the list of those left out.
+ * @param name  the interface, such as "eth0", that RemoveInterface() took off.
+ * @return  0 done, even when the network script failed (which is logged).
+ *         -1 the bridge's configuration could not be written, the interface was not on the list, or
+ *            memory ran out: the interface's network was stopped by then and is not started.
+ * Lock:   not taken; a conversion in another process is not waited for.
+ * Blocks: until the network script has stopped and started the interface. No pause.
+ */
+VORNOVS_API int AddInterface(const std::string& name);
+
+/**
+ * Lists the switch's bridges, starting the switch's services when they do not run.
+ * @param out  replaced by the bridges' names; as it was when no client is registered or the
+ *             registrations cannot be read.
+ * @return  0 listed, or no client is registered; -1 the registrations cannot be read, the switch's
+ *          services or tool cannot be started, or memory ran out.
+ * Lock:   not taken; the answer is of the moment.
+ * Blocks: until the services and the switch's tool have answered.
+ */
+VORNOVS_API int ListInterface(std::set<std::string>& out);
+
+/**
+ * Plugs a port into a bridge.
+ * @param bridge  the bridge, such as "ovs_eth0".
+ * @param port    the port's interface, such as "tap0".
+ * @return  1 attached. Also 1, and nothing is attached, when the switch's services do not run and
+ *            cannot be started (which is logged).
+ *          0 no client is registered; nothing was done.
+ *         -1 no lock, the registrations cannot be read, the switch refused, or memory ran out.
+ * Lock:   held for the whole call.
+ * Blocks: until the switch's tool has ended.
+ */
+VORNOVS_API int AttachPort(const std::string& bridge, const std::string& port);
+
+/** Unplugs a port from a bridge: 1 detached; the rest is as for AttachPort(). */
+VORNOVS_API int DetachPort(const std::string& bridge, const std::string& port);
+
+/* Bonds on the switch. */
+
+/**
+ * Builds a bond on the switch from interfaces that are switch bridges already.
+ * @param mode    6 active-backup, 7 balance-slb or 8 balance-tcp; others are refused.
+ * @param name    name of the new bond, such as "ovs_bond0": at most 15 bytes, not in use.
+ *                GetUniqueBondName() finds one.
+ * @param slaves  two or more plain interfaces, such as "eth0"; the first one's addressing becomes
+ *                the bond's. Only read.
+ * @return  0 the parameters were accepted; a later step that failed is only logged.
+ *         -1 no lock, no client registered, or a parameter refused (the first slave's gateway
+ *            may then have been copied to the bond already); or memory ran out.
+ * Lock:   held for the whole call.
+ * Blocks: stops the slaves' network, pauses 3 seconds, starts the bond.
+ */
+VORNOVS_API int OVSBondCreate(VORN_LINK_AGGR_MODE mode, const std::string& name,
+                              std::vector<std::string>& slaves);
+
+/**
+ * Takes a bond on the switch apart: its addressing goes to the first slave's bridge.
+ * @param name  the bond, such as "ovs_bond0".
+ * @param out   receives the bond as it was: name, mode and slaves. On failure it holds what had
+ *              been read by then.
+ * @return  0 removed; a step that failed after the bond's file was read is only logged.
+ *         -1 no lock, no client registered, no record, the bond's file cannot be read or lists
+ *            fewer than two slaves (no file was touched); or memory ran out.
+ * Lock:   held for the whole call.
+ * Blocks: stops the network of bond and slaves, pauses 3 seconds, starts the slaves' bridges.
+ */
+VORNOVS_API int OVSBondRemove(const std::string& name, VORNLINKAGGROPT* out);
+
+/**
+ * Reads a bond.
+ * @param name  the bond, such as "ovs_bond0".
+ * @param out   filled by the platform; not to be null.
+ * @return  0 read; -1 no lock, no client registered, or the bond cannot be read.
+ * Lock:   held for the whole call.
+ * Blocks: no.
+ */
+VORNOVS_API int OVSBondGet(const std::string& name, VORNLINKAGGROPT* out);
+
+/**
+ * Changes a switch bond's mode in its file and on the live switch.
+ * @param mode  6 active-backup, 7 balance-slb or 8 balance-tcp; unchecked, see CheckModeSupport().
+ * @param name  the bond, such as "ovs_bond0".
+ * @return  0 the file was changed, even when the network script failed (which is logged); -1 no
+ *          lock, no client registered, the file could not be changed, or memory ran out.
+ * Lock:   held for the whole call.
+ * Blocks: until the network script has ended.
+ */
+VORNOVS_API int OVSBodChMode(VORN_LINK_AGGR_MODE mode, const std::string& name);
+
+/**
+ * Gives the mode of a name, such as "802.3ad" or "active-backup".
+ * @return  the platform's mode; 0 for an unknown or a null name.
+ * Lock: not taken. Blocks: no.
+ */
+VORNOVS_API VORN_LINK_AGGR_MODE StrToMode(const char* text);
+
+/**
+ * Gives the name of a mode.
+ * @param out  replaced by the name; empty when memory ran out.
+ * Lock: not taken. Blocks: no.
+ */
+VORNOVS_API void ModeToStr(VORN_LINK_AGGR_MODE mode, std::string& out);
+
+/**
+ * Asks whether the switch can run a mode.
+ * @return  true for 6, 7 and 8; false for every other one.
+ * Lock: not taken. Blocks: no.
+ */
+VORNOVS_API bool CheckModeSupport(VORN_LINK_AGGR_MODE mode);
+
+/**
+ * Finds a free name for a new bond: the first of ovs_bond0 to ovs_bond9 that no interface has.
+ * @param out  receives the name; as it was when all ten are in use, so compare it.
+ * @return  0, also when all ten are in use.
+ * Lock:   not taken; the answer is of the moment.
+ * Blocks: no.
+ */
+VORNOVS_API int GetUniqueBondName(std::string& out);
+
+/* VLAN tags of switch ports. */
+
+/**
+ * Reads a port's VLAN tag from the switch.
+ * @param interface  the port, such as "ovs_eth0".
+ * @param out        both names become the port's, cut to 15 bytes; the id is written only when the
+ *                   port is tagged. Not to be null.
+ * @return  1 tagged, 0 untagged, -1 the switch could not be asked or memory ran out.
+ * Lock:   not taken.
+ * Blocks: until the switch's tool has ended.
+ */
+VORNOVS_API int OVSVlanGet(const std::string& interface, _tag_VLIB_VLAN* out);
+
+/**
+ * Sets the tag of a live port without recording it; OVSVlanCreate() does both.
+ * @param id  the VLAN id in decimal, "1" to "4094"; the switch checks it.
+ * @return  0 set; -1 the switch refused or memory ran out.
+ * Lock:   not taken.
+ * Blocks: until the switch's tool has ended.
+ */
+VORNOVS_API int OVSVlanSet(const std::string& interface, const std::string& id);
+
+/**
+ * Clears the tag of a live port but not a recorded one; OVSVlanRemove() does both.
+ * @return  0 cleared; -1 the switch refused.
+ * Lock:   not taken.
+ * Blocks: until the switch's tool has ended.
+ */
+VORNOVS_API int OVSVlanClear(const std::string& interface);
+
+/**
+ * Records a tag in the port's configuration file and sets it on the live port.
+ * @param id  the VLAN id in decimal, "1" to "4094"; the switch checks it.
+ * @return  0 done, even when the file or the switch refused (which is logged); -1 the platform's
+ *          file lock could not be had, or memory ran out.
+ * Lock:   not the configuration lock, but the platform's file lock around the file's edit, for
+ *         which it waits up to 5 seconds.
+ * Blocks: until the switch's tool has ended.
+ */
+VORNOVS_API int OVSVlanCreate(const std::string& interface, const std::string& id);
+
+/** Removes the recorded tag and clears the live port's; the rest is as for OVSVlanCreate(). */
+VORNOVS_API int OVSVlanRemove(const std::string& interface);
+
 /* Daemons, network and interfaces. */
 
 /**
@@ -286,6 +466,35 @@ public:
      * Blocks: until the script has ended.
      */
     static bool BondChMode(VORN_LINK_AGGR_MODE mode, const std::string& name);
+
+    /**
+     * Builds a bond from interfaces that are switch bridges already.
+     * @param slaves   two or more plain interfaces; only read.
+     * @param restart  stop the slaves' network, pause and start the bond around the change.
+     * @return  true the parameters were accepted; a later step that failed is only logged. false a
+     *          parameter was refused (the first slave's gateway may then have been copied to the
+     *          bond already), or memory ran out.
+     * Blocks: with `restart` 3 s and as long as the network script runs.
+     */
+    static bool Create(VORN_LINK_AGGR_MODE mode, const std::string& master,
+                       std::vector<std::string>& slaves, bool restart);
+
+    /**
+     * Gives a bond's configuration to its first slave's bridge and its slaves their own bridges.
+     * @param out      receives the bond as its file has it; null is refused.
+     * @param restart  stop bond and slaves, pause and start the slaves' bridges around the change.
+     * @return  true removed; a step that failed after the file was read is only logged. false the
+     *          file cannot be read or lists fewer than two slaves, or memory ran out.
+     * Blocks: with `restart` 3 s and as long as the network script runs.
+     */
+    static bool Remove(const std::string& name, VORNLINKAGGROPT* out, bool restart);
+
+    /**
+     * Gives the first of ovs_bond0 to ovs_bond9 that no interface has.
+     * @param out  as it was when all ten are in use.
+     * @return  true, always.
+     */
+    static bool GetUniqueName(std::string& out);
 };
 
 /** VLAN tags of switch ports. Takes the platform's file lock, not the configuration lock. */
@@ -354,8 +563,8 @@ public:
 
     /**
      * Converts the whole host to the switch.
-     * @return  true it ran to its end; false the interfaces could not be read, a VLAN could not be
-     *          rebuilt, or memory ran out. What was done by then stays.
+     * @return  true it ran to its end; false the interfaces could not be read, a bond or a VLAN
+     *          could not be rebuilt, or memory ran out. What was done by then stays.
      * Blocks: see Register().
      */
     bool CreateAll();
@@ -366,6 +575,12 @@ public:
     /** Writes the bridge's file from the interface's file. @return 0, -1 failed. */
     int CreateOVSForGeneral(const char* name, const char* bridge, const char* source,
                             const char* target) const;
+
+    /**
+     * Builds the model's bonds on the switch. @return 0, -1 at the first that was refused.
+     * Blocks: 3 s a bond.
+     */
+    int CreateOVSBond();
 
     /** Sets the model's VLANs as tags on the bridges. @return 0, -1 at the first that failed. */
     int CreateOVSVlan() const;
@@ -382,14 +597,21 @@ public:
 
     /**
      * Converts the whole host back to plain Linux networking.
-     * @return  true it ran to its end; false the bridges could not be read, a tag could not be
-     *          removed, a VLAN could not be rebuilt, or memory ran out.
+     * @return  true it ran to its end; false the bridges could not be read, a tag or a bond could
+     *          not be removed, a VLAN could not be rebuilt, or memory ran out.
      * Blocks: see UnRegister().
      */
     bool DeleteAll();
 
     /** Gives the bridge's configuration back to its interface. @return 0, -1 failed. */
     int DestroyOVS(const std::string& bridge) const;
+
+    /**
+     * Takes the model's bonds on the switch apart and puts their slaves' bridges in their place.
+     * @return  0, -1 at the first that failed.
+     * Blocks: 3 s a bond.
+     */
+    int RemoveOVSBond();
 
     /** Removes the tags of the model's VLANs. @return 0, -1 at the first that failed. */
     int RemoveOVSVlan() const;

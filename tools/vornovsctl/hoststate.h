@@ -1,8 +1,10 @@
 /**
- * Who is registered and what is on the switch, as the library tells it.
+ * Who is registered and what is on the switch, as the library and its files tell it.
  */
 #ifndef VORNOVSCTL_HOSTSTATE_H
 #define VORNOVSCTL_HOSTSTATE_H
+
+#include "answer.h"
 
 #include <optional>
 #include <set>
@@ -34,11 +36,26 @@ struct HostState {
 /** @return the registered clients; nothing: they cannot be read. */
 std::optional<Names> ReadClients();
 
+/** @return the interfaces that were taken off the switch one by one; nothing: not known. */
+std::optional<Names> ReadTakenOff();
+
+/** @return the VLAN tag in a port's configuration file; empty: none is recorded there. */
+std::string ReadRecordedTag(const std::string& port);
+
 /** Reads the state; starts nothing. */
 HostState ReadHostState();
 
+/** The state as members of a JSON object. */
+Json StateFields(const HostState& state);
+
 /** The bridge that carries an interface. */
 std::string BridgeOf(const std::string& interface);
+
+/** @return the interface that a bridge carries by its name; empty: it is no such bridge. */
+std::string InterfaceOf(const std::string& bridge);
+
+/** The names, or null when they are not known. */
+Json NamesOrNull(const std::optional<Names>& names);
 
 } // namespace vornovsctl
 

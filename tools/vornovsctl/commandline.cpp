@@ -9,6 +9,7 @@
 
 #include <deque>
 #include <map>
+#include <memory>
 #include <string_view>
 
 namespace vornovsctl {
@@ -58,10 +59,22 @@ bool AsksForJson(int argc, const char* const argv[])
     return false;
 }
 
+// Says "SLAVE..." for an operand of which there can be several.
+class HelpFormatter : public CLI::Formatter {
+public:
+    std::string make_option_usage(const CLI::Option* option) const override
+    {
+        const std::string name =
+            option->get_name(true) + (option->get_expected_max() > 1 ? "..." : "");
+        return option->get_required() ? name : '[' + name + ']';
+    }
+};
+
 class CommandLine {
 public:
     CommandLine()
     {
+        m_app.formatter(std::make_shared<HelpFormatter>());
         m_app.name("vornovsctl");
         m_app.footer(kExitStatus);
         m_app.set_version_flag("--version", "vornovsctl " VORNOVS_VERSION);
@@ -102,6 +115,8 @@ private:
             for (const GroupRow& each : Groups()) {
                 if (std::string_view(each.name) == row.group) {
                     group = m_app.add_subcommand(each.name, each.about)->require_subcommand(1);
+                    group->footer(std::string("'vornovsctl ") + each.name +
+                                  " COMMAND --help' tells more of a command.");
                 }
             }
         }
@@ -118,7 +133,9 @@ private:
             m_values.push_back({&row, &operand, {}});
             sub->add_option(operand.name, m_values.back().values, operand.about)
                 ->required(operand.least > 0)
-                ->expected(static_cast<int>(operand.least), static_cast<int>(operand.most));
+                ->expected(static_cast<int>(operand.least), static_cast<int>(operand.most))
+                ->allow_extra_args(operand.most > 1)
+                ->type_name("");
         }
         sub->add_flag("--json", m_json, "Print one JSON object");
         AddOption(row, *sub);

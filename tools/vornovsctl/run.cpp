@@ -34,7 +34,8 @@ Answer PerformCommand(const ParsedCommand& parsed, std::ostream& output, const T
 Answer AnswerTo(const ParsedCommand& parsed, std::ostream& output, const Terminal& terminal)
 {
     if (parsed.command == nullptr) {
-        return Failed(kWrongUsage, parsed.error + "\nTry 'vornovsctl --help'.", Json::object());
+        return Failed(kWrongUsage, parsed.error + (parsed.json ? "" : "\nTry 'vornovsctl --help'."),
+                      Json::object());
     }
     try {
         return PerformCommand(parsed, output, terminal);

@@ -170,7 +170,8 @@ constexpr char kAboutBondFreeName[] = "Tell the first free name for a bond";
 constexpr char kBondFreeNameMore[] =
     "The first of ovs_bond0 to ovs_bond9 that no interface has.\n"
     "\n"
-    "Example:\n"
+    "Examples:\n"
+    "  vornovsctl bond free-name\n"
     "  vornovsctl bond create \"$(vornovsctl bond free-name)\" ovs-balance-slb eth0 eth1";
 
 constexpr char kAboutBondModes[] = "List the modes of bonds";

@@ -61,7 +61,7 @@ std::optional<Names> ReadTakenOff()
             names.insert(line);
         }
     }
-    return names;
+    return file.bad() ? std::nullopt : std::optional<Names>(names);
 }
 
 std::string ReadRecordedTag(const std::string& port)

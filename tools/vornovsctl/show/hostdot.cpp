@@ -72,7 +72,13 @@ public:
             }
         }
         for (const Device* device : DevicesOnTheirOwn(m_host)) {
-            AddDevice("host", *device, KindWord(*device), "");
+            AddDevice("host", *device, KindWord(*device), {}, "");
+        }
+        for (const std::string& name : TakenOffWithoutDevice(m_host)) {
+            const std::string id = Id("device", name);
+            AddNode(id, Label({"interface " + name, "no device", "taken off the switch"}),
+                    Style(false));
+            AddEdge("host", id, "");
         }
         return m_text + "}\n";
     }
@@ -105,11 +111,12 @@ private:
     static const char* Style(bool works) { return works ? "" : ", style=dashed"; }
 
     void AddDevice(const std::string& from, const Device& device, const std::string& word,
-                   const std::string& edge)
+                   const std::vector<std::string>& remarks, const std::string& edge)
     {
         std::vector<std::string> lines{word + ' ' + device.name};
         const std::vector<std::string> more = LinesOf(device);
         lines.insert(lines.end(), more.begin(), more.end());
+        lines.insert(lines.end(), remarks.begin(), remarks.end());
         if (IsTakenOff(m_host, device.name)) {
             lines.emplace_back("taken off the switch");
         }
@@ -129,7 +136,7 @@ private:
             if (device.bond && device.bond->active == each->name) {
                 edge = "active";
             }
-            AddDevice(from, *each, each->vlan ? "VLAN" : "member", edge);
+            AddDevice(from, *each, each->vlan ? "VLAN" : "member", {}, edge);
         }
     }
 
@@ -160,7 +167,7 @@ private:
         }
         if (!port.bond) {
             for (const Member& member : port.members) {
-                AddMember(bridge, member, edge);
+                AddMember(bridge, port, member, edge);
             }
             return;
         }
@@ -168,19 +175,23 @@ private:
         AddNode(id, Label({"bond " + port.name, Words({port.mode, LacpWords(port)})}));
         AddEdge(bridge, id, edge);
         for (const Member& member : port.members) {
-            AddMember(id, member, member.name == port.active ? "active" : "");
+            AddMember(id, port, member, member.name == port.active ? "active" : "");
         }
     }
 
-    void AddMember(const std::string& from, const Member& member, const std::string& edge)
+    void AddMember(const std::string& from, const Port& port, const Member& member,
+                   const std::string& edge)
     {
         const Device* const device = m_host.Find(member.name);
         if (device != nullptr) {
-            AddDevice(from, *device, "port", edge);
+            AddDevice(from, *device, port.bond ? "member" : "port",
+                      {LacpWords(port, member), member.error}, edge);
             return;
         }
         const std::string id = Id("device", member.name);
-        AddNode(id, Label({"port " + member.name, "no device", member.error}), Style(false));
+        AddNode(id,
+                Label({(port.bond ? "member " : "port ") + member.name, "no device", member.error}),
+                Style(false));
         AddEdge(from, id, edge);
     }
 

@@ -167,9 +167,7 @@ private:
             if (member.name == port.active) {
                 AddPiece(child, "active");
             }
-            if (port.lacp != "off" && port.IsNegotiated() && !member.negotiated) {
-                AddPiece(child, "LACP without partner", Tone::kBad);
-            }
+            AddPiece(child, LacpWords(port, member), Tone::kBad);
             AddPiece(child, member.error.empty() ? "" : "(" + member.error + ")", Tone::kBad);
             node.children.push_back(child);
         }
@@ -178,17 +176,12 @@ private:
 
     void AddMissing(TreeNode& root) const
     {
-        if (!m_host.takenOff) {
-            return;
-        }
-        for (const std::string& name : *m_host.takenOff) {
-            if (m_host.Find(name) == nullptr) {
-                root.children.push_back({{{"interface"},
-                                          {name, Tone::kName},
-                                          {"no device", Tone::kBad},
-                                          {"taken off the switch"}},
-                                         {}});
-            }
+        for (const std::string& name : TakenOffWithoutDevice(m_host)) {
+            root.children.push_back({{{"interface"},
+                                      {name, Tone::kName},
+                                      {"no device", Tone::kBad},
+                                      {"taken off the switch"}},
+                                     {}});
         }
     }
 

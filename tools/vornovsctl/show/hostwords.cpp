@@ -14,7 +14,7 @@ std::string LinkWord(const Device& device)
 
 std::string SpeedWord(const Device& device)
 {
-    if (!device.speed || !device.carrier) {
+    if (!device.speed || !device.up || !device.carrier) {
         return "";
     }
     return *device.speed % 1000 == 0 && *device.speed >= 10000
@@ -112,6 +112,23 @@ std::vector<const Device*> DevicesOn(const HostModel& host, const std::string& d
         }
     }
     return devices;
+}
+
+std::vector<std::string> TakenOffWithoutDevice(const HostModel& host)
+{
+    std::vector<std::string> missing;
+    for (const std::string& name : host.takenOff.value_or(Names())) {
+        if (host.Find(name) == nullptr) {
+            missing.push_back(name);
+        }
+    }
+    return missing;
+}
+
+std::string LacpWords(const Port& port, const Member& member)
+{
+    const bool alone = port.bond && port.lacp != "off" && port.IsNegotiated();
+    return alone && !member.negotiated ? "LACP without partner" : "";
 }
 
 bool IsTakenOff(const HostModel& host, const std::string& device)

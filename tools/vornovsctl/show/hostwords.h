@@ -30,6 +30,9 @@ std::string VlanWords(int vlan);
 std::string LacpWords(const Port& port);
 std::string LacpWords(const LinuxBond& bond);
 
+/** The same of one member, where it differs from the bond's. */
+std::string LacpWords(const Port& port, const Member& member);
+
 /** The clients' names, or why there are none. */
 std::string ClientWords(const HostModel& host);
 
@@ -41,6 +44,9 @@ std::vector<const Device*> DevicesOnTheirOwn(const HostModel& host);
 
 /** The devices that belong to one: a bond's and a bridge's members, and VLANs. */
 std::vector<const Device*> DevicesOn(const HostModel& host, const std::string& device);
+
+/** Those that were taken off the switch by themselves and are not there. */
+std::vector<std::string> TakenOffWithoutDevice(const HostModel& host);
 
 /** Whether the interface was taken off the switch by itself. */
 bool IsTakenOff(const HostModel& host, const std::string& device);

@@ -5,6 +5,7 @@
 #include <support/switchdatabase.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <chrono>
 #include <map>
 #include <unistd.h>
@@ -162,7 +163,7 @@ std::optional<std::vector<Bridge>> ParseSwitch(std::string_view reply)
 SwitchAnswer AskSwitch()
 {
     SwitchAnswer answer;
-    if (access(kSocket, F_OK) == 0 && access(kSocket, R_OK | W_OK) != 0) {
+    if (access(kSocket, R_OK | W_OK) != 0 && errno == EACCES) {
         answer.fault = "the switch can only be asked by root";
         return answer;
     }

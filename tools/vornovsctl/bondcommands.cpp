@@ -12,6 +12,7 @@ namespace {
 
 using VORN::OVS::IsInterfaceExist;
 
+constexpr std::size_t kModeColumn = 18; // wider than the longest name
 constexpr char kAdvice[] = "See the system log for the reason, and run '/etc/rc.network start' to "
                            "bring the network up as its files have it.";
 
@@ -209,9 +210,12 @@ Answer ListBondModes(const Context& /*context*/)
         for (const VORN_LINK_AGGR_MODE mode : Modes(ofTheSwitch)) {
             const std::string name = ModeText(mode);
             const std::string other = ModeText(VORN::OVS::BondManager::DefaultModeConvert(mode));
-            text += (ofTheSwitch ? "switch  " : "Linux   ") + name +
-                    std::string(name.size() < 18 ? 18 - name.size() : 1, ' ') + "becomes " + other +
-                    '\n';
+            text.append(ofTheSwitch ? "switch  " : "Linux   ")
+                .append(name)
+                .append(name.size() < kModeColumn ? kModeColumn - name.size() : 1, ' ')
+                .append("becomes ")
+                .append(other)
+                .append("\n");
             fields["modes"].push_back({{"name", name},
                                        {"number", static_cast<int>(mode)},
                                        {"on", ofTheSwitch ? "switch" : "linux"},

@@ -49,7 +49,7 @@ std::string ClientFault(const std::string& name)
 
 std::string InterfaceFault(const std::string& name)
 {
-    const std::string fault = NameFault(name, kLongestInterfaceName);
+    std::string fault = NameFault(name, kLongestInterfaceName);
     if (!fault.empty()) {
         return fault;
     }
@@ -64,7 +64,7 @@ std::string InterfaceFault(const std::string& name)
 
 std::string PlainInterfaceFault(const std::string& name)
 {
-    const std::string fault = InterfaceFault(name);
+    std::string fault = InterfaceFault(name);
     if (fault.empty() && name.size() + kBridgePrefixSize > kLongestInterfaceName) {
         return "is longer than 11 characters, which leaves no room for its bridge's";
     }

@@ -173,7 +173,7 @@ private:
                 m_arguments.operands[each.operand->name] = each.values;
             }
         }
-        if (m_arguments.operands.count("SLAVE") > 0) {
+        if (m_arguments.operands.contains("SLAVE")) {
             Refuse("the interfaces", SlavesFault(m_arguments.All("SLAVE")));
         }
         for (const std::string& text : m_bondModes) {

@@ -21,7 +21,7 @@ struct HostState {
 
     bool IsRegistered(const std::string& client) const
     {
-        return clients && clients->count(client) > 0;
+        return clients && clients->contains(client);
     }
     bool HasClients() const { return clients && !clients->empty(); }
     bool HasInterfaces() const { return interfaces && !interfaces->empty(); }

@@ -91,7 +91,7 @@ std::string ReasonNotToAdd(const Pair& pair)
         return "there is no interface " + Quoted(pair.interface) + ".";
     }
     const auto takenOff = ReadTakenOff();
-    if (takenOff && takenOff->count(pair.interface) == 0) {
+    if (takenOff && !takenOff->contains(pair.interface)) {
         return Quoted(pair.interface) +
                " was not taken off the switch with 'interface remove', so it cannot be put back; "
                "nothing was changed.";

@@ -133,7 +133,7 @@ std::string LacpWords(const Port& port, const Member& member)
 
 bool IsTakenOff(const HostModel& host, const std::string& device)
 {
-    return host.takenOff && host.takenOff->count(device) > 0;
+    return host.takenOff && host.takenOff->contains(device);
 }
 
 } // namespace vornovsctl

@@ -69,8 +69,8 @@ Device DeviceOf(const vornhost::Link& link, const NamesByIndex& names,
     device.mtu = link.mtu;
     device.up = link.up;
     device.carrier = link.carrier;
-    device.onTheSwitch = link.kind == "openvswitch" || datapaths.count(link.master) > 0;
-    if (datapaths.count(link.master) == 0) {
+    device.onTheSwitch = link.kind == "openvswitch" || datapaths.contains(link.master);
+    if (!datapaths.contains(link.master)) {
         device.master = NameOfIndex(names, link.master);
     }
     if (link.kind == "vlan") { // for others the index may be one of another network namespace

@@ -174,11 +174,11 @@ Answer RemoveInterface(const Context& context)
     const Names takenOff = Added(before, ReadTakenOff());
     const Json fields = RemovalFields(pair, takenOff);
 
-    if (!IsInterfaceExist(pair.bridge) && result == 0 && wasThere) {
-        return ReportRemoved(pair, takenOff);
-    }
     if (!wasThere && takenOff.empty()) {
         return ReportNotOnTheSwitch(pair);
+    }
+    if (result == 0 && !IsInterfaceExist(pair.bridge)) {
+        return ReportRemoved(pair, takenOff);
     }
     if (result == 0) {
         return Failed(kOutOfStep,

@@ -205,6 +205,23 @@ TEST_F(Interface, RemoveTellsEachInterfaceOfABond)
 )"));
 }
 
+TEST_F(Interface, RemoveTakesOffWhatIsOnTheSwitchByItsFilesOnly)
+{
+    PutOnTheSwitch({"lab"});
+    Host().devices.erase("ovs_eth1");
+    Host().act = LoseEth1;
+
+    EXPECT_EQ(Ctl({"interface", "remove", "eth1"}).exitStatus, 0);
+}
+
+TEST_F(Interface, RemoveDoesNotTakeASuccessWithoutAnyEffectForOne)
+{
+    TakeOffEth1();
+
+    EXPECT_EQ(Ctl({"interface", "remove", "eth1"}),
+              Failed(5, "'eth1' is not on the switch; nothing was changed."));
+}
+
 TEST_F(Interface, RemoveTellsWhenTheBridgeIsStillThere)
 {
     PutOnTheSwitch({"lab"});

@@ -72,6 +72,18 @@ TEST(ParseSwitch, TakesEverythingFromARecordedReply)
     EXPECT_EQ(ParseSwitch(RecordedReply()), expected);
 }
 
+TEST(ParseSwitch, KnowsOfOneActiveMemberOnlyWhereTheOthersWait)
+{
+    std::string reply = RecordedReply();
+    const std::string mode = "\"active-backup\"";
+    reply.replace(reply.find(mode), mode.size(), "\"balance-slb\"");
+
+    const auto bridges = ParseSwitch(reply);
+    ASSERT_TRUE(bridges);
+    EXPECT_EQ(bridges->at(2).ports.at(0).mode, "balance-slb");
+    EXPECT_EQ(bridges->at(2).ports.at(0).active, "");
+}
+
 TEST(ParseSwitch, RefusesWhatIsNoReply)
 {
     for (const char* const text :

@@ -61,6 +61,14 @@ TEST(DrawTree, ContinuesLongLinesBelow)
                                                         "       defghij\n");
 }
 
+TEST(DrawTree, FillsALineToItsEndAndNoFurther)
+{
+    const TreeNode tree{{{"1234"}, {"67"}}, {}};
+
+    EXPECT_EQ(DrawTree(tree, Terminal{true, false, 7}), "1234 67\n");
+    EXPECT_EQ(DrawTree(tree, Terminal{true, false, 6}), "1234\n    67\n");
+}
+
 TEST(Printable, KeepsWhatCanBeShown)
 {
     EXPECT_EQ(Printable("eth0 a-b\\c", false), "eth0 a-b\\c");

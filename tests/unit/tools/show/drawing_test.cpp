@@ -131,6 +131,25 @@ TEST(TreeOf, DrawsAVlanThatIsAPortOfABridgeOfItsOwn)
     EXPECT_EQ(DotFault(DotOf(host)), "");
 }
 
+TEST(TreeOf, DrawsAMemberWithItsBridgeAlone)
+{
+    HostModel host = PlainHost();
+    host.devices[1].master = "br0";
+    host.devices[1].addresses.clear();
+    host.devices[1].routes.clear();
+
+    EXPECT_THAT(Tree(host), testing::EndsWith(R"(
+├─ Linux bond bond0 up 2000 Mbit/s 802.3ad LACP negotiated 52:54:00:00:00:01
+│  ├─ member eth1 up 1000 Mbit/s 52:54:00:00:00:01
+│  └─ member eth2 up 1000 Mbit/s 52:54:00:00:00:02
+├─ Linux bond bond1 up 1000 Mbit/s active-backup 52:54:00:00:00:04
+│  └─ member eth3 up 1000 Mbit/s 52:54:00:00:00:03 active
+└─ Linux bridge br0 down 52:54:00:00:00:05
+   ├─ VLAN bond0.10 id 10 up 52:54:00:00:00:01
+   └─ member eth4 up 1000 Mbit/s 52:54:00:00:00:04
+)"));
+}
+
 TEST(DotOf, DrawsAHostOnTheSwitch)
 {
     EXPECT_EQ(DotOf(SampleHost()), Recorded("samplehost.dot"));

@@ -64,6 +64,11 @@ std::optional<Names> ReadTakenOff()
     return file.bad() ? std::nullopt : std::optional<Names>(names);
 }
 
+void ForgetTakenOff(const std::string& interface)
+{
+    (void)VORN::OVS::OVSIfsConf(kTakenOffPath).Remove(interface);
+}
+
 std::string ReadRecordedTag(const std::string& port)
 {
     const auto file = vornhost::KeyValueFile::Load(kInterfaceFilePrefix + port);
@@ -78,6 +83,12 @@ HostState ReadHostState()
     state.switchRuns = VORN::OVS::IsDaemonAlive();
     if (state.switchRuns) {
         state.interfaces = ReadInterfaces();
+    }
+    state.takenOff = ReadTakenOff();
+    if (state.takenOff) {
+        for (const std::string& interface : state.interfaces.value_or(Names())) {
+            state.takenOff->erase(interface);
+        }
     }
     return state;
 }
@@ -94,6 +105,7 @@ Json StateFields(const HostState& state)
             fields["interfaces"].push_back({{"name", interface}, {"bridge", BridgeOf(interface)}});
         }
     }
+    fields["takenOff"] = NamesOrNull(state.takenOff);
     fields["consistent"] = state.IsConsistent();
     return fields;
 }

@@ -18,6 +18,7 @@ struct HostState {
     std::optional<Names> clients; /**< nothing: the registrations cannot be read */
     bool switchRuns = false;
     std::optional<Names> interfaces; /**< plain names of those on the switch; nothing: not known */
+    std::optional<Names> takenOff;   /**< those taken off it one by one; nothing: not known */
 
     bool IsRegistered(const std::string& client) const
     {
@@ -26,18 +27,32 @@ struct HostState {
     bool HasClients() const { return clients && !clients->empty(); }
     bool HasInterfaces() const { return interfaces && !interfaces->empty(); }
 
+    /** Whether the switch is empty because everything was taken off it. */
+    bool IsEmptied() const
+    {
+        return interfaces && interfaces->empty() && takenOff && !takenOff->empty();
+    }
+
     /** Interfaces are on the switch exactly while clients are registered. */
     bool IsConsistent() const
     {
-        return clients && HasClients() == HasInterfaces() && (switchRuns || !HasClients());
+        const bool fits = HasClients() == HasInterfaces() || (HasClients() && IsEmptied());
+        return clients && fits && (switchRuns || !HasClients());
     }
 };
 
 /** @return the registered clients; nothing: they cannot be read. */
 std::optional<Names> ReadClients();
 
-/** @return the interfaces that were taken off the switch one by one; nothing: not known. */
+/**
+ * Reads the list of the interfaces that were taken off the switch one by one. The library leaves
+ * those in it that have come back with all the others.
+ * @return  nothing: it cannot be read.
+ */
 std::optional<Names> ReadTakenOff();
+
+/** Takes an interface off that list. */
+void ForgetTakenOff(const std::string& interface);
 
 /** @return the VLAN tag in a port's configuration file; empty: none is recorded there. */
 std::string ReadRecordedTag(const std::string& port);

@@ -1,5 +1,6 @@
 #include "commands.h"
 #include "hoststate.h"
+#include "show/switchreader.h"
 #include "wording.h"
 
 #include <vornovs/vornovs.h>
@@ -49,6 +50,26 @@ Json RemovalFields(const Pair& pair, const Names& takenOff)
     Json fields = PairFields(pair);
     fields["takenOff"] = takenOff;
     return fields;
+}
+
+// The library fails half-way for an interface that is listed as taken off already. One that the
+// bridge reaches the wire through is listed from an earlier time.
+void ForgetWhatCameBack(const std::string& bridge)
+{
+    const auto takenOff = ReadTakenOff();
+    const SwitchAnswer answer = AskSwitch();
+    if (!takenOff || takenOff->empty() || !answer.bridges) {
+        return;
+    }
+    for (const Bridge& each : *answer.bridges) {
+        for (const Port& port : each.ports) {
+            for (const Member& member : port.members) {
+                if (each.name == bridge && port.wire && takenOff->contains(member.name)) {
+                    ForgetTakenOff(member.name);
+                }
+            }
+        }
+    }
 }
 
 Answer ReportNotOnTheSwitch(const Pair& pair)
@@ -130,6 +151,9 @@ Answer ListInterfaces(const Context& /*context*/)
     if (clients && clients->empty()) {
         return Done("No client is registered, so nothing is on the switch.\n", fields);
     }
+    if (ReadHostState().IsEmptied()) {
+        return Done("Every interface was taken off the switch.\n", fields);
+    }
     // A switch that does not answer lists nothing as well.
     return Failed(kOutOfStep,
                   "clients are registered, but the switch lists no bridge: run "
@@ -169,6 +193,7 @@ Answer RemoveInterface(const Context& context)
 {
     const Pair pair(context.arguments.Get("INTERFACE"));
     const bool wasThere = IsInterfaceExist(pair.bridge);
+    ForgetWhatCameBack(pair.bridge);
     const auto before = ReadTakenOff();
     const int result = VORN::OVS::RemoveInterface(pair.bridge);
     const Names takenOff = Added(before, ReadTakenOff());

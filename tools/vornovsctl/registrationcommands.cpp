@@ -28,6 +28,11 @@ Answer ReportRegistered(const std::string& client, const HostState& after)
                         ".\n",
                     fields);
     }
+    if (after.IsConsistent()) {
+        return Done(Quoted(client) + " is registered. Every interface was taken off the switch: " +
+                        List(*after.takenOff) + ".\n",
+                    fields);
+    }
     return Failed(
         kOutOfStep,
         Quoted(client) + " is registered, but " +
@@ -105,6 +110,17 @@ std::string InterfacesText(const HostState& state)
     return texts.empty() ? "none" : List(texts);
 }
 
+std::string TakenOffText(const HostState& state)
+{
+    if (!state.takenOff) {
+        return "Taken off:   cannot be read\n";
+    }
+    // While nobody is registered, every interface is off the switch.
+    return state.HasClients() && !state.takenOff->empty()
+               ? "Taken off:   " + List(*state.takenOff) + '\n'
+               : "";
+}
+
 std::string StatusText(const HostState& state)
 {
     std::string clients = "cannot be read";
@@ -113,7 +129,7 @@ std::string StatusText(const HostState& state)
     }
     return "Clients:     " + clients +
            "\nSwitch:      " + (state.switchRuns ? "running" : "not running") +
-           "\nInterfaces:  " + InterfacesText(state) + '\n';
+           "\nInterfaces:  " + InterfacesText(state) + '\n' + TakenOffText(state);
 }
 
 } // namespace

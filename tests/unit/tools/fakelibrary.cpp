@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <array>
 #include <csignal>
+#include <fstream>
 #include <sys/syscall.h>
 #include <unistd.h>
 
@@ -280,6 +281,25 @@ int OVSRegConf::GetRegNames(std::set<std::string>& out)
 {
     out.insert(m_names.begin(), m_names.end());
     return static_cast<int>(out.size());
+}
+
+OVSIfsConf::OVSIfsConf(std::string path) : m_path(std::move(path)) {}
+OVSIfsConf::~OVSIfsConf() = default;
+
+// Of this list the command line reads the file itself.
+int OVSIfsConf::Remove(const std::string& name)
+{
+    Host().calls.push_back("OVSIfsConf::Remove " + name);
+    std::ifstream file(m_path);
+    for (std::string line; std::getline(file, line);) {
+        m_names.insert(line);
+    }
+    m_names.erase(name);
+    std::ofstream changed(m_path);
+    for (const std::string& each : m_names) {
+        changed << each << '\n';
+    }
+    return 0;
 }
 
 OVSManager::OVSManager() = default;

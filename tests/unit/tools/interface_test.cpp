@@ -222,6 +222,16 @@ TEST_F(Interface, RemoveDoesNotTakeASuccessWithoutAnyEffectForOne)
               Failed(5, "'eth1' is not on the switch; nothing was changed."));
 }
 
+TEST_F(Interface, RemoveForgetsAnEarlierRemovalThatWouldStandInItsWay)
+{
+    PutOnTheSwitch({"lab"});
+    WriteTakenOff("eth0\neth1\n");
+    Host().act = LoseEth1;
+
+    EXPECT_EQ(Ctl({"interface", "remove", "eth1"}).exitStatus, 0);
+    EXPECT_THAT(Host().calls, ElementsAre("OVSIfsConf::Remove eth1", "RemoveInterface ovs_eth1"));
+}
+
 TEST_F(Interface, RemoveTellsWhenTheBridgeIsStillThere)
 {
     PutOnTheSwitch({"lab"});

@@ -30,6 +30,7 @@ TEST_F(Status, StatusOfAHostThatNeverHadAClientStartsNothing)
   "clients": [],
   "switchRunning": false,
   "interfaces": null,
+  "takenOff": [],
   "consistent": true,
   "error": null
 }
@@ -65,6 +66,7 @@ TEST_F(Status, StatusOfAHostOnTheSwitchTellsClientsAndInterfaces)
       "bridge": "ovs_eth1"
     }
   ],
+  "takenOff": [],
   "consistent": true,
   "error": null
 }
@@ -126,6 +128,7 @@ TEST_F(Status, StatusFailsWhenTheRegistrationsCannotBeRead)
   "clients": null,
   "switchRunning": false,
   "interfaces": null,
+  "takenOff": [],
   "consistent": false,
   "error": "the registrations cannot be read: see the system log."
 }
@@ -137,6 +140,47 @@ TEST_F(Status, StatusPrintsJsonWhateverBytesAreInAName)
     PutOnTheSwitch({"\xff\"x"});
 
     EXPECT_THAT(Ctl({"status", "--json"}).output, HasSubstr("\"\xef\xbf\xbd\\\"x\""));
+}
+
+TEST_F(Status, TellsWhatWasTakenOffTheSwitch)
+{
+    PutOnTheSwitch({"lab"});
+    WriteTakenOff("eth1\neth7\n"); // eth1 has come back since
+
+    EXPECT_EQ(Ctl({"status"}), (Outcome{0,
+                                        "Clients:     lab\n"
+                                        "Switch:      running\n"
+                                        "Interfaces:  eth0 (ovs_eth0), eth1 (ovs_eth1)\n"
+                                        "Taken off:   eth7\n",
+                                        ""}));
+    Host().clients->clear();
+    Host().bridges->clear();
+    EXPECT_EQ(Ctl({"status"}), (Outcome{0,
+                                        "Clients:     none\n"
+                                        "Switch:      running\n"
+                                        "Interfaces:  none\n",
+                                        ""}));
+}
+
+TEST_F(Status, IsConsistentWhenEveryInterfaceWasTakenOff)
+{
+    PutOnTheSwitch({"lab"});
+    Host().bridges->clear();
+    WriteTakenOff("eth0\neth1\n");
+
+    EXPECT_EQ(Ctl({"status"}), (Outcome{0,
+                                        "Clients:     lab\n"
+                                        "Switch:      running\n"
+                                        "Interfaces:  none\n"
+                                        "Taken off:   eth0, eth1\n",
+                                        ""}));
+    EXPECT_EQ(Ctl({"interface", "list"}),
+              unit::Done("Every interface was taken off the switch.\n"));
+    EXPECT_EQ(Ctl({"register", "vms"}).exitStatus, 1) << "which the fake does not record";
+    Host().clients->insert("vms");
+    EXPECT_EQ(Ctl({"register", "vms"}),
+              unit::Done("'vms' is registered. Every interface was taken off the switch: eth0, "
+                         "eth1.\n"));
 }
 
 } // namespace

@@ -133,7 +133,7 @@ std::string LacpWords(const Port& port, const Member& member)
 
 bool IsTakenOff(const HostModel& host, const std::string& device)
 {
-    return host.takenOff && host.takenOff->contains(device);
+    return host.takenOff && host.takenOff->contains(device) && !host.IsDrawnWithTheSwitch(device);
 }
 
 } // namespace vornovsctl

@@ -150,6 +150,16 @@ TEST(TreeOf, DrawsAMemberWithItsBridgeAlone)
 )"));
 }
 
+TEST(TreeOf, DoesNotCallAnInterfaceTakenOffThatHasComeBack)
+{
+    HostModel host = SampleHost();
+    const std::string before = Tree(host);
+    host.takenOff->insert({"eth0", "eth1"});
+
+    EXPECT_EQ(Tree(host), before);
+    EXPECT_EQ(DotOf(host), DotOf(SampleHost()));
+}
+
 TEST(DotOf, DrawsAHostOnTheSwitch)
 {
     EXPECT_EQ(DotOf(SampleHost()), Recorded("samplehost.dot"));

@@ -37,11 +37,13 @@ Outcome WrongUsage(const std::string& message);
 
 /** A host of its own for each test, asked by root. Nobody is registered on it. */
 class OnAHost : public testing::Test {
+public:
+    OnAHost(const OnAHost&) = delete;
+    OnAHost& operator=(const OnAHost&) = delete;
+
 protected:
     OnAHost();
     ~OnAHost() override;
-    OnAHost(const OnAHost&) = delete;
-    OnAHost& operator=(const OnAHost&) = delete;
 
     /** Registers clients and puts eth0 and eth1 on the switch. */
     static void PutOnTheSwitch(std::set<std::string> clients);

@@ -7,13 +7,10 @@
 namespace {
 
 using testing::ElementsAre;
-using testing::HasSubstr;
 using unit::Ctl;
 using unit::FakeHost;
 using unit::Host;
 using unit::Outcome;
-using unit::PlayUser;
-using unit::WrongUsage;
 
 constexpr char kFirstClient[] = "Registering 'lab': it is the first client, so the host's wired "
                                 "interfaces go on to the switch.\n";

@@ -9,11 +9,8 @@ namespace {
 using testing::ElementsAre;
 using testing::HasSubstr;
 using unit::Ctl;
-using unit::FakeHost;
 using unit::Host;
 using unit::Outcome;
-using unit::PlayUser;
-using unit::WrongUsage;
 
 using Status = unit::OnAHost;
 

@@ -58,6 +58,7 @@ vornhost::Route MakeDefault(int family, int index, const std::string& gateway)
 std::vector<std::string> NamesOf(const std::vector<Device>& devices)
 {
     std::vector<std::string> names;
+    names.reserve(devices.size());
     for (const Device& device : devices) {
         names.push_back(device.name);
     }

@@ -71,30 +71,30 @@ TEST(DrawTree, FillsALineToItsEndAndNoFurther)
 
 TEST(Printable, KeepsWhatCanBeShown)
 {
-    EXPECT_EQ(Printable("eth0 a-b\\c", false), "eth0 a-b\\c");
+    EXPECT_EQ(Printable(R"(eth0 a-b\c)", false), R"(eth0 a-b\c)");
     EXPECT_EQ(Printable("\xc3\xa4\xe2\x82\xac\xf0\x9f\x98\x80", true),
               "\xc3\xa4\xe2\x82\xac\xf0\x9f\x98\x80");
 }
 
 TEST(Printable, EscapesWhatCannot)
 {
-    EXPECT_EQ(Printable("a\nb\x1b[1m\x7f", true), "a\\x0ab\\x1b[1m\\x7f");
-    EXPECT_EQ(Printable("\xc3\xa4", false), "\\xc3\\xa4");
+    EXPECT_EQ(Printable("a\nb\x1b[1m\x7f", true), R"(a\x0ab\x1b[1m\x7f)");
+    EXPECT_EQ(Printable("\xc3\xa4", false), R"(\xc3\xa4)");
     struct Row {
         const char* what;
         std::string bytes;
         std::string shown;
     };
     const Row rows[] = {
-        {"a lone continuation", "\x80", "\\x80"},
-        {"an overlong form of two", "\xc0\xaf", "\\xc0\\xaf"},
-        {"an overlong form of three", "\xe0\x80\xaf", "\\xe0\\x80\\xaf"},
-        {"an overlong form of four", "\xf0\x80\x80\xaf", "\\xf0\\x80\\x80\\xaf"},
-        {"a surrogate", "\xed\xa0\x80", "\\xed\\xa0\\x80"},
-        {"beyond the last character", "\xf4\x90\x80\x80", "\\xf4\\x90\\x80\\x80"},
-        {"cut off", "\xe2\x82", "\\xe2\\x82"},
-        {"interrupted", "\xe2\x82z", "\\xe2\\x82z"},
-        {"a control character above ASCII", "\xc2\x9b", "\\xc2\\x9b"},
+        {"a lone continuation", "\x80", R"(\x80)"},
+        {"an overlong form of two", "\xc0\xaf", R"(\xc0\xaf)"},
+        {"an overlong form of three", "\xe0\x80\xaf", R"(\xe0\x80\xaf)"},
+        {"an overlong form of four", "\xf0\x80\x80\xaf", R"(\xf0\x80\x80\xaf)"},
+        {"a surrogate", "\xed\xa0\x80", R"(\xed\xa0\x80)"},
+        {"beyond the last character", "\xf4\x90\x80\x80", R"(\xf4\x90\x80\x80)"},
+        {"cut off", "\xe2\x82", R"(\xe2\x82)"},
+        {"interrupted", "\xe2\x82z", R"(\xe2\x82z)"},
+        {"a control character above ASCII", "\xc2\x9b", R"(\xc2\x9b)"},
     };
     for (const Row& row : rows) {
         EXPECT_EQ(Printable(row.bytes, true), row.shown) << row.what;

@@ -215,6 +215,8 @@ TEST_F(Registration, UnregisterTellsWhatAFailedConversionBackLeftOnTheSwitch)
 
 TEST_F(Registration, ConversionsCannotBeInterruptedAndStatusCan)
 {
+    // A shell starts what runs in the background with SIGINT ignored.
+    ASSERT_NE(std::signal(SIGINT, SIG_DFL), SIG_ERR);
     Host().act = Convert;
     (void)Ctl({"register", "lab"});
     EXPECT_FALSE(Host().interruptible);

@@ -1,58 +1,34 @@
 #include "commandline.h"
 
+#include "checks.h"
 #include "help.h"
+#include "wording.h"
 
 #include <CLI/CLI.hpp>
 #include <vornovs/vornovs.h>
 
-#include <algorithm>
-#include <vector>
+#include <deque>
+#include <map>
+#include <memory>
+#include <string_view>
 
 namespace vornovsctl {
 
 namespace {
 
-using VORN::OVS::BondManager;
-
-constexpr std::size_t kLongestInterfaceName = 15;
-constexpr std::size_t kLongestClientName = 255;
-
-// What stands in a file of lines, in paths and among options has to stay what it is.
-std::string WhatIsWrongWith(const std::string& name, std::size_t longest)
+void Refuse(const std::string& subject, const std::string& fault)
 {
-    if (name.empty()) {
-        return "is empty";
-    }
-    if (name.size() > longest) {
-        return "is longer than " + std::to_string(longest) + " characters";
-    }
-    if (name.front() == '-') {
-        return "begins with '-'";
-    }
-    if (std::any_of(name.begin(), name.end(), [](char each) {
-            const auto byte = static_cast<unsigned char>(each);
-            return byte < 0x20 || byte == 0x7f;
-        })) {
-        return "holds a line break or another control character";
-    }
-    return name.find('/') == std::string::npos ? "" : "holds a slash";
-}
-
-void CheckClient(const std::string& name)
-{
-    const std::string fault = WhatIsWrongWith(name, kLongestClientName);
     if (!fault.empty()) {
-        throw CLI::ValidationError("the client's name " + fault);
+        throw CLI::ValidationError(subject + ' ' + fault);
     }
 }
 
-bool IsModeFor(Verb verb, VORN_LINK_AGGR_MODE mode)
+bool IsModeFor(bool ofTheSwitch, VORN_LINK_AGGR_MODE mode)
 {
-    return mode > VORN_LINK_AGGR_NONE &&
-           BondManager::CheckModeSupport(mode) == (verb == Verb::kRegister);
+    return mode > VORN_LINK_AGGR_NONE && VORN::OVS::CheckModeSupport(mode) == ofTheSwitch;
 }
 
-void AddBondMode(const std::string& text, Command& command)
+void AddBondMode(const std::string& text, bool ofTheSwitch, Arguments& arguments)
 {
     const std::size_t sign = text.find('=');
     if (sign == std::string::npos) {
@@ -61,45 +37,63 @@ void AddBondMode(const std::string& text, Command& command)
 
     const std::string bond = text.substr(0, sign);
     const std::string mode = text.substr(sign + 1);
-    std::string fault = WhatIsWrongWith(bond, kLongestInterfaceName);
-    if (fault.empty() && bond.find_first_of(" :") != std::string::npos) {
-        fault = "holds a blank or a colon";
+    Refuse("the bond's name", InterfaceFault(bond));
+    if (!IsModeFor(ofTheSwitch, ModeOf(mode))) {
+        throw CLI::ValidationError(Quoted(mode) + " is no bond mode of " +
+                                   (ofTheSwitch ? "the switch" : "Linux"));
     }
-    if (!fault.empty()) {
-        throw CLI::ValidationError("the bond's name " + fault);
-    }
-    if (!IsModeFor(command.verb, BondManager::StrToMode(mode))) {
-        throw CLI::ValidationError("'" + mode + "' is no bond mode of " +
-                                   (command.verb == Verb::kRegister ? "the switch" : "Linux"));
-    }
-    if (!command.bondModes.emplace(bond, mode).second) {
-        throw CLI::ValidationError("bond '" + bond + "' has two modes");
+    if (!arguments.bondModes.emplace(bond, mode).second) {
+        throw CLI::ValidationError("bond " + Quoted(bond) + " has two modes");
     }
 }
+
+// Asked before anything else is known of the command line, since the answer to a wrong one is JSON
+// as well.
+bool AsksForJson(int argc, const char* const argv[])
+{
+    for (int index = 1; index < argc && std::string_view(argv[index]) != "--"; ++index) {
+        if (std::string_view(argv[index]) == "--json") {
+            return true;
+        }
+    }
+    return false;
+}
+
+// Says "SLAVE..." for an operand of which there can be several.
+class HelpFormatter : public CLI::Formatter {
+public:
+    std::string make_option_usage(const CLI::Option* option) const override
+    {
+        const std::string name =
+            option->get_name(true) + (option->get_expected_max() > 1 ? "..." : "");
+        return option->get_required() ? name : '[' + name + ']';
+    }
+};
 
 class CommandLine {
 public:
     CommandLine()
     {
+        m_app.formatter(std::make_shared<HelpFormatter>());
         m_app.name("vornovsctl");
         m_app.footer(kExitStatus);
         m_app.set_version_flag("--version", "vornovsctl " VORNOVS_VERSION);
         m_app.require_subcommand(1);
-        AddClientVerb("register", kAboutRegister, kRegisterMore, Verb::kRegister);
-        AddClientVerb("unregister", kAboutUnregister, kUnregisterMore, Verb::kUnregister);
-        AddVerb("status", kAboutStatus, kStatusMore, Verb::kStatus)
-            ->add_flag("--json", m_command.json, "Print one JSON object");
-        AddVerb("reset", kAboutReset, kResetMore, Verb::kReset)
-            ->add_flag("--yes", m_command.yes, "Say that this is really meant");
+        for (const CommandRow& row : Commands()) {
+            AddCommand(row);
+        }
     }
 
     ParsedCommand Parse(int argc, const char* const argv[])
     {
         ParsedCommand parsed;
+        parsed.json = AsksForJson(argc, argv);
         try {
             m_app.parse(argc, argv);
             Check();
             parsed.command = m_command;
+            parsed.arguments = m_arguments;
+            parsed.json = m_arguments.IsJson();
         } catch (const CLI::CallForHelp&) {
             parsed.output = m_app.help();
         } catch (const CLI::CallForVersion& version) {
@@ -111,39 +105,104 @@ public:
     }
 
 private:
-    CLI::App* AddVerb(const char* name, const char* about, const char* more, Verb verb)
+    CLI::App* GroupOf(const CommandRow& row)
     {
-        CLI::App* const sub = m_app.add_subcommand(name, about);
-        sub->footer(more);
-        sub->callback([this, verb] { m_command.verb = verb; });
-        return sub;
+        if (*row.group == '\0') {
+            return &m_app;
+        }
+        CLI::App*& group = m_groups[row.group];
+        if (group == nullptr) {
+            for (const GroupRow& each : Groups()) {
+                if (std::string_view(each.name) == row.group) {
+                    group = m_app.add_subcommand(each.name, each.about)->require_subcommand(1);
+                    group->footer(std::string("'vornovsctl ") + each.name +
+                                  " COMMAND --help' tells more of a command.");
+                }
+            }
+        }
+        return group;
     }
 
-    void AddClientVerb(const char* name, const char* about, const char* more, Verb verb)
+    void AddCommand(const CommandRow& row)
     {
-        CLI::App* const sub = AddVerb(name, about, more, verb);
-        sub->add_option("NAME", m_command.client, "The client's name")->required();
-        sub->add_option("--bond-mode", m_bondModes, "The mode that a bond is to have")
-            ->type_name("BOND=MODE")
-            ->allow_extra_args(false);
+        CLI::App* const sub = GroupOf(row)->add_subcommand(row.name, row.about);
+        sub->footer(row.more);
+        sub->callback([this, &row] { m_command = &row; });
+        for (const Operand& operand : row.operands) {
+            // Each command has places of its own for the values, which stay where they are.
+            m_values.push_back({&row, &operand, {}});
+            sub->add_option(operand.name, m_values.back().values, operand.about)
+                ->required(operand.least > 0)
+                ->expected(static_cast<int>(operand.least), static_cast<int>(operand.most))
+                ->allow_extra_args(operand.most > 1)
+                ->type_name("");
+        }
+        sub->add_flag("--json", m_json, "Print one JSON object");
+        AddOption(row, *sub);
+    }
+
+    void AddOption(const CommandRow& row, CLI::App& sub)
+    {
+        switch (row.option) {
+        case Option::kSwitchModes:
+        case Option::kLinuxModes:
+            sub.add_option("--bond-mode", m_bondModes, "The mode that a bond is to have")
+                ->type_name("BOND=MODE")
+                ->allow_extra_args(false);
+            break;
+        case Option::kYes:
+        case Option::kConfirm:
+            sub.add_flag("--yes", m_arguments.yes, "Say that this is really meant");
+            break;
+        case Option::kFormat:
+            sub.add_option("--format", m_arguments.format, "text, dot or json")
+                ->check(CLI::IsMember({"text", "dot", "json"}));
+            break;
+        case Option::kNone:
+            break;
+        }
     }
 
     void Check()
     {
-        if (m_command.verb == Verb::kRegister || m_command.verb == Verb::kUnregister) {
-            CheckClient(m_command.client);
+        for (const Values& each : m_values) {
+            if (each.row == m_command) {
+                for (const std::string& value : each.values) {
+                    Refuse(each.operand->subject, each.operand->fault(value));
+                }
+                m_arguments.operands[each.operand->name] = each.values;
+            }
+        }
+        if (m_arguments.operands.contains("SLAVE")) {
+            Refuse("the interfaces", SlavesFault(m_arguments.All("SLAVE")));
         }
         for (const std::string& text : m_bondModes) {
-            AddBondMode(text, m_command);
+            AddBondMode(text, m_command->option == Option::kSwitchModes, m_arguments);
         }
-        if (m_command.verb == Verb::kReset && !m_command.yes) {
+        if (m_command->option == Option::kYes && !m_arguments.yes) {
             throw CLI::ValidationError("reset forgets every client: say --yes if that is meant");
+        }
+        if (m_json) {
+            if (m_arguments.format == "dot") {
+                throw CLI::ValidationError("--json and --format dot are two things");
+            }
+            m_arguments.format = "json";
         }
     }
 
+    struct Values {
+        const CommandRow* row;
+        const Operand* operand;
+        std::vector<std::string> values;
+    };
+
     CLI::App m_app{kAbout};
-    Command m_command;
+    std::map<std::string_view, CLI::App*> m_groups;
+    std::deque<Values> m_values;
+    const CommandRow* m_command = nullptr;
+    Arguments m_arguments;
     std::vector<std::string> m_bondModes;
+    bool m_json = false;
 };
 
 } // namespace

@@ -4,27 +4,20 @@
 #ifndef VORNOVSCTL_COMMANDLINE_H
 #define VORNOVSCTL_COMMANDLINE_H
 
-#include <map>
-#include <optional>
+#include "arguments.h"
+#include "commandtable.h"
+
 #include <string>
 
 namespace vornovsctl {
 
-enum class Verb { kRegister, kUnregister, kStatus, kReset };
-
-struct Command {
-    Verb verb = Verb::kStatus;
-    std::string client;
-    std::map<std::string, std::string> bondModes; /**< bond to mode name */
-    bool json = false;
-    bool yes = false;
-};
-
 /** The command, or what is left to print. */
 struct ParsedCommand {
-    std::optional<Command> command;
+    const CommandRow* command = nullptr; /**< null: there is nothing to do but to print */
+    Arguments arguments;
     std::string output; /**< help or version, for standard output */
     std::string error;  /**< what is wrong with the command line */
+    bool json = false;  /**< whether the answer is to be JSON, as far as was understood */
 };
 
 ParsedCommand ParseCommand(int argc, const char* const argv[]);

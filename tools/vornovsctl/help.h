@@ -19,9 +19,11 @@ constexpr char kExitStatus[] =
     "  1  not done; the message says what holds instead\n"
     "  2  the command line is wrong; nothing was done\n"
     "  3  not run by root; nothing was done\n"
-    "  4  the clients and the network do not fit together; the message says what to do\n"
-    "  5  nothing to do: the name was registered already, perhaps by another program, or was not\n"
+    "  4  half done, or the clients and the network do not fit together; the message says what\n"
+    "     to do\n"
+    "  5  nothing to do: it was so before, perhaps by another program's doing\n"
     "\n"
+    "With --json, a command prints one object; its \"error\" is null or says what is wrong.\n"
     "The system log tells the reasons. 'vornovsctl COMMAND --help' tells more of a command.";
 
 constexpr char kAboutRegister[] = "Register a client; the first one converts the host";
@@ -79,6 +81,180 @@ constexpr char kResetMore[] =
     "\n"
     "Example:\n"
     "  vornovsctl reset --yes";
+
+constexpr char kAboutShow[] = "Draw the host's network";
+
+constexpr char kShowMore[] =
+    "Bridges, ports, bonds, VLAN tags, addresses, default routes, links and clients, as a tree, "
+    "as\n"
+    "a graph for Graphviz or as JSON. Starts nothing and changes nothing, and works while the\n"
+    "switch does not run. What cannot be read, as for another user than root, is told; the exit\n"
+    "status is then 1.\n"
+    "\n"
+    "Examples:\n"
+    "  vornovsctl show\n"
+    "  vornovsctl show --format dot | dot -Tsvg > host.svg";
+
+constexpr char kAboutInterfaceList[] = "List the switch's bridges";
+
+constexpr char kInterfaceListMore[] =
+    "One bridge a line, those of other programs too. Starts the switch's services when a client "
+    "is\n"
+    "registered and they do not run; 'vornovsctl show' starts nothing.\n"
+    "\n"
+    "Example:\n"
+    "  vornovsctl interface list";
+
+constexpr char kAboutInterfaceAdd[] = "Put an interface that was taken off back on the switch";
+
+constexpr char kInterfaceAddMore[] =
+    "The interface must have been taken off with 'interface remove'. Its addresses move to its\n"
+    "bridge.\n"
+    "\n"
+    "Example:\n"
+    "  vornovsctl interface add eth1";
+
+constexpr char kAboutInterfaceRemove[] = "Take one interface, or a bond, off the switch";
+
+constexpr char kInterfaceRemoveMore[] =
+    "The addresses move back to the interface, and the clients stay registered. A bond is taken\n"
+    "apart, and its interfaces are plain ones then. Ports of the bridge go with it.\n"
+    "\n"
+    "Examples:\n"
+    "  vornovsctl interface remove eth1\n"
+    "  vornovsctl interface remove ovs_bond0";
+
+constexpr char kAboutPortAttach[] = "Make an interface a port of a bridge";
+
+constexpr char kPortAttachMore[] = "Example:\n"
+                                   "  vornovsctl port attach ovs_eth0 tap0";
+
+constexpr char kAboutPortDetach[] = "Take a port off a bridge";
+
+constexpr char kPortDetachMore[] =
+    "The port through which a bridge reaches the wire is not taken: that is 'interface remove'.\n"
+    "\n"
+    "Example:\n"
+    "  vornovsctl port detach ovs_eth0 tap0";
+
+constexpr char kAboutBondCreate[] = "Make a bond of interfaces on the switch";
+
+constexpr char kBondCreateMore[] =
+    "Needs two to 32 interfaces that have bridges of their own; the bond has the addresses of the\n"
+    "first one. Takes some seconds.\n"
+    "\n"
+    "Example:\n"
+    "  vornovsctl bond create ovs_bond0 ovs-active-backup eth0 eth1";
+
+constexpr char kAboutBondRemove[] = "Take a bond on the switch apart";
+
+constexpr char kBondRemoveMore[] = "Its addresses go to the bridge of its first interface; each "
+                                   "interface has a bridge of its own\n"
+                                   "again. Takes some seconds.\n"
+                                   "\n"
+                                   "Example:\n"
+                                   "  vornovsctl bond remove ovs_bond0";
+
+constexpr char kAboutBondGet[] = "Tell a bond's mode and interfaces";
+
+constexpr char kBondGetMore[] = "Example:\n"
+                                "  vornovsctl bond get ovs_bond0";
+
+constexpr char kAboutBondMode[] = "Change the mode of a bond on the switch";
+
+constexpr char kBondModeMore[] = "Example:\n"
+                                 "  vornovsctl bond mode ovs_bond0 ovs-balance-tcp";
+
+constexpr char kAboutBondFreeName[] = "Tell the first free name for a bond";
+
+constexpr char kBondFreeNameMore[] =
+    "The first of ovs_bond0 to ovs_bond9 that no interface has.\n"
+    "\n"
+    "Examples:\n"
+    "  vornovsctl bond free-name\n"
+    "  vornovsctl bond create \"$(vornovsctl bond free-name)\" ovs-balance-slb eth0 eth1";
+
+constexpr char kAboutBondModes[] = "List the modes of bonds";
+
+constexpr char kBondModesMore[] =
+    "Those of Linux and of the switch, and what each becomes on the other side.\n"
+    "\n"
+    "Example:\n"
+    "  vornovsctl bond modes";
+
+constexpr char kAboutVlanGet[] = "Tell a port's VLAN tag";
+
+constexpr char kVlanGetMore[] = "Example:\n"
+                                "  vornovsctl vlan get ovs_eth0";
+
+constexpr char kAboutVlanSet[] = "Set the tag of the live port, without recording it";
+
+constexpr char kVlanSetMore[] = "Lasts until the network is started again.\n"
+                                "\n"
+                                "Example:\n"
+                                "  vornovsctl vlan set tap0 10";
+
+constexpr char kAboutVlanClear[] = "Clear the tag of the live port, without recording it";
+
+constexpr char kVlanClearMore[] =
+    "A tag in the port's configuration file comes back when the network is started again.\n"
+    "\n"
+    "Example:\n"
+    "  vornovsctl vlan clear tap0";
+
+constexpr char kAboutVlanCreate[] = "Set a port's tag and record it in its configuration file";
+
+constexpr char kVlanCreateMore[] = "Example:\n"
+                                   "  vornovsctl vlan create ovs_eth0 10";
+
+constexpr char kAboutVlanRemove[] = "Clear a port's tag and forget it";
+
+constexpr char kVlanRemoveMore[] = "Example:\n"
+                                   "  vornovsctl vlan remove ovs_eth0";
+
+constexpr char kAboutSwitchStart[] = "Start the switch's services";
+
+constexpr char kSwitchStartMore[] = "Example:\n"
+                                    "  vornovsctl switch start";
+
+constexpr char kAboutSwitchStop[] = "Stop the switch's services";
+
+constexpr char kSwitchStopMore[] =
+    "Not while a client is registered, unless --yes is said: what is on the switch would lose the\n"
+    "network sooner or later.\n"
+    "\n"
+    "Example:\n"
+    "  vornovsctl switch stop";
+
+constexpr char kAboutNetworkStart[] = "Make the live network what the files say";
+
+constexpr char kNetworkStartMore[] = "Example:\n"
+                                     "  vornovsctl network start ovs_eth0 eth0";
+
+constexpr char kAboutNetworkStop[] = "Hold the network until it is started again";
+
+constexpr char kNetworkStopMore[] =
+    "For clients that edit configuration files: what runs keeps running until 'network start', or\n"
+    "until the time for that is over. To really stop it, use '/etc/rc.network stop'.\n"
+    "\n"
+    "Example:\n"
+    "  vornovsctl network stop eth0";
+
+constexpr char kAboutGatewayCopy[] = "Copy the records of one interface to another";
+
+constexpr char kGatewayCopyMore[] =
+    "IPv4 and IPv6. The live routes follow when the network is started.\n"
+    "\n"
+    "Example:\n"
+    "  vornovsctl gateway copy eth0 ovs_eth0";
+
+constexpr char kAboutGatewayRemove[] = "Remove the records of an interface";
+
+constexpr char kGatewayRemoveMore[] =
+    "IPv4 and IPv6. The live routes follow when the network is started.\n"
+    "\n"
+    "Example:\n"
+    "  vornovsctl gateway remove eth0";
 
 } // namespace vornovsctl
 

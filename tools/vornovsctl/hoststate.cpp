@@ -1,14 +1,20 @@
 #include "hoststate.h"
 
+#include <support/keyvaluefile.h>
 #include <vornovs/vornovs.h>
 
+#include <cerrno>
+#include <fstream>
 #include <string_view>
+#include <unistd.h>
 
 namespace vornovsctl {
 
 namespace {
 
 constexpr std::string_view kBridgePrefix = "ovs_";
+constexpr char kTakenOffPath[] = "/usr/vorn/etc/vornovs/ovs_ignore.conf";
+constexpr char kInterfaceFilePrefix[] = "/etc/sysconfig/network-scripts/ifcfg-";
 
 std::optional<Names> ReadInterfaces()
 {
@@ -19,8 +25,9 @@ std::optional<Names> ReadInterfaces()
     Names interfaces;
     for (const std::string& bridge : bridges) {
         // The switch may have bridges of other programs.
-        if (bridge.size() > kBridgePrefix.size() && bridge.starts_with(kBridgePrefix)) {
-            interfaces.insert(bridge.substr(kBridgePrefix.size()));
+        const std::string interface = InterfaceOf(bridge);
+        if (!interface.empty()) {
+            interfaces.insert(interface);
         }
     }
     return interfaces;
@@ -38,6 +45,36 @@ std::optional<Names> ReadClients()
     return names;
 }
 
+// The library's class for this list cannot be asked what is in it.
+std::optional<Names> ReadTakenOff()
+{
+    if (access(kTakenOffPath, F_OK) != 0 && (errno == ENOENT || errno == ENOTDIR)) {
+        return Names();
+    }
+    std::ifstream file(kTakenOffPath);
+    if (!file) {
+        return std::nullopt;
+    }
+    Names names;
+    for (std::string line; std::getline(file, line);) {
+        if (!line.empty()) {
+            names.insert(line);
+        }
+    }
+    return file.bad() ? std::nullopt : std::optional<Names>(names);
+}
+
+void ForgetTakenOff(const std::string& interface)
+{
+    (void)VORN::OVS::OVSIfsConf(kTakenOffPath).Remove(interface);
+}
+
+std::string ReadRecordedTag(const std::string& port)
+{
+    const auto file = vornhost::KeyValueFile::Load(kInterfaceFilePrefix + port);
+    return file ? file->Get("OVS_VLAN_ID").value_or("") : "";
+}
+
 HostState ReadHostState()
 {
     HostState state;
@@ -47,12 +84,46 @@ HostState ReadHostState()
     if (state.switchRuns) {
         state.interfaces = ReadInterfaces();
     }
+    state.takenOff = ReadTakenOff();
+    if (state.takenOff) {
+        for (const std::string& interface : state.interfaces.value_or(Names())) {
+            state.takenOff->erase(interface);
+        }
+    }
     return state;
+}
+
+Json StateFields(const HostState& state)
+{
+    Json fields;
+    fields["clients"] = NamesOrNull(state.clients);
+    fields["switchRunning"] = state.switchRuns;
+    fields["interfaces"] = nullptr;
+    if (state.interfaces) {
+        fields["interfaces"] = Json::array();
+        for (const std::string& interface : *state.interfaces) {
+            fields["interfaces"].push_back({{"name", interface}, {"bridge", BridgeOf(interface)}});
+        }
+    }
+    fields["takenOff"] = NamesOrNull(state.takenOff);
+    fields["consistent"] = state.IsConsistent();
+    return fields;
 }
 
 std::string BridgeOf(const std::string& interface)
 {
     return std::string(kBridgePrefix) + interface;
+}
+
+std::string InterfaceOf(const std::string& bridge)
+{
+    const bool ours = bridge.size() > kBridgePrefix.size() && bridge.starts_with(kBridgePrefix);
+    return ours ? bridge.substr(kBridgePrefix.size()) : "";
+}
+
+Json NamesOrNull(const std::optional<Names>& names)
+{
+    return names ? Json(*names) : Json(nullptr);
 }
 
 } // namespace vornovsctl

@@ -1,5 +1,6 @@
 /**
- * vornovsctl: registers clients of the switch from the command line and tells how things are.
+ * vornovsctl: puts the host on the switch and back from the command line, manages what is on the
+ * switch, and tells how things are.
  */
 #include "run.h"
 
@@ -7,5 +8,5 @@
 
 int main(int argc, char* argv[])
 {
-    return vornovsctl::Run(argc, argv, std::cout, std::cerr);
+    return vornovsctl::Run(argc, argv, std::cout, std::cerr, vornovsctl::StandardOutput());
 }

@@ -4,21 +4,18 @@
 #ifndef VORNOVSCTL_RUN_H
 #define VORNOVSCTL_RUN_H
 
+#include "terminal.h"
+
 #include <iosfwd>
 
 namespace vornovsctl {
 
-enum ExitStatus : int {
-    kHolds = 0,       /**< done: what was asked for holds now */
-    kDoesNotHold = 1, /**< it does not */
-    kWrongUsage = 2,
-    kNotRoot = 3,
-    kOutOfStep = 4,   /**< clients and network do not fit together */
-    kNothingToDo = 5, /**< it held before, perhaps by somebody else's doing */
-};
-
-/** @return the exit status. */
-int Run(int argc, const char* const argv[], std::ostream& output, std::ostream& errors);
+/**
+ * @param terminal  what the place that the output goes to can show.
+ * @return  the exit status.
+ */
+int Run(int argc, const char* const argv[], std::ostream& output, std::ostream& errors,
+        const Terminal& terminal = {});
 
 } // namespace vornovsctl
 

@@ -1,0 +1,33 @@
+/**
+ * The bridges of the switch with all that is drawn of them.
+ */
+#ifndef VORNOVSCTL_SHOW_SWITCHREADER_H
+#define VORNOVSCTL_SHOW_SWITCHREADER_H
+
+#include "hostmodel.h"
+
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace vornovsctl {
+
+/** What the switch was asked. */
+struct SwitchAnswer {
+    std::optional<std::vector<Bridge>> bridges;
+    std::string fault; /**< why there are none, in words */
+};
+
+/** Takes the bridges from the reply of the switch's database. @return nothing: it is no such. */
+std::optional<std::vector<Bridge>> ParseSwitch(std::string_view reply);
+
+/** Asks the switch's database; starts nothing, and does not wait long. */
+SwitchAnswer AskSwitch();
+
+/** @return the bridge that has a port of that name; null: none has. */
+const Bridge* FindBridgeOfPort(const std::vector<Bridge>& bridges, const std::string& port);
+
+} // namespace vornovsctl
+
+#endif

@@ -25,7 +25,7 @@ probes_finish "making a bond" 100
 client_port_plugged
 
 step "Read it"
-vornovsctl --json bond get ovs_bond0 | tr -d ' \n' >"$lab_out/bond"
+vornovsctl bond get --json ovs_bond0 | tr -d ' \n' >"$lab_out/bond"
 expect_success file_has "$lab_out/bond" '"ovs-active-backup"'
 expect_success file_has "$lab_out/bond" '\["eth0","eth1"\]'
 

@@ -155,6 +155,7 @@ no_ports_left()
     ! compgen -G '/sys/class/net/eth*' >/dev/null
 }
 
+take_apart
 RANDOM=$seed
 for round in $(seq "$rounds"); do
     make_host

@@ -29,7 +29,7 @@ by_eight()
 
 attached()
 {
-    ovs-vsctl --timeout=10 list-ports ovs_eth0 | grep '^vm' | sort
+    ovs-vsctl --timeout=10 list-ports ovs_eth0 | sed -n '/^vm/p' | sort
 }
 
 step "Attach"
@@ -38,7 +38,7 @@ expect_equal "the ports" "$(seq -f 'vm%g' 50 | sort)" "$(attached)"
 
 step "Detach"
 timed "detaching 50 ports" by_eight detach
-expect_equal "the ports" "" "$(attached || true)"
+expect_equal "the ports" "" "$(attached)"
 expect_lock_free
 
 step "Unregister"

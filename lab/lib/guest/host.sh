@@ -137,12 +137,14 @@ bonds_settled()
 # True when the Linux bond's aggregate has all its ports and a partner.
 expect_partner()
 {
-    local folder="/sys/class/net/$1/bonding" slave state ports=0
+    local folder="/sys/class/net/$1/bonding" slave end state ports=0
     for slave in $(slaves_of "$1"); do
         ports=$((ports + 1))
-        state="$(cat "/sys/class/net/$slave/bonding_slave/ad_partner_oper_port_state")"
-        # Collecting and distributing.
-        [ $((state & 48)) -eq 48 ] || return 1
+        for end in actor partner; do
+            state="$(cat "/sys/class/net/$slave/bonding_slave/ad_${end}_oper_port_state")"
+            # Collecting and distributing.
+            [ $((state & 48)) -eq 48 ] || return 1
+        done
     done
     [ "$(cat "$folder/ad_num_ports")" = "$ports" ] &&
         [ "$(cat "$folder/ad_partner_mac")" != 00:00:00:00:00:00 ]

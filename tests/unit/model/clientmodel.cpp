@@ -168,10 +168,12 @@ void ClientModel::ExpectFiles() const
         EXPECT_EQ(ReadFile(FileOf(bridge)).has_value(), there) << interface;
         EXPECT_EQ(KeyOf(interface, "BRIDGE"), keyIf(there, bridge));
         EXPECT_EQ(KeyOf(bridge, "PRIMARY"), keyIf(there, interface));
+        EXPECT_EQ(KeyOf(bridge, "DEVICE"), keyIf(there, bridge));
         EXPECT_EQ(KeyOf(bridge, "SLAVE"), keyIf(!bond.empty(), "yes"));
         EXPECT_EQ(KeyOf(interface, "DEVICE"), interface);
         if (!clients.empty()) {
             EXPECT_EQ(KeyOf(interface, "MASTER"), keyIf(!bond.empty(), bond));
+            EXPECT_EQ(KeyOf(interface, "SLAVE"), keyIf(!bond.empty(), "yes"));
             EXPECT_EQ(KeyOf(interface, "TYPE"), std::nullopt);
         }
     }

@@ -104,7 +104,8 @@ private:
 
     void RemoveBondInterface()
     {
-        for (const auto& [name, bond] : m_model.bonds) {
+        for (const auto& [key, bond] : m_model.bonds) {
+            const std::string name = key; // outlives the bond, which goes below
             const auto slaves = bond.slaves;
             if (std::any_of(slaves.begin(), slaves.end(), [this](const std::string& slave) {
                     return m_model.ignored.contains(slave);

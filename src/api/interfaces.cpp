@@ -66,15 +66,15 @@ bool StartNothing()
     return VLIBCExecv(arguments.front(), arguments.data(), 1) == 0;
 }
 
-/** @return 1 a client is registered, 0 none is, -1 the registrations cannot be read. */
-int AskForClients()
+/** @return number of registered clients; negative: the registrations cannot be read. */
+int CountClients()
 {
     OVSRegConf registry;
     if (registry.LoadFromConfig() < 0) {
         OVS_ERR("Failed to load the ovs config");
         return -1;
     }
-    return std::min(CountNames(registry), 1);
+    return CountNames(registry);
 }
 
 } // namespace
@@ -134,9 +134,9 @@ try {
 
 int ListInterface(std::set<std::string>& out)
 {
-    const int inUse = AskForClients();
-    if (inUse <= 0) {
-        return inUse;
+    const int clients = CountClients();
+    if (clients <= 0) {
+        return clients;
     }
     if (OVSManager().GetSwitchList(out) < 0) {
         OVS_ERR("Failed to get all ovs interface");
@@ -148,9 +148,9 @@ int ListInterface(std::set<std::string>& out)
 int AttachPort(const std::string& bridge, const std::string& port)
 {
     const ConfigLock lock;
-    const int inUse = lock ? AskForClients() : -1;
-    if (inUse <= 0) {
-        return inUse;
+    const int clients = lock ? CountClients() : -1;
+    if (clients <= 0) {
+        return clients;
     }
     if (!OVSManager().AttachPort(bridge, port)) {
         OVS_ERR("Failed to attach the port %s to interface %s", port.c_str(), bridge.c_str());
@@ -162,9 +162,9 @@ int AttachPort(const std::string& bridge, const std::string& port)
 int DetachPort(const std::string& bridge, const std::string& port)
 {
     const ConfigLock lock;
-    const int inUse = lock ? AskForClients() : -1;
-    if (inUse <= 0) {
-        return inUse;
+    const int clients = lock ? CountClients() : -1;
+    if (clients <= 0) {
+        return clients;
     }
     if (!OVSManager().DetachPort(bridge, port)) {
         OVS_ERR("Failed to detach the port %s to interface %s", port.c_str(), bridge.c_str());

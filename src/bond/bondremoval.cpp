@@ -197,6 +197,7 @@ try {
     std::vector<std::string> toStop = slaves;
     toStop.push_back(name);
     std::vector<std::string> toStart;
+    toStart.reserve(slaves.size());
     for (const auto& slave : slaves) {
         toStart.push_back(BridgeName(slave, kBridgeNameBuffer));
     }

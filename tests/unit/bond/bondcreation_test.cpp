@@ -368,34 +368,4 @@ TEST_F(BondCreation, NamesALongSlaveWholeAndItsBridgeCut)
                                             kWrongFormat));
 }
 
-TEST(GetUniqueBondName, GivesTheFirstNameThatNoInterfaceHas)
-{
-    for (int used = 0; used < 10; ++used) {
-        RecordingPlatform platform;
-        Calls asked;
-        for (int i = 0; i <= used; ++i) {
-            const std::string name = "ovs_bond" + std::to_string(i);
-            asked.push_back("VLIBCFileExist /sys/class/net/" + name + "/flags");
-            if (i < used) {
-                MakeLive(platform, {name});
-            }
-        }
-        std::string name = "before";
-        EXPECT_TRUE(BondManager::GetUniqueName(name));
-        EXPECT_EQ(name, "ovs_bond" + std::to_string(used));
-        EXPECT_EQ(platform.Calls(), asked);
-    }
-}
-
-TEST(GetUniqueBondName, LeavesTheOutputWhenAllTenAreInUse)
-{
-    RecordingPlatform platform;
-    platform.Answer("VLIBCFileExist", 1);
-    std::string name = "before";
-    EXPECT_TRUE(BondManager::GetUniqueName(name));
-    EXPECT_EQ(name, "before");
-    EXPECT_EQ(platform.Calls().size(), 10U);
-    EXPECT_THAT(platform.Log(), IsEmpty());
-}
-
 } // namespace

@@ -1,6 +1,6 @@
 #include <vornovs/vornovs.h>
 
-#include "support/support.h"
+#include "support/bondcalls.h"
 
 #include <cstring>
 #include <ostream>
@@ -9,8 +9,10 @@ using harness::Err;
 using harness::RecordingPlatform;
 using testing::ElementsAre;
 using testing::IsEmpty;
+using unit::Calls;
 using unit::kIfcfg;
 using unit::LongName;
+using unit::MakeLive;
 using unit::ReadFile;
 using unit::WriteFile;
 using VORN::OVS::BondManager;
@@ -243,6 +245,36 @@ TEST(BondChMode, CutsThePathToItsBuffer)
                 ElementsAre("VORNNetLinkAggrModeToString 4",
                             "VLIBCFileSetKeys " + path + " BOND_MODE=active-backup BONDING_OPTS=",
                             "VLIBCExecl /etc/rc.network set-ovs-bond " + LongName()));
+}
+
+TEST(GetUniqueBondName, GivesTheFirstNameThatNoInterfaceHas)
+{
+    for (int used = 0; used < 10; ++used) {
+        RecordingPlatform platform;
+        Calls asked;
+        for (int i = 0; i <= used; ++i) {
+            const std::string name = "ovs_bond" + std::to_string(i);
+            asked.push_back("VLIBCFileExist /sys/class/net/" + name + "/flags");
+            if (i < used) {
+                MakeLive(platform, {name});
+            }
+        }
+        std::string name = "before";
+        EXPECT_TRUE(BondManager::GetUniqueName(name));
+        EXPECT_EQ(name, "ovs_bond" + std::to_string(used));
+        EXPECT_EQ(platform.Calls(), asked);
+    }
+}
+
+TEST(GetUniqueBondName, LeavesTheOutputWhenAllTenAreInUse)
+{
+    RecordingPlatform platform;
+    platform.Answer("VLIBCFileExist", 1);
+    std::string name = "before";
+    EXPECT_TRUE(BondManager::GetUniqueName(name));
+    EXPECT_EQ(name, "before");
+    EXPECT_EQ(platform.Calls().size(), 10U);
+    EXPECT_THAT(platform.Log(), IsEmpty());
 }
 
 } // namespace

@@ -165,7 +165,7 @@ std::optional<int> SimulatedHost::React(const std::string& call)
     }
     // What is asked next is told beforehand; only these calls change it.
     const std::optional<int> answer = Act(words);
-    if (answer || words.size() > 2) {
+    if (answer || (words.size() > 2 && words[1] == "/etc/rc.network")) {
         TellPlatform();
     }
     return answer;
@@ -253,6 +253,11 @@ int SimulatedHost::SetBond(const std::vector<std::string>& words)
         return bond == linuxBonds.end() ? -1 : TakeBondApart(name, bond->second);
     }
 
+    linuxBonds[name] = {mode, slaves};
+    if (m_allowsChanges) {
+        BuildNewBond(name, linuxBonds[name]);
+        return 0;
+    }
     const auto memory = m_memories.find(name);
     if (memory == m_memories.end()) {
         return -1;
@@ -264,8 +269,17 @@ int SimulatedHost::SetBond(const std::vector<std::string>& words)
     EXPECT_EQ(mode, memory->second.mode) << name;
     WriteFiles(memory->second.before);
     m_memories.erase(memory);
-    linuxBonds[name] = {mode, slaves};
     return 0;
+}
+
+void SimulatedHost::BuildNewBond(const std::string& name, const LinuxBond& bond)
+{
+    WriteFile(FileOf(name), "DEVICE=" + name + "\n" +
+                                Without(ContentOf(bond.slaves.front()), {"DEVICE"}) +
+                                "BONDING_OPTS=\"mode=" + std::to_string(bond.mode) + "\"\n");
+    for (const std::string& slave : bond.slaves) {
+        WriteFile(FileOf(slave), "DEVICE=" + slave + "\nMASTER=" + name + "\nSLAVE=yes\n");
+    }
 }
 
 int SimulatedHost::TakeBondApart(const std::string& name, const LinuxBond& bond)
@@ -306,6 +320,11 @@ int SimulatedHost::RemoveVlan(const std::string& name)
 int SimulatedHost::CreateVlan(const std::string& parent, int id)
 {
     const std::string name = parent + "." + std::to_string(id);
+    linuxVlans[name] = {parent, id};
+    if (m_allowsChanges) {
+        WriteFile(FileOf(name), "DEVICE=" + name + "\nVLAN=yes\n");
+        return 0;
+    }
     const auto memory = m_memories.find(name);
     if (memory == m_memories.end()) {
         return -1;
@@ -317,7 +336,6 @@ int SimulatedHost::CreateVlan(const std::string& parent, int id)
     }
     WriteFiles(memory->second.before);
     m_memories.erase(memory);
-    linuxVlans[name] = {parent, id};
     return 0;
 }
 

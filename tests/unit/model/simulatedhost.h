@@ -31,6 +31,12 @@ public:
                  const std::string& text);
     void AddVlan(const std::string& parent, int id, const std::string& text);
 
+    /**
+     * From now on bonds and VLANs may come back otherwise than they went, or for the first time:
+     * without this the test fails unless everything is as it was left.
+     */
+    void AllowChanges() { m_allowsChanges = true; }
+
     struct Bridge {
         std::string tag;
         Names ports;
@@ -59,11 +65,13 @@ private:
     void RunNetwork(const std::vector<std::string>& words);
     int SetBond(const std::vector<std::string>& words);
     int TakeBondApart(const std::string& name, const LinuxBond& bond);
+    void BuildNewBond(const std::string& name, const LinuxBond& bond);
     int RemoveVlan(const std::string& name);
     int CreateVlan(const std::string& parent, int id);
     void TellPlatform();
 
     harness::RecordingPlatform& m_platform;
+    bool m_allowsChanges = false;
     Names m_ports;
     /** What was there before something was taken apart, and what was left then. */
     struct Memory {

@@ -1,0 +1,189 @@
+// Memory runs out: each entry point is run with its first allocation failing, then its second and
+// so on until a run passes, once with that allocation alone failing and once with all that follow.
+#include "memory/withoutmemory.h"
+
+#include <algorithm>
+#include <cstdlib>
+#include <cstring>
+#include <new>
+#include <utility>
+
+using harness::HarnessAllocations;
+using harness::RecordingPlatform;
+using testing::AnyOf;
+using testing::Contains;
+using testing::IsEmpty;
+
+namespace {
+
+/** Allocations until one fails; 0: none does. */
+long g_countdown = 0;
+bool g_allThatFollow = false;
+bool g_failed = false;
+
+void* Allocate(std::size_t size)
+{
+    if (g_countdown > 0 && !HarnessAllocations::Active()) {
+        if (g_countdown == 1) {
+            g_failed = true;
+            g_countdown = g_allThatFollow ? 1 : 0;
+            return nullptr;
+        }
+        --g_countdown;
+    }
+    return std::malloc(size == 0 ? 1 : size);
+}
+
+} // namespace
+
+// Not inlined: the compiler would see memory from `new` go to `free` and warn of a mismatch.
+[[gnu::noinline]] void* operator new(std::size_t size)
+{
+    void* const memory = Allocate(size);
+    if (memory == nullptr) {
+        throw std::bad_alloc();
+    }
+    return memory;
+}
+
+[[gnu::noinline]] void* operator new[](std::size_t size)
+{
+    return operator new(size);
+}
+
+[[gnu::noinline]] void* operator new(std::size_t size, const std::nothrow_t& /*tag*/) noexcept
+{
+    return Allocate(size);
+}
+
+[[gnu::noinline]] void operator delete(void* memory) noexcept
+{
+    std::free(memory);
+}
+
+[[gnu::noinline]] void operator delete(void* memory, std::size_t /*size*/) noexcept
+{
+    std::free(memory);
+}
+
+[[gnu::noinline]] void operator delete[](void* memory) noexcept
+{
+    std::free(memory);
+}
+
+[[gnu::noinline]] void operator delete[](void* memory, std::size_t /*size*/) noexcept
+{
+    std::free(memory);
+}
+
+namespace unit {
+
+namespace {
+
+/** Runs with the nth allocation failing. */
+int RunFailing(long nth, bool allThatFollow, const std::function<int()>& run)
+{
+    g_failed = false;
+    g_allThatFollow = allThatFollow;
+    g_countdown = nth;
+    int result = 0;
+    try {
+        result = run();
+    } catch (...) {
+        g_countdown = 0;
+        ADD_FAILURE() << "an exception left the library at allocation " << nth;
+    }
+    g_countdown = 0;
+    return result;
+}
+
+/** A host with two ports, a bond and a VLAN, on the switch and off it. */
+void PrepareHost(RecordingPlatform& platform)
+{
+    platform.CarryOutFileEdits();
+    platform.Interfaces({"eth0", "eth1", "bond0", "eth0.10", "full"});
+    platform.Vlan("eth0.10", "eth0", 10);
+    platform.Bond("bond0", 1, {"eth2", "eth3"});
+    platform.Bond("ovs_bond0", 7, {"eth2", "eth3"});
+    platform.Output("VLIBCPopen /usr/bin/ovs-vsctl r list-br",
+                    "ovs_eth0\novs_eth1\na-bridge-with-a-long-name\n");
+    platform.Output("VLIBCPopen /usr/bin/ovs-vsctl rB get port ovs_eth0 tag", "10\n");
+    // A name field filled to its last byte is longer than a string holds without an allocation.
+    VORNLINKAGGROPT unterminated = harness::BondRecord("", 7, {"eth2", "eth3"});
+    std::memcpy(unterminated.szMaster, "ovs_bond-is-full", sizeof(unterminated.szMaster));
+    platform.Bond("full", unterminated);
+    _tag_VLIB_VLAN unterminatedVlan{};
+    std::memcpy(unterminatedVlan.szIfName, "eth1.0123456789a", sizeof(unterminatedVlan.szIfName));
+    std::memcpy(unterminatedVlan.szRealName, "ovs_parent-eth1x", sizeof(unterminatedVlan.szIfName));
+    platform.Vlan("full", unterminatedVlan);
+    for (const char* name : {"eth0", "eth1", "eth2", "eth3", "ovs_eth0", "ovs_eth1"}) {
+        WriteFile(std::string(unit::kIfcfg) + name, "DEVICE=" + std::string(name) + "\n");
+    }
+    WriteFile(kRegistry, kClient + "\n");
+    WriteFile(kInterfaceList, "eth0\neth1\n");
+    unit::MakeLive(platform, {"ovs_eth0", "ovs_eth1", "ovs_eth2", "ovs_eth3"});
+    unit::RecordBond(platform, {kBond, 7, {"eth0", "eth1"}});
+    platform.Bond(kBond, 7, {"eth0", "eth1"});
+    platform.Conflict(kBond, "conflicting-interface");
+    platform.Answer("VLIBNetOVSIfIsMaster " + kBond, 2);
+}
+
+long CountCalls(const RecordingPlatform& platform, const std::string& function)
+{
+    return std::count_if(
+        platform.Calls().begin(), platform.Calls().end(),
+        [&](const std::string& call) { return call.substr(0, call.find(' ')) == function; });
+}
+
+/** Whether the file holds one of the whole states that it may be in. */
+void ExpectWholeState()
+{
+    EXPECT_THAT(ReadFile(kRegistry).value_or(""),
+                AnyOf("", kClient + "\n", kOther + "\n", kClient + "\n" + kOther + "\n"));
+    for (const std::string& file : unit::ListFolder(unit::kStateFolder)) {
+        EXPECT_THAT(file, AnyOf("ovs_reg.conf", "ovs_interface.conf", "ovs_ignore.conf"));
+    }
+}
+
+/** Whatever is stopped must be started again: a host must not go dark for want of memory. */
+void ExpectStartAfterEachStop(const RecordingPlatform& platform, long nth)
+{
+    bool stopped = false;
+    for (const std::string& call : platform.Calls()) {
+        const bool script = call.find(" /etc/rc.network ") != std::string::npos;
+        stopped = script ? call.find(" /etc/rc.network stop") != std::string::npos : stopped;
+    }
+    EXPECT_FALSE(stopped) << "at allocation " << nth;
+}
+
+} // namespace
+
+TEST_P(WithoutMemory, AnswersItsFailureAndLeavesNothingOpen)
+{
+    const auto& [entry, allThatFollow] = GetParam();
+    constexpr long kMostAllocations = 5000;
+    for (long nth = 1; nth < kMostAllocations; ++nth) {
+        unit::RenewFolders();
+        RecordingPlatform platform;
+        PrepareHost(platform);
+        platform.Answer("VLIBCFileCheckKeyValue", entry.topology ? 1 : 0);
+        const int result = RunFailing(nth, allThatFollow, entry.run);
+        EXPECT_THAT(platform.OpenHandles(), IsEmpty()) << "at allocation " << nth;
+        EXPECT_EQ(CountCalls(platform, "VLIBCFileLockTimeByFile"),
+                  CountCalls(platform, "VLIBCFileUnlockByFile"))
+            << "at allocation " << nth;
+        ExpectWholeState();
+        if (!entry.mayStayStopped) {
+            ExpectStartAfterEachStop(platform, nth);
+        }
+        if (!g_failed) {
+            EXPECT_EQ(result, entry.success);
+            EXPECT_GT(nth, 1) << "nothing was allocated";
+            return;
+        }
+        EXPECT_THAT(entry.failures, Contains(result)) << "at allocation " << nth;
+    }
+    FAIL() << "no run passed";
+}
+
+} // namespace unit

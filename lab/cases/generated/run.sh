@@ -5,6 +5,7 @@ seed=20260101
 # The partner of an aggregate takes its time to agree.
 limit=15000
 lab_probe_after=1
+lab_probe_interval=50
 
 made_topology=/lab/topology/topology
 made_files=/lab/topology/host$lab_ifcfg

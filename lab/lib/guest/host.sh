@@ -186,7 +186,7 @@ expect_bridge_like()
     local name="$1" bridge="ovs_$1"
     expect_equal "the hardware address of $bridge" "$(cat "$lab_out/plain-mac-$name")" \
         "$(cat "/sys/class/net/$bridge/address")"
-    expect_equal "the MTU of $bridge" "$(cat "$lab_out/plain-mtu-$name")" \
+    expect_equal "the MTU of $bridge" "$(cat "$lab_out/plain-mtu-$(addressed "$name")")" \
         "$(cat "/sys/class/net/$bridge/mtu")"
     expect_equal "the addresses of $bridge" \
         "$(cat "$lab_out/plain-addresses-$(addressed "$name")")" "$(addresses_of "$bridge")"

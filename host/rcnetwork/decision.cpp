@@ -177,6 +177,16 @@ void Decider::ChooseWithoutBridgeFile()
     if (file.use != FileUse::kPlain || m_kinship.HasUnclearMaster(m_unit.name)) {
         return;
     }
+    if (m_kinship.IsBondWithoutMembers(m_unit.name)) {
+        Say(Severity::kWarning, "no file names " + m_unit.name +
+                                    " as the bond that it belongs to; the bond is left as it is");
+        return;
+    }
+    if (!file.onlyAsMember.empty()) {
+        Say(Severity::kWarning,
+            "ifcfg-" + file.name + ": " + file.onlyAsMember + "; the interface is left as it is");
+        return;
+    }
     if (!file.bridge.empty() && !file.slave && !m_inputs.files.contains(m_unit.bridge)) {
         Say(Severity::kWarning, "ifcfg-" + file.name + " names the bridge " + file.bridge +
                                     ", which has no usable file");

@@ -96,6 +96,10 @@ void Kinship::ReadWanted()
             m_members[file.master].push_back(name);
         }
     }
+    // While the files of a bond are moved to its first member or back there are two of everything.
+    std::erase_if(m_members, [&](const auto& entry) {
+        return entry.second.empty() && !m_switchBonds.contains(entry.first);
+    });
     // Whoever is a member already keeps its place.
     for (auto& [bond, members] : m_members) {
         const auto live = m_inputs.live.bonds.find(bond);
@@ -142,6 +146,16 @@ std::string Kinship::MasterOf(const std::string& name) const
     return found == m_members.end() ? std::string() : found->first;
 }
 
+bool Kinship::IsBondWithoutMembers(const std::string& name) const
+{
+    const InterfaceFile* file = UsableFile(name);
+    const auto record = m_inputs.runState.interfaces.find(name);
+    const bool madeBefore = record != m_inputs.runState.interfaces.end() && record->second.made &&
+                            m_inputs.live.bonds.contains(name);
+    return file != nullptr && file->use == FileUse::kPlain && (file->bond || madeBefore) &&
+           m_inputs.request.verb == Verb::kStart && !IsWantedBond(name);
+}
+
 bool Kinship::HasUnclearMaster(const std::string& name) const
 {
     const InterfaceFile* file = UsableFile(name);
@@ -181,8 +195,9 @@ bool Kinship::IsSingleUnit(const std::string& name) const
     if (HasFile(BridgeOf(name)) && bridge == nullptr) {
         return false;
     }
+    const InterfaceFile* file = UsableFile(name);
     return (bridge != nullptr && !bridge->slave) ||
-           (UsableFile(name) != nullptr && !HasUnclearMaster(name));
+           (file != nullptr && file->onlyAsMember.empty() && !HasUnclearMaster(name));
 }
 
 std::string Kinship::HeirAmong(const std::vector<std::string>& members) const

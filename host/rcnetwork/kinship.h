@@ -25,6 +25,8 @@ public:
 
     /** Whether a bond of that name is asked for, on the switch or of the kernel. */
     bool IsWantedBond(const std::string& name) const { return m_members.contains(name); }
+    /** Whether the file is one of a bond that no other file belongs to: one being moved. */
+    bool IsBondWithoutMembers(const std::string& name) const;
     bool IsWantedOnSwitch(const std::string& name) const { return m_switchBonds.contains(name); }
     /** @return  the members that are asked for, in their order, whether they exist or not. */
     std::vector<std::string> MembersOf(const std::string& bond) const;

@@ -107,6 +107,7 @@ private:
     void ReadStructure();
     void ReadBondOptions();
     void ReadVlan();
+    std::string ProtocolProblem() const;
     void DecideUse();
     void ReadLinkKeys();
     void ReadIpv4();
@@ -237,13 +238,24 @@ void Parser::ReadVlan()
     }
 }
 
+/** @return  why the addresses cannot be had; empty when the file itself says them. */
+std::string Parser::ProtocolProblem() const
+{
+    const std::string protocol = Lower(Value("BOOTPROTO"));
+    if (protocol == "dhcp" || protocol == "bootp") {
+        return "BOOTPROTO=" + protocol + " is not supported yet";
+    }
+    const bool known = protocol.empty() || protocol == "none" || protocol == "static";
+    return known ? "" : "BOOTPROTO=" + protocol + " is unknown";
+}
+
 void Parser::DecideUse()
 {
     InterfaceFile& file = m_parsed.file;
     const bool bridgeName = file.name.rfind(kBridgePrefix, 0) == 0;
     const bool bridgeType = Value("TYPE") == "OVS";
     const bool ofBond = !file.slaveList.empty(); // may have any name
-    const std::string protocol = Lower(Value("BOOTPROTO"));
+    const std::string protocolProblem = ProtocolProblem();
 
     if (bridgeName && !bridgeType) {
         Leave("ignored, because its TYPE is not OVS");
@@ -251,14 +263,13 @@ void Parser::DecideUse()
         Leave("ignored, because a plain interface cannot have TYPE=OVS");
     } else if (bridgeType && !ofBond && kBridgePrefix + file.primary != file.name) {
         Leave("ignored, because its PRIMARY is \"" + file.primary + "\"");
-    } else if (protocol == "dhcp" || protocol == "bootp") {
-        Leave("BOOTPROTO=" + protocol + " is not supported yet");
-    } else if (!protocol.empty() && protocol != "none" && protocol != "static") {
-        Leave("BOOTPROTO=" + protocol + " is unknown");
+    } else if (!protocolProblem.empty() && !file.slave) {
+        Leave(protocolProblem);
     } else if (!bridgeType && !file.bridge.empty() && file.bridge != kBridgePrefix + file.name) {
         Leave("BRIDGE=" + file.bridge + " is not supported yet");
     } else {
         file.use = bridgeType ? FileUse::kBridge : FileUse::kPlain;
+        file.onlyAsMember = protocolProblem;
     }
 }
 

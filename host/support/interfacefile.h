@@ -51,6 +51,8 @@ struct InterfaceFile {
     /** BONDING_OPTS in its order: options of the kernel's bond or columns of the switch's. */
     std::vector<std::pair<std::string, std::string>> bondOptions;
     std::optional<FileVlan> vlan; ///< Of a plain file.
+    /** Why the addressing cannot be given to the interface, which only a member does without. */
+    std::string onlyAsMember;
     bool onBoot = true;
     bool whole = true; ///< No value was refused: what is missing here is really not wanted.
     std::optional<unsigned> mtu;

@@ -22,6 +22,7 @@ private:
     void Say(Severity severity, const std::string& text) { m_remarks.push_back({severity, text}); }
     void ReadKind();
     void ReadMembers();
+    void ReadFurtherPorts();
     bool IsWorkingPort(const Link& link, const SwitchPort& port) const;
     bool IsJoined() const;
     bool IsOurs() const;
@@ -30,6 +31,8 @@ private:
     void ChooseForStop();
     void ChooseForStart();
     void ChooseWithoutBridgeFile();
+    void ChooseForIdleBridge(const InterfaceFile& file);
+    bool NamesUnknownBridge(const InterfaceFile& file) const;
     void GiveUpOnForeignBridge();
     void CheckPort();
     bool IsAsked() const;
@@ -67,12 +70,15 @@ void Decider::ReadKind()
     const InterfaceFile* file = m_kinship.UsableFile(m_unit.name);
     if (m_kinship.IsWantedOnSwitch(m_unit.name)) {
         m_unit.kind = UnitKind::kSwitchBond;
+    } else if (m_kinship.IsWantedLinuxBridge(m_unit.name)) {
+        m_unit.kind = UnitKind::kLinuxBridge;
     } else if (m_kinship.IsWantedBond(m_unit.name)) {
         m_unit.kind = UnitKind::kBond;
     } else if (file != nullptr && file->vlan) {
         m_unit.kind = UnitKind::kVlan;
     }
     ReadMembers();
+    ReadFurtherPorts();
     if (m_unit.kind == UnitKind::kSwitchBond) {
         m_unit.port = m_unit.members.empty() ? nullptr : m_unit.members.front();
     }
@@ -85,6 +91,22 @@ void Decider::ReadMembers()
             m_unit.members.push_back(link);
         } else {
             Say(Severity::kWarning, "there is no interface " + member + " for " + m_unit.name);
+        }
+    }
+}
+
+/** What belongs to something else, or is not there, does not come on the bridge. */
+void Decider::ReadFurtherPorts()
+{
+    for (const std::string& name : m_kinship.FurtherPortsOf(m_unit.name)) {
+        const Link* link = m_inputs.live.FindLink(name);
+        const std::string master = link == nullptr ? "" : m_inputs.live.NameOf(link->master);
+        if (link == nullptr) {
+            Say(Severity::kWarning, "there is no interface " + name + " for " + m_unit.bridge);
+        } else if (master.empty() || master == kDatapathLink || IsOwnMaster(master)) {
+            m_unit.further.push_back(link);
+        } else {
+            Say(Severity::kWarning, name + " is a port of " + master + "; it is left as it is");
         }
     }
 }
@@ -130,7 +152,8 @@ bool Decider::BridgeIsLive() const
 /** Such an interface is no unit of its own: its bond is. */
 bool Decider::IsPartOfABond() const
 {
-    return m_inputs.request.verb == Verb::kStart && !m_kinship.MasterOf(m_unit.name).empty();
+    return m_inputs.request.verb == Verb::kStart &&
+           !(m_kinship.MasterOf(m_unit.name) + m_kinship.HostOf(m_unit.name)).empty();
 }
 
 void Decider::ChooseForStop()
@@ -161,7 +184,31 @@ void Decider::ChooseForStart()
         m_unit.target = Target::kPlain;
     }
     m_unit.addWanted = m_unit.file != nullptr;
-    m_unit.removeUnwanted = m_unit.file != nullptr && m_unit.file->whole;
+    m_unit.removeUnwanted = m_unit.takeDown || (m_unit.file != nullptr && m_unit.file->whole);
+}
+
+/** Without a port, or not to be brought up. One that we made is not left behind. */
+void Decider::ChooseForIdleBridge(const InterfaceFile& file)
+{
+    const auto record = m_inputs.runState.interfaces.find(m_unit.name);
+    const bool made = record != m_inputs.runState.interfaces.end() && record->second.made;
+    if (file.onBoot) {
+        Say(Severity::kWarning,
+            "no file names " + m_unit.name + " as its BRIDGE; the bridge is left as it is");
+    } else if (made && m_unit.port != nullptr && m_kinship.LiveMembersOf(m_unit.name).empty()) {
+        m_unit.target = Target::kPlain;
+        m_unit.takeDown = true;
+    }
+}
+
+/** Whether the file of a plain interface makes it a port of something that nobody knows. */
+bool Decider::NamesUnknownBridge(const InterfaceFile& file) const
+{
+    if (file.bridge.empty() || file.slave || file.bridge == m_unit.bridge) {
+        return false;
+    }
+    const InterfaceFile* bridge = m_kinship.UsableFile(file.bridge);
+    return bridge == nullptr || !bridge->linuxBridge || bridge->onBoot;
 }
 
 void Decider::ChooseWithoutBridgeFile()
@@ -182,12 +229,22 @@ void Decider::ChooseWithoutBridgeFile()
                                     " as the bond that it belongs to; the bond is left as it is");
         return;
     }
+    if (file.linuxBridge && m_unit.kind != UnitKind::kLinuxBridge) {
+        ChooseForIdleBridge(file);
+        return;
+    }
+    if (NamesUnknownBridge(file)) {
+        Say(Severity::kWarning, "ifcfg-" + file.name + " names the bridge " + file.bridge +
+                                    ", which has no usable file; " + m_unit.name +
+                                    " is left as it is");
+        return;
+    }
     if (!file.onlyAsMember.empty()) {
         Say(Severity::kWarning,
             "ifcfg-" + file.name + ": " + file.onlyAsMember + "; the interface is left as it is");
         return;
     }
-    if (!file.bridge.empty() && !file.slave && !m_inputs.files.contains(m_unit.bridge)) {
+    if (file.bridge == m_unit.bridge && !file.slave && !m_inputs.files.contains(m_unit.bridge)) {
         Say(Severity::kWarning, "ifcfg-" + file.name + " names the bridge " + file.bridge +
                                     ", which has no usable file");
         if (BridgeIsLive()) {
@@ -223,7 +280,7 @@ bool Decider::IsAsked() const
 bool Decider::HasRequiredMac() const
 {
     if (m_unit.file == nullptr || m_unit.file->requiredMac.empty() || m_unit.port == nullptr ||
-        m_unit.kind == UnitKind::kBond || m_unit.kind == UnitKind::kSwitchBond) {
+        m_unit.IsGroup() || m_unit.kind == UnitKind::kSwitchBond) {
         return true;
     }
     const std::string& wanted = m_unit.file->requiredMac;
@@ -244,7 +301,7 @@ void Decider::CheckPort()
     if (m_unit.target == Target::kLeaveAlone) {
         return;
     }
-    const bool isMade = m_unit.kind == UnitKind::kBond || m_unit.kind == UnitKind::kVlan;
+    const bool isMade = m_unit.IsGroup() || m_unit.kind == UnitKind::kVlan;
     if (m_unit.port == nullptr && !(isMade && m_inputs.request.verb == Verb::kStart)) {
         const auto record = m_inputs.runState.interfaces.find(m_unit.name);
         const bool made = record != m_inputs.runState.interfaces.end() && record->second.made;
@@ -278,8 +335,7 @@ bool Decider::IsOwnMaster(const std::string& master) const
 /** An interface that belongs to something else cannot go on our bridge. */
 void Decider::CheckMaster()
 {
-    const std::vector<const Link*> ports =
-        m_unit.kind == UnitKind::kBond ? m_unit.members : m_unit.Ports();
+    const std::vector<const Link*> ports = m_unit.IsGroup() ? m_unit.members : m_unit.Ports();
     for (const Link* port : ports) {
         std::string owner;
         const std::string master = m_inputs.live.NameOf(port->master);
@@ -289,8 +345,9 @@ void Decider::CheckMaster()
         for (const SwitchBridge& bridge : m_inputs.switchState.bridges) {
             const bool carries =
                 std::any_of(bridge.ports.begin(), bridge.ports.end(), [&](const SwitchPort& each) {
-                    return std::find(each.interfaces.begin(), each.interfaces.end(), port->name) !=
-                           each.interfaces.end();
+                    return !each.IsFurther() &&
+                           std::find(each.interfaces.begin(), each.interfaces.end(), port->name) !=
+                               each.interfaces.end();
                 });
             const bool own = bridge.name == BridgeOf(port->name) || IsOwnMaster(bridge.name);
             if (carries && bridge.name != m_unit.bridge && !(own && bridge.marked)) {
@@ -399,9 +456,10 @@ std::set<std::string> NamesToDecide(const Inputs& inputs)
 bool IsExcused(const Inputs& inputs, const Kinship& kinship, const std::string& name)
 {
     const Link* link = inputs.live.FindLink(name);
-    const bool made = link != nullptr && (link->kind == "bond" || link->kind == "vlan");
+    const bool made =
+        link != nullptr && (link->kind == "bond" || link->kind == "vlan" || link->kind == "bridge");
     return made || inputs.request.known.contains(name) || !kinship.HeirOf(name).empty() ||
-           !kinship.MasterOf(name).empty();
+           !kinship.MasterOf(name).empty() || !kinship.HostOf(name).empty();
 }
 
 /** In the order in which they came up, so that routes are made in the order in which they stood. */

@@ -69,8 +69,7 @@ std::string SourceFinder::TagDevice() const
     if (owner == nullptr && !m_unit.members.empty()) {
         owner = m_unit.members.back();
     }
-    return "tag" + std::to_string(owner == nullptr ? 0 : owner->index) + "." +
-           std::to_string(*m_unit.tag);
+    return TagDeviceName(owner == nullptr ? 0 : owner->index, *m_unit.tag);
 }
 
 void SourceFinder::NameCarrier()
@@ -199,7 +198,13 @@ bool SourceFinder::IsLate() const
     const bool gathers = m_unit.kind == UnitKind::kBond &&
                          std::any_of(m_unit.members.begin(), m_unit.members.end(),
                                      [&](const Link* member) { return !CanJoinAnyTime(*member); });
-    return replaces || (gathers && m_unit.port == nullptr && !CarriesBefore());
+    const bool bridges =
+        m_unit.kind == UnitKind::kLinuxBridge &&
+        std::any_of(m_unit.members.begin(), m_unit.members.end(), [&](const Link* member) {
+            const bool joined = m_unit.port != nullptr && member->master == m_unit.port->index;
+            return !joined && !CanJoinAnyTime(*member);
+        });
+    return replaces || bridges || (gathers && m_unit.port == nullptr && !CarriesBefore());
 }
 
 void SourceFinder::Run()
@@ -229,7 +234,7 @@ void SourceFinder::Run()
     }
     std::stable_partition(m_unit.sources.begin(), m_unit.sources.end(),
                           [&](const Source& source) { return HasAddresses(*source.link); });
-    if (m_unit.kind == UnitKind::kBond) {
+    if (m_unit.IsGroup()) {
         std::copy_if(m_unit.members.begin(), m_unit.members.end(), std::back_inserter(m_unit.idle),
                      [&](const Link* member) { return CanJoinAnyTime(*member); });
     }

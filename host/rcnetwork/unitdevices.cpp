@@ -95,6 +95,9 @@ void UnitPlanner::PlanDevices()
         }
         Gather();
     }
+    if (m_unit.kind == UnitKind::kLinuxBridge) {
+        PlanLinuxBridge();
+    }
     if (m_unit.kind == UnitKind::kVlan && (m_unit.port == nullptr || m_unit.rebuilt)) {
         const FileVlan& vlan = *m_inputs.files.at(m_unit.name).vlan;
         MakeVlan(m_unit.name, m_kinship.ParentFor(vlan), vlan.id);
@@ -146,10 +149,10 @@ void UnitPlanner::AdjustBondOptions()
         }
         if (name == "mode") {
             m_remarks.push_back(
-                {Severity::kWarning, m_unit.name + " keeps its mode " +
-                                         (has == live->second.options.end() ? "" : has->second) +
-                                         " until it is stopped and started; ifcfg-" + m_unit.name +
-                                         " says " + value});
+                {Severity::kError, m_unit.name + " keeps its mode " +
+                                       (has == live->second.options.end() ? "" : has->second) +
+                                       " until it is stopped and started; ifcfg-" + m_unit.name +
+                                       " says " + value});
             return;
         }
         if (IsForTheTool(name) && has != live->second.options.end()) {
@@ -235,8 +238,11 @@ void UnitPlanner::GatherMember(const Link& member, std::vector<std::string>& lin
 void UnitPlanner::DissolveBonds()
 {
     for (const std::string& bond : m_kinship.LegaciesOf(m_unit.name)) {
+        const Link* link = m_inputs.live.FindLink(bond);
         if (m_inputs.live.bonds.contains(bond)) {
             DissolveBond(bond);
+        } else if (link != nullptr && link->kind == "bridge") {
+            ReleasePorts(bond);
         }
     }
     if (m_unit.kind == UnitKind::kSwitchBond && m_inputs.live.bonds.contains(m_unit.name)) {

@@ -103,6 +103,13 @@ private:
     void MakeVlan(const std::string& device, const std::string& parent, unsigned id);
     void RemoveOldVlans();
 
+    // unitbridge.cpp: bridges of the kernel, and what shares a bridge of the switch
+    void PlanLinuxBridge();
+    void MakeLinuxBridge();
+    void ReleasePorts(const std::string& bridge);
+    void JoinFurtherPorts();
+    void LeaveFurtherPorts();
+
     // unitsettings.cpp: links and the kernel's settings of an interface
     void PlanLinks();
     void PlanLink(const Link& link);
@@ -114,6 +121,7 @@ private:
     void MoveIpv6Stack();
     void SilencePorts();
     void SilencePort(const Link& port);
+    void SilenceMember(const Link& member);
     void RestorePort(const std::string& name);
     void PlanAutoconf();
     void Set(std::vector<std::string>& stage, const std::string& interface,

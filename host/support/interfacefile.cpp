@@ -17,6 +17,7 @@ constexpr char kFilePrefix[] = "ifcfg-";
 constexpr char kBridgePrefix[] = "ovs_";
 constexpr unsigned kMostNumberedAddresses = 256;
 constexpr unsigned kMostVlan = 4095;
+constexpr unsigned kLongestForwardDelay = 30;
 
 std::string Lower(std::string text)
 {
@@ -204,6 +205,11 @@ void Parser::ReadStructure()
     file.bond = type == "bond" || bonding == "yes" ||
                 std::any_of(options.begin(), options.end(),
                             [](const auto& option) { return option.first == "mode"; });
+    file.linuxBridge = type == "bridge";
+    if (file.linuxBridge) {
+        file.stp = YesOrNo("STP").value_or(false);
+        file.forwardDelay = Number("DELAY", 0, kLongestForwardDelay);
+    }
     ReadVlan();
 }
 
@@ -255,6 +261,7 @@ void Parser::DecideUse()
     const bool bridgeName = file.name.rfind(kBridgePrefix, 0) == 0;
     const bool bridgeType = Value("TYPE") == "OVS";
     const bool ofBond = !file.slaveList.empty(); // may have any name
+    const bool joinsBridge = !file.bridge.empty() && file.bridge != kBridgePrefix + file.name;
     const std::string protocolProblem = ProtocolProblem();
 
     if (bridgeName && !bridgeType) {
@@ -263,10 +270,8 @@ void Parser::DecideUse()
         Leave("ignored, because a plain interface cannot have TYPE=OVS");
     } else if (bridgeType && !ofBond && kBridgePrefix + file.primary != file.name) {
         Leave("ignored, because its PRIMARY is \"" + file.primary + "\"");
-    } else if (!protocolProblem.empty() && !file.slave) {
+    } else if (!protocolProblem.empty() && !file.slave && !joinsBridge) {
         Leave(protocolProblem);
-    } else if (!bridgeType && !file.bridge.empty() && file.bridge != kBridgePrefix + file.name) {
-        Leave("BRIDGE=" + file.bridge + " is not supported yet");
     } else {
         file.use = bridgeType ? FileUse::kBridge : FileUse::kPlain;
         file.onlyAsMember = protocolProblem;

@@ -30,6 +30,7 @@ private:
     bool CarriesBefore() const;
     bool IsLate() const;
     bool IsOnWrongParent() const;
+    bool ChangesMode() const;
 
     const Inputs& m_inputs;
     const Kinship& m_kinship;
@@ -207,6 +208,19 @@ bool SourceFinder::IsLate() const
     return replaces || bridges || (gathers && m_unit.port == nullptr && !CarriesBefore());
 }
 
+bool SourceFinder::ChangesMode() const
+{
+    const auto live = m_inputs.live.bonds.find(m_unit.name);
+    const InterfaceFile* file = m_kinship.UsableFile(m_unit.name);
+    if (m_unit.kind != UnitKind::kBond || m_unit.port == nullptr || !m_unit.addWanted ||
+        file == nullptr || live == m_inputs.live.bonds.end()) {
+        return false;
+    }
+    const std::string wanted = BondOptionsOf(*file).Get("mode");
+    const auto mode = live->second.options.find("mode");
+    return !wanted.empty() && mode != live->second.options.end() && mode->second != wanted;
+}
+
 void SourceFinder::Run()
 {
     Absorb();
@@ -239,6 +253,7 @@ void SourceFinder::Run()
                      [&](const Link* member) { return CanJoinAnyTime(*member); });
     }
     m_unit.late = IsLate();
+    m_unit.changesMode = ChangesMode();
 }
 
 } // namespace

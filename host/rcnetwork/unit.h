@@ -49,6 +49,7 @@ struct Unit {
     const Link* carrierLink = nullptr; ///< ...null when there is none of that name yet...
     bool late = false;                 ///< ...and whether it can be used only once others let go.
     bool rebuilt = false;              ///< A VLAN's interface that stands on the wrong one.
+    bool changesMode = false;          ///< A bond that is there works in another mode.
     std::vector<Source> sources;       ///< The most important one first.
     std::vector<std::string> absorbed; ///< Units of which it takes everything over.
 

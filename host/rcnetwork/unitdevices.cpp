@@ -13,6 +13,7 @@ namespace {
 
 /** The kernel takes the others only once these are set. */
 constexpr char kJoinDelay[] = "updelay";
+constexpr char kKeepAddresses[] = "ipv6.conf.keep_addr_on_down";
 constexpr std::array kFirstOptions{"mode", "miimon", "arp_interval"};
 
 std::string OptionLine(const std::string& bond, const std::string& name, const std::string& value)
@@ -142,23 +143,60 @@ void UnitPlanner::AdjustBondOptions()
         return;
     }
     const BondOptions options = BondOptionsOf(file);
+    if (m_unit.changesMode) {
+        ChangeMode(live->second, options);
+        return;
+    }
     for (const auto& [name, value] : options.values) {
         const auto has = live->second.options.find(name);
         if (has != live->second.options.end() && has->second == value) {
             continue;
         }
-        if (name == "mode") {
-            m_remarks.push_back(
-                {Severity::kError, m_unit.name + " keeps its mode " +
-                                       (has == live->second.options.end() ? "" : has->second) +
-                                       " until it is stopped and started; ifcfg-" + m_unit.name +
-                                       " says " + value});
-            return;
-        }
         if (IsForTheTool(name) && has != live->second.options.end()) {
             m_steps.beside.links.push_back(OptionLine(m_unit.name, name, value));
         }
     }
+}
+
+/**
+ * The kernel changes the mode of a bond that is down and has no members. All of it is one batch;
+ * addresses survive that, and routes are made again.
+ */
+void UnitPlanner::ChangeMode(const LiveBond& live, const BondOptions& options)
+{
+    const std::string& bond = m_unit.name;
+    std::vector<std::string> members = live.members;
+    for (const Link* member : m_unit.idle) {
+        if (std::find(members.begin(), members.end(), member->name) == members.end()) {
+            members.push_back(member->name);
+        }
+    }
+    for (const std::string& name : m_inputs.live.WithVlans(*m_unit.port)) {
+        if (const std::string kept = Live(name, kKeepAddresses); !kept.empty() && kept != "1") {
+            Set(m_steps.settingsBefore, name, kKeepAddresses, "1");
+            Set(m_steps.settingsAfter, name, kKeepAddresses, kept);
+        }
+    }
+    auto& lines = m_steps.beside.links;
+    for (const std::string& member : members) {
+        lines.push_back("link set dev " + member + " nomaster");
+    }
+    lines.push_back("link set dev " + bond + " down");
+    lines.push_back(OptionLine(bond, "mode", options.Get("mode")));
+    for (const std::string& name : InOrder(options)) {
+        const auto has = live.options.find(name);
+        if (has != live.options.end() && has->second != options.Get(name)) {
+            lines.push_back(OptionLine(bond, name, options.Get(name)));
+        }
+    }
+    // Without members it has lost the address.
+    lines.push_back("link set dev " + bond + " address " + m_unit.port->mac);
+    lines.push_back("link set dev " + bond + " up");
+    for (const std::string& member : members) {
+        lines.push_back("link set dev " + member + " down");
+        lines.push_back("link set dev " + member + " master " + bond);
+    }
+    m_remarks.push_back({Severity::kNotice, bond + " changes its mode to " + options.Get("mode")});
 }
 
 bool UnitPlanner::IsIdle(const Link* member) const

@@ -6,6 +6,8 @@
 
 #include "decision.h"
 
+#include "support/bondoptions.h"
+
 #include <string>
 #include <vector>
 
@@ -94,6 +96,7 @@ private:
     void GatherMember(const Link& member, std::vector<std::string>& lines);
     void PutInOrder();
     void AdjustBondOptions();
+    void ChangeMode(const LiveBond& live, const BondOptions& options);
     void DissolveBonds();
     void DissolveBond(const std::string& bond);
     bool IsMember(const std::string& name) const;

@@ -87,10 +87,14 @@ private:
     std::string WantedMac() const;
     unsigned WantedMtu() const;
 
-    // unitdevices.cpp: bonds and VLANs of the kernel
+    // unitdevices.cpp: VLANs of the kernel
     void PlanDevices();
-    void MakeBond();
     bool BringsLinkLocal() const;
+    void MakeVlan(const std::string& device, const std::string& parent, unsigned id);
+    void RemoveOldVlans();
+
+    // unitbond.cpp: bonds of the kernel
+    void MakeBond();
     bool IsMissing(const Link& member) const;
     void Gather();
     void GatherMember(const Link& member, std::vector<std::string>& lines);
@@ -103,8 +107,6 @@ private:
     bool IsIdle(const Link* member) const;
     void ReleaseMember(const std::string& bond, const std::string& member,
                        std::vector<std::string>& lines);
-    void MakeVlan(const std::string& device, const std::string& parent, unsigned id);
-    void RemoveOldVlans();
 
     // unitbridge.cpp: bridges of the kernel, and what shares a bridge of the switch
     void PlanLinuxBridge();

@@ -31,7 +31,7 @@ snapshot_links()
 {
     ip -details -oneline link show |
         sed -E -e 's/^[0-9]+: //' -e 's/@(if)?[0-9]+:/:/' -e 's/ link-netns(id)? [^ ]+//' \
-            -e 's/ (ad_aggregator(_id)?|link_failure_count) [0-9]+//g' -e 's/ gc_timer [0-9.]+//' \
+            -e 's/ (ad_aggregator(_id)?|link_failure_count) [0-9]+//g' -e 's/ gc_timer +[0-9.]+//' \
             -e 's/\\//g' -e 's/  +/ /g' |
         sed '/^ovs-system:/d' | sort
 }

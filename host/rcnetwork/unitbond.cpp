@@ -88,6 +88,8 @@ void UnitPlanner::AdjustBondOptions()
         return;
     }
     const BondOptions options = BondOptionsOf(file);
+    // The kernel's module makes an empty one when it is loaded; with the first member it is ours.
+    m_record.made = m_record.made || live->second.members.empty();
     if (m_unit.changesMode) {
         ChangeMode(live->second, options);
         return;
@@ -134,8 +136,10 @@ void UnitPlanner::ChangeMode(const LiveBond& live, const BondOptions& options)
             lines.push_back(OptionLine(bond, name, options.Get(name)));
         }
     }
-    // Without members it has lost the address.
-    lines.push_back("link set dev " + bond + " address " + m_unit.port->mac);
+    // Without members it has lost the address, or has never had one that means anything.
+    const bool idle = live.members.empty() && !m_unit.members.empty();
+    lines.push_back("link set dev " + bond + " address " +
+                    (idle ? m_unit.members.front()->mac : m_unit.port->mac));
     lines.push_back("link set dev " + bond + " up");
     for (const std::string& member : members) {
         lines.push_back("link set dev " + member + " down");

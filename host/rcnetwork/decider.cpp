@@ -67,7 +67,7 @@ void Decider::ReadFurtherPorts()
         } else if (master.empty() || master == kDatapathLink || IsOwnMaster(master)) {
             m_unit.further.push_back(link);
         } else {
-            Say(Severity::kWarning, name + " is a port of " + master + "; it is left as it is");
+            SayTaken(Severity::kWarning, name, master);
         }
     }
 }

@@ -38,6 +38,7 @@ private:
     void ChooseTag();
 
     // deciderchecks.cpp: what is possible
+    void SayTaken(Severity severity, const std::string& port, const std::string& owner);
     void GiveUpOnForeignBridge();
     void CheckPort();
     bool IsAsked() const;

@@ -81,6 +81,11 @@ bool Decider::IsOwnMaster(const std::string& master) const
            (m_kinship.IsWantedBond(plain) && m_kinship.LiveMasterOf(m_unit.name) == plain);
 }
 
+void Decider::SayTaken(Severity severity, const std::string& port, const std::string& owner)
+{
+    Say(severity, port + " is a port of " + owner + "; it is left as it is");
+}
+
 /** An interface that belongs to something else cannot go on our bridge. */
 void Decider::CheckMaster()
 {
@@ -104,8 +109,8 @@ void Decider::CheckMaster()
             }
         }
         if (!owner.empty() && m_unit.target != Target::kLeaveAlone) {
-            Say(m_unit.target == Target::kSwitch ? Severity::kError : Severity::kWarning,
-                port->name + " is a port of " + owner + "; it is left as it is");
+            SayTaken(m_unit.target == Target::kSwitch ? Severity::kError : Severity::kWarning,
+                     port->name, owner);
             m_unit.target = Target::kLeaveAlone;
         }
     }

@@ -138,8 +138,8 @@ void UnitPlanner::ChangeMode(const LiveBond& live, const BondOptions& options)
     }
     // Without members it has lost the address, or has never had one that means anything.
     const bool idle = live.members.empty() && !m_unit.members.empty();
-    lines.push_back("link set dev " + bond + " address " +
-                    (idle ? m_unit.members.front()->mac : m_unit.port->mac));
+    const std::string& mac = idle ? m_unit.members.front()->mac : m_unit.port->mac;
+    lines.push_back("link set dev " + bond + " address " + mac);
     lines.push_back("link set dev " + bond + " up");
     for (const std::string& member : members) {
         lines.push_back("link set dev " + member + " down");

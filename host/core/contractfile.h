@@ -5,7 +5,7 @@
 #ifndef VORNHOST_CORE_CONTRACTFILE_H
 #define VORNHOST_CORE_CONTRACTFILE_H
 
-#include "core/runlock.h"
+#include "support/runlock.h"
 
 #include <string>
 

@@ -1,6 +1,6 @@
 #include "core/containers.h"
 #include "core/guard.h"
-#include "core/runlock.h"
+#include "support/runlock.h"
 
 #include "support/atomicfile.h"
 #include "support/keyvaluefile.h"

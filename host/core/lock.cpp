@@ -1,7 +1,7 @@
 #include "core/contractfile.h"
 #include "core/guard.h"
 #include "core/heldlocks.h"
-#include "core/runlock.h"
+#include "support/runlock.h"
 
 #include <algorithm>
 #include <string>

@@ -13,10 +13,14 @@
 #include <sstream>
 #include <thread>
 
+#include <unistd.h>
+
 namespace vornhost {
 namespace {
 
 constexpr char kIpTool[] = "/bin/ip";
+constexpr char kModuleTool[] = "/sbin/modprobe";
+constexpr char kBondingLoaded[] = "/sys/class/net/bonding_masters";
 constexpr std::chrono::seconds kToolDeadline{15};
 constexpr std::chrono::seconds kServiceDeadline{60};
 constexpr std::chrono::seconds kBridgeDeadline{8};
@@ -56,6 +60,7 @@ private:
     bool RunServices(const Stage& stage);
     bool RunSwitch(const Stage& stage);
     bool RunBatch(const Stage& stage);
+    void LoadBonding(const Stage& stage) const;
     void RunAdditions(const Stage& stage) const;
     bool WaitForBridges(const Stage& stage);
     bool WriteSettings(const Stage& stage);
@@ -109,8 +114,22 @@ bool Applier::RunSwitch(const Stage& stage)
            Fail(stage.title + ": ovs-vsctl failed: " + OneLine(result.errors));
 }
 
+/** The module makes a bond of its own when it is loaded without a word about that. */
+void Applier::LoadBonding(const Stage& stage) const
+{
+    const bool makesBond =
+        std::any_of(stage.lines.begin(), stage.lines.end(), [](const std::string& line) {
+            return line.rfind("link add ", 0) == 0 && line.find(" type bond") != std::string::npos;
+        });
+    ProcessResult result;
+    if (makesBond && ::access(kBondingLoaded, F_OK) != 0) {
+        (void)Program({kModuleTool, "-q", "bonding", "max_bonds=0"}, kToolDeadline, "", result);
+    }
+}
+
 bool Applier::RunBatch(const Stage& stage)
 {
+    LoadBonding(stage);
     std::string input;
     for (const std::string& line : stage.lines) {
         input += line + "\n";

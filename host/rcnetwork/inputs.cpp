@@ -139,7 +139,7 @@ void ReadFormerBonds(Inputs& inputs)
     for (const std::string& name : names) {
         const auto bond = name.empty() ? std::nullopt : RememberedBond::Load(name);
         if (bond) {
-            inputs.formerBonds[name] = {bond->slaves, bond->mac, SwitchColumns(bond->options)};
+            inputs.formerBonds[name] = {*bond, SwitchColumns(bond->options)};
         }
     }
 }

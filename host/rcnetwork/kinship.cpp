@@ -6,8 +6,6 @@
 namespace vornhost {
 namespace {
 
-constexpr char kTagPrefix[] = "tag";
-
 std::vector<std::string> SplitAtCommas(const std::string& text)
 {
     std::istringstream stream(text);
@@ -44,13 +42,6 @@ std::vector<std::string> InGivenOrder(const SwitchPort& port)
 }
 
 } // namespace
-
-bool IsTagDevice(const Link& link)
-{
-    const auto digits = link.name.find_first_not_of("0123456789", sizeof kTagPrefix - 1);
-    return link.kind == "vlan" && link.name.rfind(kTagPrefix, 0) == 0 &&
-           digits != std::string::npos && link.name[digits] == '.';
-}
 
 Kinship::Kinship(const Inputs& inputs) : m_inputs(inputs)
 {
@@ -96,6 +87,11 @@ void Kinship::ReadWanted()
             m_members[file.master].push_back(name);
         }
     }
+    ReadWantedBridges();
+    // While the files of a bond are moved to its first member or back there are two of everything.
+    std::erase_if(m_members, [&](const auto& entry) {
+        return entry.second.empty() && !m_switchBonds.contains(entry.first);
+    });
     // Whoever is a member already keeps its place.
     for (auto& [bond, members] : m_members) {
         const auto live = m_inputs.live.bonds.find(bond);
@@ -103,7 +99,7 @@ void Kinship::ReadWanted()
         std::vector<std::string> order =
             live != m_inputs.live.bonds.end() ? live->second.members : std::vector<std::string>();
         if (order.empty() && remembered != m_inputs.formerBonds.end()) {
-            order = remembered->second.members;
+            order = remembered->second.bond.slaves;
         }
         if (!m_switchBonds.contains(bond)) {
             std::stable_sort(members.begin(), members.end(), [&](const auto& one, const auto& two) {
@@ -114,8 +110,70 @@ void Kinship::ReadWanted()
     }
 }
 
+void Kinship::ReadWantedBridges()
+{
+    for (const auto& [name, file] : m_inputs.files) {
+        const InterfaceFile* bridge = UsableFile(file.bridge);
+        if (file.use != FileUse::kPlain || file.slave || bridge == nullptr ||
+            file.bridge == BridgeOf(name) || file.bridge == name) {
+            continue;
+        }
+        if (bridge->use == FileUse::kBridge && !bridge->slave) {
+            m_furtherPorts[PlainOf(file.bridge)].push_back(name);
+        } else if (bridge->linuxBridge && bridge->onBoot) {
+            m_linuxBridges.insert(file.bridge);
+            m_members[file.bridge].push_back(name);
+        }
+    }
+}
+
+bool Kinship::IsWantedLinuxBridge(const std::string& name) const
+{
+    return m_linuxBridges.contains(name);
+}
+
+std::string Kinship::HostOf(const std::string& furtherPort) const
+{
+    for (const auto& [unit, ports] : m_furtherPorts) {
+        if (Contains(ports, furtherPort)) {
+            return unit;
+        }
+    }
+    return {};
+}
+
+std::vector<std::string> Kinship::FurtherPortsOf(const std::string& unit) const
+{
+    const auto found = m_furtherPorts.find(unit);
+    return found == m_furtherPorts.end() ? std::vector<std::string>() : found->second;
+}
+
+bool Kinship::IsLinuxBridge(const std::string& name) const
+{
+    const Link* link = m_inputs.live.FindLink(name);
+    return link != nullptr && link->kind == "bridge";
+}
+
+/** Bridges that no file and no earlier run knows of are other programs'. */
+void Kinship::ReadLiveBridges()
+{
+    for (const Link& bridge : m_inputs.live.links) {
+        const InterfaceFile* file = UsableFile(bridge.name);
+        const bool known = (file != nullptr && file->linuxBridge) || IsMade(bridge.name);
+        if (bridge.kind != "bridge" || !known) {
+            continue;
+        }
+        for (const Link& port : m_inputs.live.links) {
+            if (port.master == bridge.index) {
+                m_liveMembers[bridge.name].push_back(port.name);
+            }
+        }
+    }
+}
+
 void Kinship::ReadLive()
 {
+    ReadLiveBridges();
     for (const auto& [name, bond] : m_inputs.live.bonds) {
         m_liveMembers[name] = bond.members;
     }
@@ -142,6 +200,14 @@ std::string Kinship::MasterOf(const std::string& name) const
     return found == m_members.end() ? std::string() : found->first;
 }
 
+bool Kinship::IsBondWithoutMembers(const std::string& name) const
+{
+    const InterfaceFile* file = UsableFile(name);
+    const bool madeBefore = IsMade(name) && m_inputs.live.bonds.contains(name);
+    return file != nullptr && file->use == FileUse::kPlain && (file->bond || madeBefore) &&
+           m_inputs.request.verb == Verb::kStart && !IsWantedBond(name);
+}
+
 bool Kinship::HasUnclearMaster(const std::string& name) const
 {
     const InterfaceFile* file = UsableFile(name);
@@ -165,13 +231,34 @@ std::string Kinship::LiveMasterOf(const std::string& name) const
     return {};
 }
 
+bool Kinship::IsMade(const std::string& name) const
+{
+    const auto record = m_inputs.runState.interfaces.find(name);
+    return record != m_inputs.runState.interfaces.end() && record->second.made;
+}
+
+/** Whether the file of none of its ports asks for a bridge any more. */
+bool Kinship::IsLeftByAll(const std::string& bridge) const
+{
+    const auto members = LiveMembersOf(bridge);
+    return std::none_of(members.begin(), members.end(), [&](const std::string& name) {
+        const InterfaceFile* file = UsableFile(name);
+        return file != nullptr && file->bridge == bridge;
+    });
+}
+
 /** A bond that somebody else made is not taken apart because it has no file. */
 bool Kinship::IsOurs(const std::string& bond) const
 {
-    const auto record = m_inputs.runState.interfaces.find(bond);
+    if (IsLinuxBridge(bond)) {
+        return IsMade(bond) ||
+               (m_inputs.request.verb == Verb::kStart && HasFile(bond) && IsLeftByAll(bond));
+    }
     const SwitchBridge* bridge = m_inputs.switchState.Find(BridgeFor(bond));
-    return (record != m_inputs.runState.interfaces.end() && record->second.made) ||
-           m_inputs.formerBonds.contains(bond) || (bridge != nullptr && bridge->marked);
+    const auto former = m_inputs.formerBonds.find(bond);
+    const bool remembered =
+        former != m_inputs.formerBonds.end() && former->second.bond.HasSlaves(LiveMembersOf(bond));
+    return IsMade(bond) || remembered || (bridge != nullptr && bridge->marked);
 }
 
 /** Whether an interface's own files say soundly how it shall be. */
@@ -181,8 +268,9 @@ bool Kinship::IsSingleUnit(const std::string& name) const
     if (HasFile(BridgeOf(name)) && bridge == nullptr) {
         return false;
     }
+    const InterfaceFile* file = UsableFile(name);
     return (bridge != nullptr && !bridge->slave) ||
-           (UsableFile(name) != nullptr && !HasUnclearMaster(name));
+           (file != nullptr && file->onlyAsMember.empty() && !HasUnclearMaster(name));
 }
 
 std::string Kinship::HeirAmong(const std::vector<std::string>& members) const
@@ -190,6 +278,9 @@ std::string Kinship::HeirAmong(const std::vector<std::string>& members) const
     for (const std::string& name : members) {
         if (!MasterOf(name).empty()) {
             return MasterOf(name);
+        }
+        if (!HostOf(name).empty()) {
+            return HostOf(name);
         }
         if (m_inputs.request.verb == Verb::kStop) {
             return name;
@@ -200,13 +291,27 @@ std::string Kinship::HeirAmong(const std::vector<std::string>& members) const
     return {};
 }
 
+/** Whether a file is there, sound or not, that the bond or bridge may be there for. */
+bool Kinship::IsAsked(const std::string& bond) const
+{
+    const InterfaceFile* file = UsableFile(bond);
+    const bool dropped = IsLinuxBridge(bond) && file != nullptr && !file->onBoot;
+    return m_inputs.request.verb == Verb::kStart && !dropped &&
+           (HasFile(bond) || HasFile(BridgeFor(bond)) || HasFile(BridgeOf(bond)));
+}
+
 void Kinship::ChooseHeirs()
 {
-    for (const auto& [bond, members] : m_liveMembers) {
-        const bool asked = m_inputs.request.verb == Verb::kStart &&
-                           (HasFile(bond) || HasFile(BridgeFor(bond)) || HasFile(BridgeOf(bond)));
-        if (asked || !IsOurs(bond)) {
+    for (const auto& [bond, all] : m_liveMembers) {
+        if (IsAsked(bond) || !IsOurs(bond)) {
             continue;
+        }
+        std::vector<std::string> members = all;
+        // Other programs plug what they like into a bridge.
+        if (IsLinuxBridge(bond)) {
+            std::erase_if(members, [&](const std::string& name) {
+                return !HasFile(name) && !HasFile(BridgeOf(name));
+            });
         }
         const std::string heir = HeirAmong(members);
         if (!heir.empty()) {
@@ -251,8 +356,8 @@ std::string Kinship::ParentFor(const FileVlan& vlan) const
 
 std::set<std::string> Kinship::RelativesOf(const std::string& name) const
 {
-    std::set<std::string> relatives{MasterOf(name), LiveMasterOf(name)};
-    for (const auto& members : {MembersOf(name), LiveMembersOf(name)}) {
+    std::set<std::string> relatives{MasterOf(name), LiveMasterOf(name), HostOf(name)};
+    for (const auto& members : {MembersOf(name), LiveMembersOf(name), FurtherPortsOf(name)}) {
         relatives.insert(members.begin(), members.end());
     }
     const bool starts = m_inputs.request.verb == Verb::kStart;

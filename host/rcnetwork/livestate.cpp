@@ -80,6 +80,17 @@ std::string LiveState::NameOf(int index) const
     return link == nullptr ? std::string() : link->name;
 }
 
+std::vector<std::string> LiveState::WithVlans(const Link& link) const
+{
+    std::vector<std::string> names{link.name};
+    for (const Link& each : links) {
+        if (each.kind == "vlan" && each.parent == link.index) {
+            names.push_back(each.name);
+        }
+    }
+    return names;
+}
+
 std::string LiveState::Setting(const std::string& interface, const std::string& name) const
 {
     const auto found = settings.find(interface);

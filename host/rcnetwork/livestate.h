@@ -36,6 +36,8 @@ struct LiveState {
 
     const Link* FindLink(const std::string& name) const;
     const Link* FindLink(int index) const;
+    /** @return  the names of an interface and of the VLANs' interfaces that stand on it. */
+    std::vector<std::string> WithVlans(const Link& link) const;
     /** @return  the interface's name, empty when there is none of that index. */
     std::string NameOf(int index) const;
     /** @return  the setting, empty when the interface or the setting does not exist. */

@@ -4,28 +4,22 @@
 #include "report.h"
 
 #include "support/interfacename.h"
+#include "support/runlock.h"
 
 #include <cerrno>
-#include <chrono>
 #include <csignal>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <thread>
 
-#include <fcntl.h>
-#include <sys/file.h>
 #include <sys/prctl.h>
-#include <sys/stat.h>
 #include <syslog.h>
-#include <unistd.h>
 
 namespace vornhost {
 namespace {
 
-constexpr char kLockPath[] = "/run/vornovs/network.lock";
-constexpr std::chrono::seconds kLockWait{90};
-constexpr std::chrono::milliseconds kLockPoll{50};
+constexpr char kLockName[] = "network.lock";
+constexpr int kLockSeconds = 90;
 constexpr int kUsageError = 2;
 constexpr char kBondVerb[] = "set-ovs-bond";
 /** Of the hook program that is told of conversions: "begin" or "end". */
@@ -40,39 +34,21 @@ constexpr char kUsage[] =
     "  --dry-run   print what would be done and change nothing\n"
     "Exit status: 0 all of it is so now, 1 something is not (it says what), 2 wrong usage.\n";
 
-/** Lets one run at a time change the network; free again when its owner dies. */
-class NetworkLock {
-public:
-    NetworkLock();
-    ~NetworkLock();
-    NetworkLock(const NetworkLock&) = delete;
-    NetworkLock& operator=(const NetworkLock&) = delete;
-
-    bool Held() const { return m_held; }
-
-private:
-    int m_file = -1;
-    bool m_held = false;
-};
-
-NetworkLock::NetworkLock()
+int Fail(const std::string& text)
 {
-    (void)mkdir(kRunFolder, 0700);
-    m_file = open(kLockPath, O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0600);
-    const auto deadline = std::chrono::steady_clock::now() + kLockWait;
-    while (m_file >= 0 && !m_held && std::chrono::steady_clock::now() < deadline) {
-        m_held = flock(m_file, LOCK_EX | LOCK_NB) == 0;
-        if (!m_held) {
-            std::this_thread::sleep_for(kLockPoll);
-        }
-    }
+    Say({Severity::kError, text});
+    return EXIT_FAILURE;
 }
 
-NetworkLock::~NetworkLock()
+/** Lets one run at a time change the network; free again when its owner dies. */
+Descriptor TakeNetworkLock()
 {
-    if (m_file >= 0) {
-        (void)close(m_file);
-    }
+    return TakeRunLock(kLockName, LockDeadlineIn(kLockSeconds));
+}
+
+int FailWithoutLock()
+{
+    return Fail(std::string("cannot get the lock ") + kRunFolder + "/" + kLockName);
 }
 
 struct CommandLine {
@@ -111,12 +87,6 @@ bool ParseCommandLine(int count, char** arguments, CommandLine& line)
            (line.verb == kHolderVerb && !line.token.empty());
 }
 
-int Fail(const std::string& text)
-{
-    Say({Severity::kError, text});
-    return EXIT_FAILURE;
-}
-
 int Start(const Request& request)
 {
     // The hold lasts until all is done: if this run is killed, its holder finishes the work.
@@ -145,9 +115,9 @@ int RunHolder(const std::string& token)
     // Started through /proc it would be listed as "exe".
     (void)prctl(PR_SET_NAME, "rc.network");
     WaitForStart(token, HoldTime());
-    const NetworkLock lock;
-    if (!lock.Held()) {
-        return Fail(std::string("cannot get the lock ") + kLockPath);
+    const Descriptor lock = TakeNetworkLock();
+    if (!lock) {
+        return FailWithoutLock();
     }
     const auto request = HeldBy(token);
     if (!request) {
@@ -167,9 +137,9 @@ int Run(const CommandLine& line)
     if (line.verb == kHolderVerb) {
         return RunHolder(line.token);
     }
-    const NetworkLock lock;
-    if (!lock.Held()) {
-        return Fail(std::string("cannot get the lock ") + kLockPath);
+    const Descriptor lock = TakeNetworkLock();
+    if (!lock) {
+        return FailWithoutLock();
     }
     if (line.verb == kBondVerb) {
         return SetSwitchBond(line.bond) ? EXIT_SUCCESS : EXIT_FAILURE;

@@ -12,6 +12,7 @@
 
 #include "support/gatewaystore.h"
 #include "support/interfacefile.h"
+#include "support/remembered.h"
 #include "support/switchdatabase.h"
 
 #include <map>
@@ -43,8 +44,7 @@ struct SwitchState {
 
 /** A bond of the kernel that the switch stands in for, as it was. */
 struct FormerBond {
-    std::vector<std::string> members;
-    std::string mac;
+    RememberedBond bond;
     SwitchValues columns; ///< What its options are called on the switch.
 };
 

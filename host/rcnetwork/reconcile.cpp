@@ -82,7 +82,8 @@ void Reconciler::RememberNames(const Inputs& inputs)
     for (const std::string& name : m_request.names) {
         const Kinship kinship(inputs);
         const Link* link = inputs.live.FindLink(name);
-        const bool made = link != nullptr && (link->kind == "bond" || link->kind == "vlan");
+        const bool made = link != nullptr &&
+                          (link->kind == "bond" || link->kind == "vlan" || link->kind == "bridge");
         if (made || !kinship.LiveMembersOf(name).empty() ||
             inputs.runState.interfaces.contains(name)) {
             m_request.known.insert(name);

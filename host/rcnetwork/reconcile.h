@@ -9,7 +9,6 @@
 namespace vornhost {
 
 /** The folder of everything that lasts until the next boot. */
-constexpr char kRunFolder[] = "/run/vornovs";
 
 /** Prints what would be done. @return  whether the request can be fulfilled. */
 bool PrintPlan(const Request& request);

@@ -241,14 +241,44 @@ void RoutePlanner::PlanLiveRoute(const Route& route)
     if (unit == nullptr && route.nextHops.size() == 1) {
         unit = UnitOf(route.nextHops[0].index);
     }
-    if (unit == nullptr || GivesWay(*unit, route)) {
+    if (unit == nullptr) {
+        RestoreRoute(route);
+        return;
+    }
+    if (GivesWay(*unit, route)) {
         return;
     }
     if (IsUnwanted(*unit, route)) {
         RemoveRoute(route);
     } else if (source != nullptr) {
         CarryRoute(*source, route);
+    } else {
+        RestoreRoute(route);
     }
+}
+
+void RoutePlanner::RestoreRoute(const Route& route)
+{
+    if (IsFlushed(route)) {
+        const NameOfIndex nameOf = [&](int index) { return m_inputs.live.NameOf(index); };
+        Put(m_steps.beside, route,
+            (IsAlone(route) ? "route replace " : "route append ") + RouteArguments(route, nameOf));
+    }
+}
+
+/** Whether the kernel forgets the route because its interface is down for a moment. */
+bool RoutePlanner::IsFlushed(const Route& route) const
+{
+    return std::any_of(m_units.begin(), m_units.end(), [&](const Unit& unit) {
+        if (!unit.changesMode) {
+            return false;
+        }
+        const auto names = m_inputs.live.WithVlans(*unit.port);
+        return std::any_of(route.nextHops.begin(), route.nextHops.end(), [&](const NextHop& hop) {
+            return std::find(names.begin(), names.end(), m_inputs.live.NameOf(hop.index)) !=
+                   names.end();
+        });
+    });
 }
 
 void RoutePlanner::MakeWantedRoute(const Unit& unit, const Route& wanted)

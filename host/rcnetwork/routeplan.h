@@ -35,6 +35,8 @@ private:
     void PlanLiveRoute(const Route& route);
     void CarryRoute(const Unit& unit, const Route& route);
     void RemoveRoute(const Route& route);
+    void RestoreRoute(const Route& route);
+    bool IsFlushed(const Route& route) const;
     void MakeWantedRoute(const Unit& unit, const Route& wanted);
     void Put(BatchParts& parts, const Route& route, const std::string& line) const;
 

@@ -30,6 +30,7 @@ private:
     bool CarriesBefore() const;
     bool IsLate() const;
     bool IsOnWrongParent() const;
+    bool ChangesMode() const;
 
     const Inputs& m_inputs;
     const Kinship& m_kinship;
@@ -69,8 +70,7 @@ std::string SourceFinder::TagDevice() const
     if (owner == nullptr && !m_unit.members.empty()) {
         owner = m_unit.members.back();
     }
-    return "tag" + std::to_string(owner == nullptr ? 0 : owner->index) + "." +
-           std::to_string(*m_unit.tag);
+    return TagDeviceName(owner == nullptr ? 0 : owner->index, *m_unit.tag);
 }
 
 void SourceFinder::NameCarrier()
@@ -199,7 +199,26 @@ bool SourceFinder::IsLate() const
     const bool gathers = m_unit.kind == UnitKind::kBond &&
                          std::any_of(m_unit.members.begin(), m_unit.members.end(),
                                      [&](const Link* member) { return !CanJoinAnyTime(*member); });
-    return replaces || (gathers && m_unit.port == nullptr && !CarriesBefore());
+    const bool bridges =
+        m_unit.kind == UnitKind::kLinuxBridge &&
+        std::any_of(m_unit.members.begin(), m_unit.members.end(), [&](const Link* member) {
+            const bool joined = m_unit.port != nullptr && member->master == m_unit.port->index;
+            return !joined && !CanJoinAnyTime(*member);
+        });
+    return replaces || bridges || (gathers && m_unit.port == nullptr && !CarriesBefore());
+}
+
+bool SourceFinder::ChangesMode() const
+{
+    const auto live = m_inputs.live.bonds.find(m_unit.name);
+    const InterfaceFile* file = m_kinship.UsableFile(m_unit.name);
+    if (m_unit.kind != UnitKind::kBond || m_unit.port == nullptr || !m_unit.addWanted ||
+        file == nullptr || live == m_inputs.live.bonds.end()) {
+        return false;
+    }
+    const std::string wanted = BondOptionsOf(*file).Get("mode");
+    const auto mode = live->second.options.find("mode");
+    return !wanted.empty() && mode != live->second.options.end() && mode->second != wanted;
 }
 
 void SourceFinder::Run()
@@ -229,11 +248,12 @@ void SourceFinder::Run()
     }
     std::stable_partition(m_unit.sources.begin(), m_unit.sources.end(),
                           [&](const Source& source) { return HasAddresses(*source.link); });
-    if (m_unit.kind == UnitKind::kBond) {
+    if (m_unit.IsGroup()) {
         std::copy_if(m_unit.members.begin(), m_unit.members.end(), std::back_inserter(m_unit.idle),
                      [&](const Link* member) { return CanJoinAnyTime(*member); });
     }
     m_unit.late = IsLate();
+    m_unit.changesMode = ChangesMode();
 }
 
 } // namespace

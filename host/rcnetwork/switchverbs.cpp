@@ -124,9 +124,7 @@ bool SetSwitchBond(const std::string& bridge)
     const SwitchPort& port = *BondOn(*live);
     const auto former = inputs->formerBonds.find(PlainOf(bridge));
     const bool same =
-        former != inputs->formerBonds.end() &&
-        std::is_permutation(former->second.members.begin(), former->second.members.end(),
-                            file->slaveList.begin(), file->slaveList.end());
+        former != inputs->formerBonds.end() && former->second.bond.HasSlaves(file->slaveList);
     const PortColumns columns(*file, same ? &former->second : nullptr);
     if (const std::string objection = columns.Objection(); !objection.empty()) {
         return Refuse("ifcfg-" + bridge + ": " + objection + "; the bond is left as it is");

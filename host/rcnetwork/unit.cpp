@@ -49,7 +49,7 @@ const Source* Unit::SourceOf(int index) const
 
 std::vector<const Link*> Unit::Ports() const
 {
-    if (kind == UnitKind::kSwitchBond || (kind == UnitKind::kBond && port == nullptr)) {
+    if (kind == UnitKind::kSwitchBond || (IsGroup() && port == nullptr)) {
         return members;
     }
     return port == nullptr ? std::vector<const Link*>() : std::vector{port};

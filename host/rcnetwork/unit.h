@@ -12,10 +12,11 @@ namespace vornhost {
 enum class Target { kLeaveAlone, kPlain, kSwitch };
 
 enum class UnitKind {
-    kSingle,    ///< An interface by itself.
-    kVlan,      ///< A VLAN's interface, made when it is not there.
-    kBond,      ///< A bond of the kernel.
-    kSwitchBond ///< A bond of the switch: there is no interface but its bridge.
+    kSingle,      ///< An interface by itself.
+    kVlan,        ///< A VLAN's interface, made when it is not there.
+    kBond,        ///< A bond of the kernel.
+    kLinuxBridge, ///< A bridge of the kernel; its members are its ports.
+    kSwitchBond   ///< A bond of the switch: there is no interface but its bridge.
 };
 
 /** An interface from which addressing goes to the unit's carrier. */
@@ -41,12 +42,14 @@ struct Unit {
     bool heldDown = false;               ///< Waits for its bond without traffic of its own.
 
     std::vector<const Link*> members;  ///< Of a bond that is asked for: those that exist.
+    std::vector<const Link*> further;  ///< What shares the switch bridge with the port.
     std::vector<const Link*> idle;     ///< Those of them that can join before any traffic moves.
     std::optional<unsigned> tag;       ///< The VLAN in which the carrier's traffic shall be.
     std::string carrier;               ///< The interface that shall carry addresses and routes...
     const Link* carrierLink = nullptr; ///< ...null when there is none of that name yet...
     bool late = false;                 ///< ...and whether it can be used only once others let go.
     bool rebuilt = false;              ///< A VLAN's interface that stands on the wrong one.
+    bool changesMode = false;          ///< A bond that is there works in another mode.
     std::vector<Source> sources;       ///< The most important one first.
     std::vector<std::string> absorbed; ///< Units of which it takes everything over.
 
@@ -54,6 +57,8 @@ struct Unit {
     std::vector<std::string> ForeignPorts() const;
     /** Whether the bridge is still there afterwards: one of ours goes as a whole. */
     bool BridgeStays() const;
+    /** Whether it is an interface of the kernel that holds others. */
+    bool IsGroup() const { return kind == UnitKind::kBond || kind == UnitKind::kLinuxBridge; }
     const Source* SourceOf(int index) const;
     const Link* MainSource() const { return sources.empty() ? nullptr : sources.front().link; }
     /** The links through which it reaches the wire. */

@@ -6,6 +6,8 @@
 
 #include "decision.h"
 
+#include "support/bondoptions.h"
+
 #include <string>
 #include <vector>
 
@@ -85,23 +87,33 @@ private:
     std::string WantedMac() const;
     unsigned WantedMtu() const;
 
-    // unitdevices.cpp: bonds and VLANs of the kernel
+    // unitdevices.cpp: VLANs of the kernel
     void PlanDevices();
-    void MakeBond();
     bool BringsLinkLocal() const;
+    void MakeVlan(const std::string& device, const std::string& parent, unsigned id);
+    void RemoveOldVlans();
+
+    // unitbond.cpp: bonds of the kernel
+    void MakeBond();
     bool IsMissing(const Link& member) const;
     void Gather();
     void GatherMember(const Link& member, std::vector<std::string>& lines);
     void PutInOrder();
     void AdjustBondOptions();
+    void ChangeMode(const LiveBond& live, const BondOptions& options);
     void DissolveBonds();
     void DissolveBond(const std::string& bond);
     bool IsMember(const std::string& name) const;
     bool IsIdle(const Link* member) const;
     void ReleaseMember(const std::string& bond, const std::string& member,
                        std::vector<std::string>& lines);
-    void MakeVlan(const std::string& device, const std::string& parent, unsigned id);
-    void RemoveOldVlans();
+
+    // unitbridge.cpp: bridges of the kernel, and what shares a bridge of the switch
+    void PlanLinuxBridge();
+    void MakeLinuxBridge();
+    void ReleasePorts(const std::string& bridge);
+    void JoinFurtherPorts();
+    void LeaveFurtherPorts();
 
     // unitsettings.cpp: links and the kernel's settings of an interface
     void PlanLinks();
@@ -114,6 +126,7 @@ private:
     void MoveIpv6Stack();
     void SilencePorts();
     void SilencePort(const Link& port);
+    void SilenceMember(const Link& member);
     void RestorePort(const std::string& name);
     void PlanAutoconf();
     void Set(std::vector<std::string>& stage, const std::string& interface,

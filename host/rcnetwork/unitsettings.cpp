@@ -39,7 +39,7 @@ void UnitPlanner::Set(std::vector<std::string>& stage, const std::string& interf
 void UnitPlanner::PlanLinks()
 {
     for (const Link* port : m_unit.Ports()) {
-        if (m_unit.kind != UnitKind::kBond || m_unit.port != nullptr) {
+        if (!m_unit.IsGroup() || m_unit.port != nullptr) {
             PlanLink(*port);
         }
     }
@@ -119,8 +119,8 @@ bool UnitPlanner::IsReleased(const Link& link) const
 /** Settings can be written once the interface exists. */
 std::vector<std::string>& UnitPlanner::Settings() const
 {
-    const bool madeLate = m_unit.late && m_unit.carrierLink == nullptr &&
-                          (m_unit.kind != UnitKind::kBond || m_unit.tag);
+    const bool madeLate =
+        m_unit.late && m_unit.carrierLink == nullptr && (!m_unit.IsGroup() || m_unit.tag);
     return madeLate ? m_steps.settingsAfter : m_steps.settingsBefore;
 }
 
@@ -180,6 +180,16 @@ void UnitPlanner::SilencePorts()
         for (const Link* port : m_unit.Ports()) {
             SilencePort(*port);
         }
+        for (const Link* port : m_unit.further) {
+            SilenceMember(*port);
+        }
+        return;
+    }
+    if (m_unit.kind == UnitKind::kLinuxBridge) {
+        for (const Link* member : m_unit.members) {
+            SilenceMember(*member);
+        }
+        RestorePort(m_unit.name);
         return;
     }
     std::set<std::string> names{m_unit.name};
@@ -210,6 +220,14 @@ void UnitPlanner::SilencePort(const Link& port)
         Live(m_unit.bridge, kAddressMode) == kAddressModeNone && mode->second != kAddressModeNone &&
         port.name == m_unit.port->name) {
         Set(m_steps.settingsAfter, m_unit.bridge, kAddressMode, mode->second);
+    }
+}
+
+void UnitPlanner::SilenceMember(const Link& member)
+{
+    if (Live(member.name, kDisableIpv6) == "0") {
+        m_steps.records[member.name].formerSettings.emplace(kDisableIpv6, "0");
+        Set(m_steps.settingsAfter, member.name, kDisableIpv6, "1");
     }
 }
 

@@ -32,22 +32,17 @@ std::string Join(const std::vector<std::string>& words, const char* separator)
 const FormerBond* UnitPlanner::Remembered() const
 {
     const auto found = m_inputs.formerBonds.find(m_unit.name);
-    if (found == m_inputs.formerBonds.end()) {
-        return nullptr;
-    }
-    std::vector<std::string> former = found->second.members;
-    std::vector<std::string> members = m_kinship.MembersOf(m_unit.name);
-    std::sort(former.begin(), former.end());
-    std::sort(members.begin(), members.end());
-    return former == members ? &found->second : nullptr;
+    const bool same = found != m_inputs.formerBonds.end() &&
+                      found->second.bond.HasSlaves(m_kinship.MembersOf(m_unit.name));
+    return same ? &found->second : nullptr;
 }
 
 /** The bridge or bond of the kernel is known to the network outside by this link address. */
 std::string UnitPlanner::WantedMac() const
 {
     const FormerBond* former = Remembered();
-    if (former != nullptr && !former->mac.empty()) {
-        return former->mac;
+    if (former != nullptr && !former->bond.mac.empty()) {
+        return former->bond.mac;
     }
     const auto handed = m_inputs.handover.bonds.find(m_unit.name);
     if (handed != m_inputs.handover.bonds.end() && !handed->second.mac.empty()) {
@@ -57,7 +52,7 @@ std::string UnitPlanner::WantedMac() const
         m_unit.switchBridge->marked && !m_unit.switchBridge->hwaddr.empty()) {
         return m_unit.switchBridge->hwaddr;
     }
-    if (m_unit.kind == UnitKind::kBond && m_unit.port == nullptr) {
+    if (m_unit.IsGroup() && m_unit.port == nullptr) {
         return m_unit.members.empty() ? "" : m_unit.members.front()->mac;
     }
     return m_unit.port == nullptr ? "" : m_unit.port->mac;
@@ -94,7 +89,9 @@ void UnitPlanner::PlanBridge()
         m_steps.waitFor.push_back(m_unit.bridge + " " + WantedMac());
     }
     LeaveBridges();
+    LeaveFurtherPorts();
     JoinPort();
+    JoinFurtherPorts();
 }
 
 /** The MAC is given in the transaction that makes the bridge, so that it never has another one. */

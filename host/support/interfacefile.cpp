@@ -1,10 +1,10 @@
 #include "interfacefile.h"
 
 #include "interfacename.h"
+#include "interfacevalues.h"
 
 #include <algorithm>
 #include <array>
-#include <charconv>
 #include <sstream>
 #include <string_view>
 
@@ -17,61 +17,7 @@ constexpr char kFilePrefix[] = "ifcfg-";
 constexpr char kBridgePrefix[] = "ovs_";
 constexpr unsigned kMostNumberedAddresses = 256;
 constexpr unsigned kMostVlan = 4095;
-
-std::string Lower(std::string text)
-{
-    std::transform(text.begin(), text.end(), text.begin(),
-                   [](unsigned char letter) { return static_cast<char>(std::tolower(letter)); });
-    return text;
-}
-
-std::string Trimmed(const std::string& text)
-{
-    constexpr char kBlanks[] = " \t\r";
-    const auto first = text.find_first_not_of(kBlanks);
-    if (first == std::string::npos) {
-        return {};
-    }
-    return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
-}
-
-std::optional<unsigned> ToNumber(const std::string& text, unsigned least, unsigned most)
-{
-    unsigned value = 0;
-    const char* end = text.data() + text.size();
-    const auto [stop, error] = std::from_chars(text.data(), end, value);
-    if (error != std::errc() || stop != end || value < least || value > most) {
-        return std::nullopt;
-    }
-    return value;
-}
-
-/** @return  the address in its usual notation, empty when the text is none of the family. */
-std::string NormalAddress(int family, const std::string& text)
-{
-    std::array<unsigned char, sizeof(in6_addr)> bytes{};
-    std::array<char, INET6_ADDRSTRLEN> normal{};
-    if (inet_pton(family, text.c_str(), bytes.data()) != 1 ||
-        inet_ntop(family, bytes.data(), normal.data(), normal.size()) == nullptr) {
-        return {};
-    }
-    return normal.data();
-}
-
-std::optional<unsigned> MaskLength(const std::string& mask)
-{
-    in_addr address{};
-    if (inet_pton(AF_INET, mask.c_str(), &address) != 1) {
-        return std::nullopt;
-    }
-    const std::uint32_t bits = ntohl(address.s_addr);
-    const auto length = static_cast<unsigned>(__builtin_popcount(bits));
-    const std::uint32_t expected = length == 0 ? 0 : ~std::uint32_t{0} << (32U - length);
-    if (bits != expected) {
-        return std::nullopt;
-    }
-    return length;
-}
+constexpr unsigned kLongestForwardDelay = 30;
 
 bool IsFileOf(const KeyValueFile& file, const std::string& interface)
 {
@@ -107,6 +53,7 @@ private:
     void ReadStructure();
     void ReadBondOptions();
     void ReadVlan();
+    std::string ProtocolProblem() const;
     void DecideUse();
     void ReadLinkKeys();
     void ReadIpv4();
@@ -203,6 +150,11 @@ void Parser::ReadStructure()
     file.bond = type == "bond" || bonding == "yes" ||
                 std::any_of(options.begin(), options.end(),
                             [](const auto& option) { return option.first == "mode"; });
+    file.linuxBridge = type == "bridge";
+    if (file.linuxBridge) {
+        file.stp = YesOrNo("STP").value_or(false);
+        file.forwardDelay = Number("DELAY", 0, kLongestForwardDelay);
+    }
     ReadVlan();
 }
 
@@ -237,13 +189,25 @@ void Parser::ReadVlan()
     }
 }
 
+/** @return  why the addresses cannot be had; empty when the file itself says them. */
+std::string Parser::ProtocolProblem() const
+{
+    const std::string protocol = Lower(Value("BOOTPROTO"));
+    if (protocol == "dhcp" || protocol == "bootp") {
+        return "BOOTPROTO=" + protocol + " is not supported yet";
+    }
+    const bool known = protocol.empty() || protocol == "none" || protocol == "static";
+    return known ? "" : "BOOTPROTO=" + protocol + " is unknown";
+}
+
 void Parser::DecideUse()
 {
     InterfaceFile& file = m_parsed.file;
     const bool bridgeName = file.name.rfind(kBridgePrefix, 0) == 0;
     const bool bridgeType = Value("TYPE") == "OVS";
     const bool ofBond = !file.slaveList.empty(); // may have any name
-    const std::string protocol = Lower(Value("BOOTPROTO"));
+    const bool joinsBridge = !file.bridge.empty() && file.bridge != kBridgePrefix + file.name;
+    const std::string protocolProblem = ProtocolProblem();
 
     if (bridgeName && !bridgeType) {
         Leave("ignored, because its TYPE is not OVS");
@@ -251,14 +215,11 @@ void Parser::DecideUse()
         Leave("ignored, because a plain interface cannot have TYPE=OVS");
     } else if (bridgeType && !ofBond && kBridgePrefix + file.primary != file.name) {
         Leave("ignored, because its PRIMARY is \"" + file.primary + "\"");
-    } else if (protocol == "dhcp" || protocol == "bootp") {
-        Leave("BOOTPROTO=" + protocol + " is not supported yet");
-    } else if (!protocol.empty() && protocol != "none" && protocol != "static") {
-        Leave("BOOTPROTO=" + protocol + " is unknown");
-    } else if (!bridgeType && !file.bridge.empty() && file.bridge != kBridgePrefix + file.name) {
-        Leave("BRIDGE=" + file.bridge + " is not supported yet");
+    } else if (!protocolProblem.empty() && !file.slave && !joinsBridge) {
+        Leave(protocolProblem);
     } else {
         file.use = bridgeType ? FileUse::kBridge : FileUse::kPlain;
+        file.onlyAsMember = protocolProblem;
     }
 }
 

@@ -42,15 +42,20 @@ struct FileVlan {
 struct InterfaceFile {
     std::string name;
     FileUse use = FileUse::kNone;
-    std::string primary;                ///< The plain interface of a bridge file.
-    std::string bridge;                 ///< The bridge that a plain file names.
-    bool slave = false;                 ///< A member of a bond, or the bridge of one.
-    std::string master;                 ///< The bond of a plain file.
-    bool bond = false;                  ///< A plain file that says of itself to be a bond's.
-    std::vector<std::string> slaveList; ///< The members of the switch bond of a bridge file.
+    std::string primary;                  ///< The plain interface of a bridge file.
+    std::string bridge;                   ///< The bridge that a plain file names.
+    bool slave = false;                   ///< A member of a bond, or the bridge of one.
+    std::string master;                   ///< The bond of a plain file.
+    bool bond = false;                    ///< A plain file that says of itself to be a bond's.
+    bool linuxBridge = false;             ///< A plain file of a bridge of the kernel.
+    bool stp = false;                     ///< Whether that keeps loops away...
+    std::optional<unsigned> forwardDelay; ///< ...and the seconds a port listens before it forwards.
+    std::vector<std::string> slaveList;   ///< The members of the switch bond of a bridge file.
     /** BONDING_OPTS in its order: options of the kernel's bond or columns of the switch's. */
     std::vector<std::pair<std::string, std::string>> bondOptions;
     std::optional<FileVlan> vlan; ///< Of a plain file.
+    /** Why the addressing cannot be given to the interface, which only a member does without. */
+    std::string onlyAsMember;
     bool onBoot = true;
     bool whole = true; ///< No value was refused: what is missing here is really not wanted.
     std::optional<unsigned> mtu;

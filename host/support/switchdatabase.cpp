@@ -201,7 +201,7 @@ const SwitchPort* FindUplink(const SwitchBridge& bridge, const std::string& prim
         if (port.name == primary) {
             return &port;
         }
-        if (port.marked && marked == nullptr) {
+        if (port.marked && !port.IsFurther() && marked == nullptr) {
             marked = &port;
         }
     }

@@ -17,6 +17,9 @@ namespace vornhost {
 constexpr char kSwitchMarkKey[] = "vornovs-network";
 constexpr char kSwitchMarkValue[] = "rc.network";
 
+/** The external id of a port that shares the bridge with the one that the bridge stands for. */
+constexpr char kFurtherPortKey[] = "vornovs-further";
+
 /** Columns of text and numbers, or the pairs of one column, by name. */
 using SwitchValues = std::map<std::string, std::string>;
 
@@ -34,6 +37,8 @@ struct SwitchPort {
     SwitchValues externalIds{};
 
     bool operator==(const SwitchPort&) const = default;
+    /** Whether the network program put it beside the port that the bridge stands for. */
+    bool IsFurther() const { return marked && externalIds.contains(kFurtherPortKey); }
 };
 
 struct SwitchBridge {
@@ -63,7 +68,7 @@ ReadSwitch(std::chrono::milliseconds limit = std::chrono::seconds(10));
 
 /**
  * Finds the port through which a bridge reaches the wire: the one of that name, else one that the
- * network program made. The bridge's own port and those of other programs are none.
+ * network program made. The bridge's own port, further ones and those of other programs are none.
  * @param primary  the interface that the bridge stands for; may be empty.
  */
 const SwitchPort* FindUplink(const SwitchBridge& bridge, const std::string& primary);

@@ -2,15 +2,23 @@
 
 namespace vornhost {
 
+namespace {
+
+constexpr char kPrefix[] = "tag";
+
+} // namespace
+
 std::string TagDeviceName(int parentIndex, unsigned vlanId)
 {
-    return "tag" + std::to_string(parentIndex) + '.' + std::to_string(vlanId);
+    return kPrefix + std::to_string(parentIndex) + '.' + std::to_string(vlanId);
 }
 
 bool IsTagDevice(const Link& link)
 {
-    return link.kind == "vlan" && link.vlanId >= 0 &&
-           link.name == TagDeviceName(link.parent, static_cast<unsigned>(link.vlanId));
+    const auto number = link.name.find_first_not_of("0123456789", sizeof kPrefix - 1);
+    return link.kind == "vlan" && link.name.rfind(kPrefix, 0) == 0 && number != std::string::npos &&
+           number > sizeof kPrefix - 1 &&
+           link.name.substr(number) == "." + std::to_string(link.vlanId);
 }
 
 } // namespace vornhost

@@ -14,7 +14,10 @@ namespace vornhost {
 /** @return  the name of the one for a VLAN on the interface of that index: "tag2.10". */
 std::string TagDeviceName(int parentIndex, unsigned vlanId);
 
-/** Tells whether an interface is one: its name says what it is by its kind. */
+/**
+ * Tells whether an interface is one, by its name and its number. The index in the name is not
+ * always its parent's: one that is made together with its bond is named after a slave.
+ */
 bool IsTagDevice(const Link& link);
 
 } // namespace vornhost

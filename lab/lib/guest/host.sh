@@ -117,6 +117,15 @@ remember_plain()
     done
 }
 
+# True when the slave of an aggregate collects and distributes frames, which it does some time after
+# both sides have found each other.
+slave_distributes()
+{
+    local state
+    state="$(cat "/sys/class/net/$1/bonding_slave/ad_actor_oper_port_state" 2>/dev/null)"
+    [ $((${state:-0} & 48)) -eq 48 ]
+}
+
 # True when each Linux bond has as many ports in use as its mode gives it, and agrees with its
 # partner where it has one.
 bonds_settled()
@@ -127,6 +136,9 @@ bonds_settled()
         [ -d "$folder" ] || return 1
         for slave in $(slaves_of "$bond"); do
             [ "$(cat "/sys/class/net/$slave/bonding_slave/mii_status" 2>/dev/null)" = up ] || return 1
+            if grep -q '802.3ad' "$folder/mode"; then
+                slave_distributes "$slave" || return 1
+            fi
         done
         if grep -q '802.3ad' "$folder/mode"; then
             expect_partner "$bond" || return 1

@@ -25,12 +25,13 @@ addresses_settled()
 }
 
 # Numbers of interfaces and aggregates change when a device is made anew, failures of a cable are
-# counted from then on, and say nothing; the switch's own device is part of the switch.
+# counted from then on, the clock of a bridge runs, and all that says nothing; the switch's own
+# device is part of the switch.
 snapshot_links()
 {
     ip -details -oneline link show |
         sed -E -e 's/^[0-9]+: //' -e 's/@(if)?[0-9]+:/:/' -e 's/ link-netns(id)? [^ ]+//' \
-            -e 's/ (ad_aggregator(_id)?|link_failure_count) [0-9]+//g' \
+            -e 's/ (ad_aggregator(_id)?|link_failure_count) [0-9]+//g' -e 's/ gc_timer +[0-9.]+//' \
             -e 's/\\//g' -e 's/  +/ /g' |
         sed '/^ovs-system:/d' | sort
 }

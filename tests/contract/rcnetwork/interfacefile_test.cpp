@@ -166,7 +166,6 @@ INSTANTIATE_TEST_SUITE_P(
         LeftAlone{"PlainWithBridgeType", "eth0", "DEVICE=eth0\nTYPE=OVS\n",
                   "ignored, because a plain interface cannot have TYPE=OVS"},
         LeftAlone{"Dhcp", "eth0", "BOOTPROTO=DHCP\n", "BOOTPROTO=dhcp is not supported yet"},
-        LeftAlone{"OtherBridge", "wlan0", "BRIDGE=br0\n", "BRIDGE=br0 is not supported yet"},
         LeftAlone{"UnknownProtocol", "eth0", "BOOTPROTO=magic\n", "BOOTPROTO=magic is unknown"}),
     [](const testing::TestParamInfo<LeftAlone>& row) { return row.param.description; });
 

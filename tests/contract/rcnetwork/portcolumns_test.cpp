@@ -48,9 +48,7 @@ TEST(PortColumns, ClearWhatEarlierOptionsSetAndNothingElse)
 
 TEST(PortColumns, TakeTheFilesValueBeforeTheRememberedOne)
 {
-    const FormerBond former{{"eth0", "eth1"},
-                            "02:00:00:00:00:01",
-                            {{"bond_updelay", "200"}, {"other_config:lacp-time", "slow"}}};
+    const FormerBond former{{}, {{"bond_updelay", "200"}, {"other_config:lacp-time", "slow"}}};
     const PortColumns columns(
         FileWith("bond_mode=balance-slb lacp=off other-config:lacp-time=fast"), &former);
 

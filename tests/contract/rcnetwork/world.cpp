@@ -253,8 +253,10 @@ World ReadWorld(const std::string& folder)
     world.inputs.gateways = GatewayStore::Parse(json.value("gateways", "")).Records();
     const Json formerBonds = json.value("formerBonds", Json::object());
     for (const auto& [name, bond] : formerBonds.items()) {
-        world.inputs.formerBonds[name] = {bond.at("members"), bond.at("mac"),
-                                          bond.value("columns", SwitchValues())};
+        FormerBond& former = world.inputs.formerBonds[name];
+        former.bond.slaves = bond.at("members").get<std::vector<std::string>>();
+        former.bond.mac = bond.at("mac").get<std::string>();
+        former.columns = bond.value("columns", SwitchValues());
     }
     if (json.contains("handover")) {
         world.inputs.handover = ParseHandover(json.at("handover").dump(), 0);

@@ -103,6 +103,14 @@ TEST(FindUplink, TakesTheMarkedPortWithoutAPrimary)
     EXPECT_EQ(*uplink, kMarked);
 }
 
+TEST(FindUplink, LeavesOutWhatWasPutBesideTheUplink)
+{
+    SwitchPort further = kMarked;
+    further.externalIds = {{kFurtherPortKey, "eth0"}};
+
+    EXPECT_EQ(FindUplink({"ovs_eth0", {kOwn, further}}, ""), nullptr);
+}
+
 TEST(FindUplink, FindsNoneAmongTheBridgesOwnPortAndThoseOfClients)
 {
     EXPECT_EQ(FindUplink({"ovs_eth0", {kOwn, kClients}}, "eth0"), nullptr);

@@ -126,11 +126,12 @@ TEST(ObstacleToTag, IsAVlanThatIsAPortItselfOrWhoseParentIsElsewhere)
     EXPECT_EQ(Obstacle(network), "its parent is out of sight");
 }
 
-TEST(TagDevices, AreKnownByTheirParentAndTheirNumber)
+TEST(TagDevices, AreKnownByTheirNameAndTheirNumber)
 {
     EXPECT_EQ(vornhost::TagDeviceName(2, 10), "tag2.10");
     EXPECT_TRUE(vornhost::IsTagDevice(MakeVlan(4, "tag2.10", 2, 10)));
-    EXPECT_FALSE(vornhost::IsTagDevice(MakeVlan(4, "tag2.10", 3, 10)));
+    EXPECT_TRUE(vornhost::IsTagDevice(MakeVlan(4, "tag2.10", 3, 10)));
+    EXPECT_FALSE(vornhost::IsTagDevice(MakeVlan(4, "tag.10", 2, 10)));
     EXPECT_FALSE(vornhost::IsTagDevice(MakeVlan(4, "tag2.10", 2, 11)));
     EXPECT_FALSE(vornhost::IsTagDevice(MakeLink(4, "tag2.10")));
 }

@@ -1,10 +1,10 @@
 /**
  * Locks on files, and the files below /run that only root can reach.
  */
-#ifndef VORNHOST_CORE_RUNLOCK_H
-#define VORNHOST_CORE_RUNLOCK_H
+#ifndef VORNHOST_SUPPORT_RUNLOCK_H
+#define VORNHOST_SUPPORT_RUNLOCK_H
 
-#include "support/descriptor.h"
+#include "descriptor.h"
 
 #include <chrono>
 #include <string>

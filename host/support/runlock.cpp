@@ -1,4 +1,4 @@
-#include "core/runlock.h"
+#include "runlock.h"
 
 #include <algorithm>
 #include <cerrno>

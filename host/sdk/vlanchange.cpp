@@ -67,7 +67,7 @@ public:
         }
         const std::string obstacle = ObstacleToTag(network, *vlan);
         if (parent == nullptr || !obstacle.empty()) {
-            return Fail(m_plan.name, "cannot be the tag of one port, because " + obstacle);
+            return Fail(m_plan.name, "is not what one tag can say: " + obstacle);
         }
         m_plan.parent = parent->name;
         m_plan.id = vlan->vlanId;

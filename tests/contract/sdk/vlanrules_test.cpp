@@ -76,7 +76,7 @@ TEST(ObstacleToTag, IsAnotherVlanOnTheParentOrOnTheVlan)
 {
     LiveNetwork network = Host();
     network.links.push_back(MakeVlan(4, "eth0.20", 2, 20));
-    EXPECT_EQ(Obstacle(network), "eth0 has other VLANs");
+    EXPECT_EQ(Obstacle(network), "eth0.20 is on it too");
 
     network.links.back().parent = 3;
     EXPECT_EQ(Obstacle(network), "VLANs stand on one another");

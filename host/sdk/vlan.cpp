@@ -1,8 +1,8 @@
 #include "vlanchange.h"
-#include "vlanrules.h"
 
 #include "netsdk/ipconfig.h"
 #include "support/interfacename.h"
+#include "support/vlanrules.h"
 
 #include <arpa/inet.h>
 #include <cstring>

@@ -1,12 +1,12 @@
 #include "vlanchange.h"
 
 #include "vlanfiles.h"
-#include "vlanrules.h"
 
 #include "support/fileslock.h"
 #include "support/filestates.h"
 #include "support/interfacename.h"
 #include "support/networkprogram.h"
+#include "support/vlanrules.h"
 
 #include <algorithm>
 #include <cerrno>

@@ -1,4 +1,4 @@
-#include "sdk/vlanrules.h"
+#include "support/vlanrules.h"
 
 #include "support/tagdevice.h"
 

@@ -1,9 +1,9 @@
 #include "vlanrules.h"
 
-#include "support/interfacefile.h"
-#include "support/interfacename.h"
-#include "support/settings.h"
-#include "support/tagdevice.h"
+#include "interfacefile.h"
+#include "interfacename.h"
+#include "settings.h"
+#include "tagdevice.h"
 
 #include <algorithm>
 #include <linux/if_ether.h>
@@ -101,6 +101,17 @@ std::string ObstacleToTag(const LiveNetwork& network, const Link& vlan)
     const Link* const parent = FindByIndex(network, vlan.parent);
     return ObstacleToTag(network, vlan,
                          parent != nullptr && HasOwnConfiguration(parent->name, vlan.vlanId));
+}
+
+const Link* FindVlanWithObstacle(const LiveNetwork& network, const std::string& parent)
+{
+    const Link* const link = network.Find(parent);
+    const auto found =
+        std::find_if(network.links.begin(), network.links.end(), [&](const Link& vlan) {
+            return link != nullptr && IsVlanOn(vlan, *link) &&
+                   !ObstacleToTag(network, vlan).empty();
+        });
+    return found == network.links.end() ? nullptr : &*found;
 }
 
 } // namespace vornhost

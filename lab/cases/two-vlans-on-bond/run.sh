@@ -5,12 +5,19 @@ remember_plain
 step "Register"
 probes_start
 timed Register vornovsctl register alpha
-probes_finish Register 1000
-ip -d link; ip a; ovs-vsctl show; head /etc/sysconfig/network-scripts/*
+expect_registered alpha
+for vlan in bond0.10 bond0.20 bond1.30; do
+    expect_logged "VLAN $vlan.*one tag"
+done
+for bond in bond0 bond1; do
+    expect_logged "bond $bond is not taken apart"
+done
+probes_finish Register 100
+pull_each_cable bond0 1000
 
 step "Unregister"
 probes_start
 timed UnRegister vornovsctl unregister alpha
-head /etc/sysconfig/network-scripts/*
-probes_finish UnRegister 1000
+expect_registered
+probes_finish UnRegister 100
 expect_plain

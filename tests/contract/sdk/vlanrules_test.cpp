@@ -126,6 +126,26 @@ TEST(ObstacleToTag, IsAVlanThatIsAPortItselfOrWhoseParentIsElsewhere)
     EXPECT_EQ(Obstacle(network), "its parent is out of sight");
 }
 
+TEST(FindVlanWithObstacle, FindsNoneWhereOneTagSaysItAll)
+{
+    EXPECT_EQ(vornhost::FindVlanWithObstacle(Host(), "eth0"), nullptr);
+    EXPECT_EQ(vornhost::FindVlanWithObstacle(Host(), "eth1"), nullptr) << "no such interface";
+}
+
+TEST(FindVlanWithObstacle, FindsOneOfSeveralAndOneBesideAnAddress)
+{
+    LiveNetwork network = Host();
+    network.addresses = {MakeAddress(2, RT_SCOPE_UNIVERSE)};
+    EXPECT_EQ(vornhost::FindVlanWithObstacle(network, "eth0"), &network.links[1]);
+
+    network = Host();
+    network.links.push_back(MakeVlan(4, "eth0.20", 2, 20));
+    network.links.push_back(MakeLink(5, "eth1"));
+    network.links.push_back(MakeVlan(6, "eth1.10", 5, 10));
+    EXPECT_EQ(vornhost::FindVlanWithObstacle(network, "eth0"), &network.links[1]);
+    EXPECT_EQ(vornhost::FindVlanWithObstacle(network, "eth1"), nullptr);
+}
+
 TEST(TagDevices, AreKnownByTheirParentAndTheirNumber)
 {
     EXPECT_EQ(vornhost::TagDeviceName(2, 10), "tag2.10");

@@ -15,6 +15,16 @@ done
 probes_finish Register 100
 pull_each_cable bond0 1000
 
+step "Start from the files, as after a loss of power"
+for bridge in $(ovs-vsctl list-br); do
+    ovs-vsctl del-br "$bridge"
+done
+ip link del bond0
+ip link del bond1
+rm -rf /run/vornovs/*
+expect_success /etc/rc.network start
+topology_ready
+
 step "Unregister"
 probes_start
 timed UnRegister vornovsctl unregister alpha

@@ -77,6 +77,9 @@ public:
         if (!StartNetworkOf(NamesOf(m_plan))) {
             return Fail(m_plan, "the network program cannot build it");
         }
+        if (KeepsAnotherMode()) {
+            return Fail(m_plan, "it keeps the mode that it had");
+        }
         const FilesLock lock;
         if (!lock || !WriteFileStates(OrderApart(m_plan), m_built.final)) {
             return -1;
@@ -115,6 +118,13 @@ private:
             ::syslog(LOG_NOTICE, "vornnetsdk: bond %s is %s again, for which the switch had %s",
                      m_plan.name.c_str(), mode.c_str(), m_plan.mode.c_str());
         }
+    }
+
+    /** A bond that stands gets another mode only by being built anew. */
+    bool KeepsAnotherMode() const
+    {
+        const auto live = BondOptions::ReadLive(m_plan.name);
+        return live && live->Get("mode") != ModeOf(m_plan, m_memory);
     }
 
     bool MoveGateways() const

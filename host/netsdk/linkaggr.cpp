@@ -4,6 +4,7 @@
 #include "support/interfacename.h"
 #include "support/switchdatabase.h"
 #include "support/uplink.h"
+#include "support/vlanrules.h"
 
 #include <algorithm>
 #include <cstring>
@@ -36,6 +37,15 @@ std::optional<Bond> KernelBond(const std::string& name)
         ::syslog(LOG_WARNING,
                  "vornnetsdk: bond %s is not taken apart: there is nothing like %s on the switch",
                  name.c_str(), mode.c_str());
+        return std::nullopt;
+    }
+    // Its VLANs cannot live elsewhere meanwhile, but they can on the bond while it is a port.
+    const auto network = vornhost::LiveNetwork::Read();
+    if (const auto* vlan = vornhost::FindVlanWithObstacle(network, name)) {
+        ::syslog(LOG_WARNING,
+                 "vornnetsdk: bond %s is not taken apart: its VLAN %s is not what one tag can say; "
+                 "it goes on to the switch whole",
+                 name.c_str(), vlan->name.c_str());
         return std::nullopt;
     }
     return bond;

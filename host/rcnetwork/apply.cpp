@@ -163,13 +163,12 @@ bool Applier::WaitForBridges(const Stage& stage)
         const auto stands = [&] {
             const auto links = ReadLinks();
             return std::any_of(links.begin(), links.end(), [&](const Link& link) {
-                return link.name == words.at(0) && link.mac == words.at(1);
+                return link.name == words.at(0) && (words.size() < 2 || link.mac == words[1]);
             });
         };
         while (!stands()) {
             if (std::chrono::steady_clock::now() > deadline) {
-                return Fail("the switch did not make " + words.at(0) + " with the address " +
-                            words.at(1));
+                return Fail("the switch did not make " + line);
             }
             std::this_thread::sleep_for(kBridgePoll);
         }

@@ -5,6 +5,7 @@
 #include "inputs.h"
 
 #include "support/atomicfile.h"
+#include "support/wholebonds.h"
 
 #include <algorithm>
 #include <cerrno>
@@ -221,6 +222,11 @@ bool Reconciler::ReportRest()
 
 bool Reconciler::Run()
 {
+    if (m_request.verb == Verb::kStart) {
+        std::vector<Remark> remarks;
+        MindWholeBonds(remarks);
+        SayOnce(remarks);
+    }
     StartServices();
     for (int i = 0; i < kTries && m_canGoOn; ++i) {
         if (Attempt()) {

@@ -55,6 +55,14 @@ std::string UnitPlanner::WantedMac() const
     if (m_unit.IsGroup() && m_unit.port == nullptr) {
         return m_unit.members.empty() ? "" : m_unit.members.front()->mac;
     }
+    if (m_unit.kind == UnitKind::kVlan && m_unit.port == nullptr) {
+        // It will have its parent's, and that its first member's.
+        const std::string& parent = m_inputs.files.at(m_unit.name).vlan->parent;
+        const auto members = m_kinship.MembersOf(parent);
+        const Link* link = m_inputs.live.FindLink(parent);
+        link = link == nullptr && !members.empty() ? m_inputs.live.FindLink(members.front()) : link;
+        return link == nullptr ? "" : link->mac;
+    }
     return m_unit.port == nullptr ? "" : m_unit.port->mac;
 }
 

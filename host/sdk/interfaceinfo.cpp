@@ -1,8 +1,8 @@
 #include "selection.h"
-#include "vlanrules.h"
 
 #include "support/interfacefile.h"
 #include "support/livesettings.h"
+#include "support/vlanrules.h"
 
 #include <algorithm>
 #include <cstring>

@@ -1,8 +1,8 @@
 #include "vlanchange.h"
-#include "vlanrules.h"
 
 #include "netsdk/ipconfig.h"
 #include "support/interfacename.h"
+#include "support/vlanrules.h"
 
 #include <arpa/inet.h>
 #include <cstring>
@@ -29,8 +29,8 @@ int Get(const std::string& name, _tag_VLIB_VLAN& record)
     const std::string obstacle = vornhost::ObstacleToTag(network, *vlan);
     if (parent == nullptr || !obstacle.empty()) {
         ::syslog(LOG_WARNING,
-                 "vornsdk: VLAN %s of %s cannot be the tag of one port, because %s; it goes on to "
-                 "the switch as an interface of its own",
+                 "vornsdk: VLAN %s on %s is not what one tag can say: %s; it goes on to the switch "
+                 "as a port of its own",
                  name.c_str(), parent == nullptr ? "nothing here" : parent->name.c_str(),
                  obstacle.c_str());
         return 0;

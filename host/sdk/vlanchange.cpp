@@ -1,12 +1,12 @@
 #include "vlanchange.h"
 
 #include "vlanfiles.h"
-#include "vlanrules.h"
 
 #include "support/fileslock.h"
 #include "support/filestates.h"
 #include "support/interfacename.h"
 #include "support/networkprogram.h"
+#include "support/vlanrules.h"
 
 #include <algorithm>
 #include <cerrno>
@@ -67,7 +67,7 @@ public:
         }
         const std::string obstacle = ObstacleToTag(network, *vlan);
         if (parent == nullptr || !obstacle.empty()) {
-            return Fail(m_plan.name, "cannot be the tag of one port, because " + obstacle);
+            return Fail(m_plan.name, "is not what one tag can say: " + obstacle);
         }
         m_plan.parent = parent->name;
         m_plan.id = vlan->vlanId;

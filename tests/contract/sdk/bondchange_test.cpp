@@ -44,9 +44,9 @@ protected:
     }
     ~BondChange() override { EXPECT_EQ(umount(vornhost::kInterfaceFolder), 0); }
 
-    static void Show()
+    static void Show(const std::string& mode = "802.3ad 4")
     {
-        contract::ShowBond("bond0", {{"mode", "802.3ad 4"}, {"slaves", "eth0 eth1"}});
+        contract::ShowBond("bond0", {{"mode", mode}, {"slaves", "eth0 eth1"}});
     }
 
     static void Write(const std::string& interface, const Files& files)
@@ -223,6 +223,7 @@ TEST_F(BondChange, WithoutMemoryMakesABondOfTheFirstSlavesAddressing)
 TEST_F(BondChange, IsOnlyOfTheModeAndTheSlavesWhenTheBondStands)
 {
     contract::WriteFile(contract::IfcfgPath("eth2"), "DEVICE=eth2\n");
+    Show("active-backup 1");
 
     EXPECT_EQ(Set(4), 0);
     Files wanted = kHost;
@@ -235,6 +236,25 @@ TEST_F(BondChange, IsOnlyOfTheModeAndTheSlavesWhenTheBondStands)
     wanted["eth2"] = "DEVICE=eth2\nMASTER=bond0\nSLAVE=yes\n";
     EXPECT_EQ(ReadFiles(), wanted);
     EXPECT_THAT(NetworkCalls(), ElementsAre("start bond0 eth0 eth1", "start bond0 eth0 eth1 eth2"));
+}
+
+TEST_F(BondChange, FailsWhenTheLiveBondKeepsAnotherMode)
+{
+    harness::SystemLog log;
+
+    EXPECT_EQ(Set(4), -1) << "the network program was content";
+    EXPECT_THAT(log.Lines(), ElementsAre("3 vornnetsdk: bond bond0: it keeps the mode that it "
+                                         "had"));
+
+    contract::InstallNetworkProgram({1});
+    EXPECT_EQ(Set(4), -1) << "the network program was not";
+
+    Show("active-backup 1");
+    EXPECT_EQ(Set(4), 0);
+    Files wanted = kHost;
+    wanted["bond0"] = "DEVICE=bond0\nIPADDR=192.0.2.10/24\n"
+                      "BONDING_OPTS=\"mode=active-backup miimon=100\"\n";
+    EXPECT_EQ(ReadFiles(), wanted);
 }
 
 TEST_F(BondChange, LeavesABondWithoutLinkMonitoringAsItWas)

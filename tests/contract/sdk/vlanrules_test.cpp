@@ -1,4 +1,4 @@
-#include "sdk/vlanrules.h"
+#include "support/vlanrules.h"
 
 #include "support/tagdevice.h"
 
@@ -76,7 +76,7 @@ TEST(ObstacleToTag, IsAnotherVlanOnTheParentOrOnTheVlan)
 {
     LiveNetwork network = Host();
     network.links.push_back(MakeVlan(4, "eth0.20", 2, 20));
-    EXPECT_EQ(Obstacle(network), "eth0 has other VLANs");
+    EXPECT_EQ(Obstacle(network), "eth0.20 is on it too");
 
     network.links.back().parent = 3;
     EXPECT_EQ(Obstacle(network), "VLANs stand on one another");
@@ -124,6 +124,26 @@ TEST(ObstacleToTag, IsAVlanThatIsAPortItselfOrWhoseParentIsElsewhere)
     network = Host();
     network.links[1].parent = 77;
     EXPECT_EQ(Obstacle(network), "its parent is out of sight");
+}
+
+TEST(FindVlanWithObstacle, FindsNoneWhereOneTagSaysItAll)
+{
+    EXPECT_EQ(vornhost::FindVlanWithObstacle(Host(), "eth0"), nullptr);
+    EXPECT_EQ(vornhost::FindVlanWithObstacle(Host(), "eth1"), nullptr) << "no such interface";
+}
+
+TEST(FindVlanWithObstacle, FindsOneOfSeveralAndOneBesideAnAddress)
+{
+    LiveNetwork network = Host();
+    network.addresses = {MakeAddress(2, RT_SCOPE_UNIVERSE)};
+    EXPECT_EQ(vornhost::FindVlanWithObstacle(network, "eth0"), &network.links[1]);
+
+    network = Host();
+    network.links.push_back(MakeVlan(4, "eth0.20", 2, 20));
+    network.links.push_back(MakeLink(5, "eth1"));
+    network.links.push_back(MakeVlan(6, "eth1.10", 5, 10));
+    EXPECT_EQ(vornhost::FindVlanWithObstacle(network, "eth0"), &network.links[1]);
+    EXPECT_EQ(vornhost::FindVlanWithObstacle(network, "eth1"), nullptr);
 }
 
 TEST(TagDevices, AreKnownByTheirNameAndTheirNumber)

@@ -294,8 +294,8 @@ TEST(VlanTrip, IsRefusedWhereOneTagCannotSayIt)
 
     EXPECT_EQ(ReadFiles(), host);
     EXPECT_THAT(NetworkCalls(), IsEmpty());
-    EXPECT_THAT(log.Lines(), ElementsAre("3 vornsdk: VLAN eth0.10: cannot be the tag of one port, "
-                                         "because eth0 has addresses of its own"));
+    EXPECT_THAT(log.Lines(), ElementsAre("3 vornsdk: VLAN eth0.10: is not what one tag can say: "
+                                         "eth0 has addresses of its own"));
 }
 
 TEST(VlanTrip, IsRefusedForWrongArguments)

@@ -1,9 +1,9 @@
 #include "vlanrules.h"
 
-#include "support/interfacefile.h"
-#include "support/interfacename.h"
-#include "support/settings.h"
-#include "support/tagdevice.h"
+#include "interfacefile.h"
+#include "interfacename.h"
+#include "settings.h"
+#include "tagdevice.h"
 
 #include <algorithm>
 #include <linux/if_ether.h>
@@ -27,11 +27,14 @@ bool IsVlanOn(const Link& link, const Link& parent)
     return link.kind == "vlan" && link.parent == parent.index && !IsTagDevice(link);
 }
 
-bool HasOtherVlan(const LiveNetwork& network, const Link& parent, const Link& vlan)
+/** @return  null when the VLAN is the only one there. */
+const Link* FindOtherVlan(const LiveNetwork& network, const Link& parent, const Link& vlan)
 {
-    return std::any_of(network.links.begin(), network.links.end(), [&](const Link& link) {
-        return link.index != vlan.index && IsVlanOn(link, parent);
-    });
+    const auto found =
+        std::find_if(network.links.begin(), network.links.end(), [&](const Link& link) {
+            return link.index != vlan.index && IsVlanOn(link, parent);
+        });
+    return found == network.links.end() ? nullptr : &*found;
 }
 
 bool CanBecomePort(const LiveNetwork& network, const Link& parent)
@@ -81,11 +84,11 @@ std::string ObstacleToTag(const LiveNetwork& network, const Link& vlan, bool par
     if (vlan.master != 0) {
         return "it is a port of another interface";
     }
-    if (parent->kind == "vlan" || HasOtherVlan(network, vlan, vlan)) {
+    if (parent->kind == "vlan" || FindOtherVlan(network, vlan, vlan) != nullptr) {
         return "VLANs stand on one another";
     }
-    if (HasOtherVlan(network, *parent, vlan)) {
-        return parent->name + " has other VLANs";
+    if (const Link* const other = FindOtherVlan(network, *parent, vlan)) {
+        return other->name + " is on it too";
     }
     if (parentsOwn || network.HasGlobalAddress(*parent)) {
         return parent->name + " has addresses of its own";
@@ -98,6 +101,17 @@ std::string ObstacleToTag(const LiveNetwork& network, const Link& vlan)
     const Link* const parent = FindByIndex(network, vlan.parent);
     return ObstacleToTag(network, vlan,
                          parent != nullptr && HasOwnConfiguration(parent->name, vlan.vlanId));
+}
+
+const Link* FindVlanWithObstacle(const LiveNetwork& network, const std::string& parent)
+{
+    const Link* const link = network.Find(parent);
+    const auto found =
+        std::find_if(network.links.begin(), network.links.end(), [&](const Link& vlan) {
+            return link != nullptr && IsVlanOn(vlan, *link) &&
+                   !ObstacleToTag(network, vlan).empty();
+        });
+    return found == network.links.end() ? nullptr : &*found;
 }
 
 } // namespace vornhost

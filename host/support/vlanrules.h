@@ -1,10 +1,10 @@
 /**
  * Which of the host's VLAN interfaces the tag of a switch port can stand for.
  */
-#ifndef VORNHOST_SDK_VLANRULES_H
-#define VORNHOST_SDK_VLANRULES_H
+#ifndef VORNHOST_SUPPORT_VLANRULES_H
+#define VORNHOST_SUPPORT_VLANRULES_H
 
-#include "support/livesettings.h"
+#include "livesettings.h"
 
 #include <string>
 
@@ -27,6 +27,9 @@ std::string ObstacleToTag(const LiveNetwork& network, const Link& vlan, bool par
 
 /** The same, with what the parent's file says. */
 std::string ObstacleToTag(const LiveNetwork& network, const Link& vlan);
+
+/** @return  a VLAN on that interface that cannot be its tag; null when there is none. */
+const Link* FindVlanWithObstacle(const LiveNetwork& network, const std::string& parent);
 
 } // namespace vornhost
 

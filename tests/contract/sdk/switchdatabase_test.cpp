@@ -106,7 +106,7 @@ TEST(FindUplink, TakesTheMarkedPortWithoutAPrimary)
 TEST(FindUplink, LeavesOutWhatWasPutBesideTheUplink)
 {
     SwitchPort further = kMarked;
-    further.externalIds = {{kFurtherPortKey, "eth0"}};
+    further.externalIds = {{vornhost::kFurtherPortKey, "eth0"}};
 
     EXPECT_EQ(FindUplink({"ovs_eth0", {kOwn, further}}, ""), nullptr);
 }

@@ -67,9 +67,7 @@ bool ParseCommandLine(int count, char** arguments, CommandLine& line)
             line.dryRun = true;
         } else if (line.verb.empty()) {
             line.verb = argument;
-        } else if (line.verb == kHolderVerb) {
-            line.token = argument;
-        } else if (line.verb == kHandoverVerb && line.token.empty()) {
+        } else if (line.token.empty() && (line.verb == kHolderVerb || line.verb == kHandoverVerb)) {
             line.token = argument;
         } else if (line.verb == kBondVerb && line.bond.empty() && IsInterfaceName(argument)) {
             line.bond = argument;

@@ -217,7 +217,7 @@ void UnitPlanner::PlanAddresses()
             });
         });
     }
-    if (m_unit.addWanted) {
+    if (m_unit.addWanted && m_unit.file != nullptr) {
         for (const WantedAddress& wanted : m_unit.file->addresses) {
             AddWantedAddress(wanted);
         }

@@ -142,8 +142,9 @@ void UnitPlanner::ChangeMode(const LiveBond& live, const BondOptions& options)
     lines.push_back("link set dev " + bond + " address " + mac);
     lines.push_back("link set dev " + bond + " up");
     for (const std::string& member : members) {
-        lines.push_back("link set dev " + member + " down");
-        lines.push_back("link set dev " + member + " master " + bond);
+        const std::string link = "link set dev " + member;
+        lines.push_back(link + " down");
+        lines.push_back(link + " master " + bond);
     }
     m_remarks.push_back({Severity::kNotice, bond + " changes its mode to " + options.Get("mode")});
 }

@@ -58,8 +58,10 @@ void UnitPlanner::PlanLink(const Link& link)
     const bool wanted = m_unit.addWanted && !m_unit.takeDown;
     InterfaceRecord& record = link.name == m_unit.name ? m_record : m_steps.records[link.name];
     if (wanted && WantedMtu() != link.mtu) {
-        m_steps.beside.links.push_back("link set dev " + link.name + " mtu " +
-                                       std::to_string(WantedMtu()));
+        // A VLAN device takes its parent's MTU when it is made: the parent has it by then.
+        const bool raised = WantedMtu() > link.mtu;
+        auto& lines = raised ? m_steps.devices.links : m_steps.beside.links;
+        lines.push_back("link set dev " + link.name + " mtu " + std::to_string(WantedMtu()));
         record.formerMtu = record.formerMtu.value_or(link.mtu);
     }
     if (m_unit.heldDown) {

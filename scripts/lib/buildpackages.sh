@@ -28,6 +28,14 @@ lint_packages=(
     shellcheck
 )
 
+package_packages=(
+    debhelper
+    dpkg-dev
+    fakeroot
+    lintian
+    scdoc
+)
+
 coverage_packages=(
     gcovr
 )

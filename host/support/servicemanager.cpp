@@ -8,7 +8,6 @@
 #include <memory>
 #include <thread>
 
-#include <sys/stat.h>
 #include <systemd/sd-bus.h>
 
 namespace vornhost {
@@ -18,7 +17,6 @@ using std::chrono::microseconds;
 using std::chrono::milliseconds;
 using Clock = std::chrono::steady_clock;
 
-constexpr char kMark[] = "/run/systemd/system";
 constexpr char kAddress[] = "unix:path=/run/systemd/private";
 constexpr char kDestination[] = "org.freedesktop.systemd1";
 constexpr char kManagerPath[] = "/org/freedesktop/systemd1";
@@ -234,12 +232,6 @@ std::optional<std::string> UnitProperty(const std::string& unit, const char* pro
 }
 
 } // namespace
-
-bool SystemdRuns()
-{
-    struct stat status {};
-    return ::lstat(kMark, &status) == 0 && S_ISDIR(status.st_mode);
-}
 
 bool StartUnit(const std::string& unit, milliseconds deadline, std::string* error)
 {

@@ -9,10 +9,16 @@
 #include <optional>
 #include <string>
 
+#include <sys/stat.h>
+
 namespace vornhost {
 
 /** @return  whether systemd is what started this host; asks nobody. */
-bool SystemdRuns();
+inline bool SystemdRuns()
+{
+    struct stat status {};
+    return ::lstat("/run/systemd/system", &status) == 0 && S_ISDIR(status.st_mode);
+}
 
 /**
  * Has a unit started, stopped or started anew, and waits until systemd is done with that. A unit

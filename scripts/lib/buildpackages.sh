@@ -20,6 +20,7 @@ test_packages=(
     binutils
     clang
     iproute2
+    systemd
 )
 
 lint_packages=(

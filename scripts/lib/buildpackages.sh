@@ -30,6 +30,14 @@ lint_packages=(
     shellcheck
 )
 
+package_packages=(
+    debhelper
+    dpkg-dev
+    fakeroot
+    lintian
+    scdoc
+)
+
 coverage_packages=(
     gcovr
 )

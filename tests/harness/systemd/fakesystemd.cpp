@@ -106,7 +106,11 @@ void FakeSystemd::Server::Accept()
 std::string FakeSystemd::Server::StateOf(const std::string& unit) const
 {
     const std::lock_guard<std::mutex> guard(m_owner.m_mutex);
-    const auto found = m_owner.m_units.find(unit);
+    auto found = m_owner.m_units.find(unit);
+    const auto at = unit.find('@');
+    if (found == m_owner.m_units.end() && at != std::string::npos) {
+        found = m_owner.m_units.find(unit.substr(0, at + 1) + unit.substr(unit.rfind('.')));
+    }
     return found == m_owner.m_units.end() ? "" : found->second;
 }
 

@@ -10,6 +10,7 @@ build_packages=(
     libgtest-dev
     libnl-3-dev
     libnl-route-3-dev
+    libsystemd-dev
     ninja-build
     nlohmann-json3-dev
     pkg-config

@@ -101,5 +101,9 @@ lab_send_results()
 {
     system_log >"$lab_out/syslog" 2>/dev/null
     cp -r /var/log/openvswitch "$lab_out/openvswitch-log" 2>/dev/null
-    tar -C "$lab_out" -cf - . >/dev/ttyS2 2>/dev/null
+    # Set on the open line: a line that somebody closed may have forgotten how it was set.
+    {
+        stty raw -echo <&1
+        tar -C "$lab_out" -cf - . 2>/dev/null | cat
+    } >/dev/ttyS2
 }

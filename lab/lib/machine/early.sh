@@ -4,8 +4,6 @@
 set -u
 export PATH=/usr/sbin:/usr/bin LC_ALL=C
 
-stty -F /dev/ttyS1 raw -echo
-stty -F /dev/ttyS2 raw -echo
 mkdir -p /run/lock /lab/out
 
 # shellcheck source=../guest/main.sh

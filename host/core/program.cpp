@@ -138,6 +138,12 @@ const char* RunnerPath()
     return g_runnerPath.data();
 }
 
+std::string CompanionPath(const std::string& name)
+{
+    const std::string runner = RunnerPath();
+    return runner.substr(0, runner.rfind('/') + 1) + name;
+}
+
 std::vector<std::string> PlainEnvironment()
 {
     return {"PATH=/usr/sbin:/usr/bin:/sbin:/bin", "LC_ALL=C"};

@@ -23,6 +23,9 @@ constexpr std::chrono::milliseconds kProgramDeadline{120000};
 /** Path of vornrun, which is installed beside the library that this code is part of. */
 const char* RunnerPath();
 
+/** Path of another program in the same folder. */
+std::string CompanionPath(const std::string& name);
+
 /** PATH and LC_ALL: what every program gets, whatever the client's environment is. */
 std::vector<std::string> PlainEnvironment();
 

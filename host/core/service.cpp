@@ -1,32 +1,32 @@
+#include "support/service.h"
 #include "core/guard.h"
 #include "core/heldlocks.h"
 #include "core/program.h"
+#include "support/servicemanager.h"
 
 #include <cctype>
 #include <fstream>
-#include <optional>
 #include <sstream>
 #include <string>
-#include <string_view>
 
 #include <vornplatform/core.h>
 
 namespace {
 
 using vornhost::Guarded;
+using vornhost::kServiceScripts;
+using vornhost::SystemdRuns;
 
-constexpr char kScriptFolder[] = "/etc/init.d/";
+/** Where the kernel shows the services that systemd runs. */
+constexpr char kUnitFolder[] = "/sys/fs/cgroup/system.slice/";
 /** The kernel keeps that much of a process's name. */
 constexpr size_t kCommLength = 15;
 
-/** @return the service's script, nothing when the name cannot be one's. */
-std::optional<std::string> ScriptOf(const char* name)
+/** @return the service, empty when the name cannot be one's. */
+std::string NameOf(const char* name)
 {
-    const std::string_view service = name == nullptr ? "" : name;
-    if (service.empty() || service.front() == '.' || service.find('/') != std::string_view::npos) {
-        return std::nullopt;
-    }
-    return kScriptFolder + std::string(service);
+    const std::string service = name == nullptr ? "" : name;
+    return service.starts_with('.') || service.find('/') != std::string::npos ? "" : service;
 }
 
 /** What a script says about itself in a comment line such as "# pidfile: /run/x.pid". */
@@ -68,27 +68,47 @@ bool IsProcess(long pid, const std::string& name)
     return state != std::string::npos && stat.substr(state + 2, 1) != "Z";
 }
 
-bool IsRunning(const char* service)
+/** Whether a unit of systemd has processes: the kernel tells that in a file. */
+bool UnitHasProcesses(const std::string& service)
 {
-    const std::optional<std::string> script = ScriptOf(service);
-    if (!script) {
-        return false;
+    std::ifstream events(kUnitFolder + service + ".service/cgroup.events");
+    for (std::string line; std::getline(events, line);) {
+        if (line == "populated 1") {
+            return true;
+        }
     }
-    const std::string pidFile = Statement(*script, "pidfile");
-    const std::string name = Statement(*script, "processname");
-    const long pid = pidFile.empty() ? 0 : ReadPid(pidFile);
-    return pid != 0 && !name.empty() && IsProcess(pid, name);
+    return false;
 }
 
-int RunScript(const char* service, const char* verb)
+bool IsRunning(const char* name)
+{
+    const std::string service = NameOf(name);
+    if (service.empty()) {
+        return false;
+    }
+    const std::string script = kServiceScripts + service;
+    const std::string pidFile = Statement(script, "pidfile");
+    const std::string process = Statement(script, "processname");
+    if (pidFile.empty() || process.empty()) {
+        return SystemdRuns() && UnitHasProcesses(service);
+    }
+    const long pid = ReadPid(pidFile);
+    return pid != 0 && IsProcess(pid, process);
+}
+
+int Run(const char* name, const char* verb)
 {
     return Guarded(-1, [&] {
-        const std::optional<std::string> script = ScriptOf(service);
-        if (!script) {
+        const std::string service = NameOf(name);
+        if (service.empty()) {
             return -1;
         }
         vornhost::ProgramRequest request;
-        request.argv = {*script, verb};
+        if (SystemdRuns()) {
+            request.argv = {vornhost::CompanionPath("vornservice"), verb, service};
+        } else {
+            request.argv = {kServiceScripts + service, verb};
+        }
         request.locks = vornhost::DuplicateHeldLocks();
         const vornhost::RunnerReport report = vornhost::RunProgram(std::move(request));
         return report.startError == 0 && report.status == 0 ? 0 : -1;
@@ -105,15 +125,15 @@ int VLIBServiceIsRunning(const char* name)
 
 int VLIBServiceStart(const char* name, int)
 {
-    return RunScript(name, "start");
+    return Run(name, "start");
 }
 
 int VLIBServiceStop(const char* name, int)
 {
-    return RunScript(name, "stop");
+    return Run(name, "stop");
 }
 
 int VLIBServiceRestart(const char* name)
 {
-    return RunScript(name, "restart");
+    return Run(name, "restart");
 }

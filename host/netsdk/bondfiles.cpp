@@ -69,7 +69,7 @@ KeyValueFile FirstSlavesFile(const BondPlan& plan, const FileStates& before)
     if (HasFile(before, plan.name)) {
         file = FileOf(before, plan.name);
         (void)file.Set("DEVICE", slave);
-        RemoveKeys(file, {kOptions, "BONDING_MASTER", "TYPE", "HWADDR", "MACADDR"});
+        RemoveKeys(file, {kOptions, "BONDING_MASTER", "TYPE", "HWADDR", "MACADDR", "ETHTOOL_OPTS"});
         for (const std::string& key : own.Keys()) {
             if (IsCardKey(key)) {
                 (void)file.Set(key, *own.GetWritten(key));

@@ -65,6 +65,20 @@ std::string ScopeText(unsigned scope)
     }
 }
 
+std::string TypeText(unsigned type)
+{
+    switch (type) {
+    case RTN_BLACKHOLE:
+        return "blackhole ";
+    case RTN_UNREACHABLE:
+        return "unreachable ";
+    case RTN_PROHIBIT:
+        return "prohibit ";
+    default:
+        return {};
+    }
+}
+
 std::string DestinationText(const Route& route)
 {
     if (!route.destination.empty()) {
@@ -165,7 +179,7 @@ std::string RouteSlot(const Route& route)
 
 std::string RouteKeyText(const Route& route)
 {
-    std::string text = RouteSlot(route);
+    std::string text = TypeText(route.type) + RouteSlot(route);
     for (const NextHop& hop : route.nextHops) {
         text += " via " + (hop.gateway.empty() ? std::string("link") : hop.gateway);
     }
@@ -174,7 +188,7 @@ std::string RouteKeyText(const Route& route)
 
 std::string RouteArguments(const Route& route, const NameOfIndex& nameOf)
 {
-    std::string text = DestinationText(route);
+    std::string text = TypeText(route.type) + DestinationText(route);
     if (route.tos != 0) {
         text += " tos " + std::to_string(route.tos);
     }

@@ -1,6 +1,7 @@
 #include "interfacefile.h"
 
 #include "interfacename.h"
+#include "interfaceparser.h"
 #include "interfacevalues.h"
 
 #include <algorithm>
@@ -8,14 +9,10 @@
 #include <sstream>
 #include <string_view>
 
-#include <arpa/inet.h>
-
 namespace vornhost {
 namespace {
 
-constexpr char kFilePrefix[] = "ifcfg-";
 constexpr char kBridgePrefix[] = "ovs_";
-constexpr unsigned kMostNumberedAddresses = 256;
 constexpr unsigned kMostVlan = 4095;
 constexpr unsigned kLongestForwardDelay = 30;
 
@@ -30,43 +27,9 @@ bool IsFileOf(const KeyValueFile& file, const std::string& interface)
     return device == kBridgePrefix + interface && file.Get("PRIMARY") == interface;
 }
 
-/** Reads the keys of one file and keeps what there is to say about them. */
-class Parser {
-public:
-    Parser(const std::string& name, const std::string& text) : m_values(KeyValueFile::Parse(text))
-    {
-        m_parsed.file.name = name;
-        // A file without its last line break may be one that is being written.
-        m_parsed.file.whole = !text.empty() && text.back() == '\n';
-    }
+} // namespace
 
-    ParsedFile Parse();
-
-private:
-    std::string Value(const std::string& key) const;
-    std::string FileName() const { return kFilePrefix + m_parsed.file.name; }
-    void Leave(const std::string& reason);
-    void Refuse(const std::string& key, const std::string& reason);
-    std::optional<bool> YesOrNo(const std::string& key);
-    std::optional<unsigned> Number(const std::string& key, unsigned least, unsigned most);
-    bool IsOwnFile();
-    void ReadStructure();
-    void ReadBondOptions();
-    void ReadVlan();
-    std::string ProtocolProblem() const;
-    void DecideUse();
-    void ReadLinkKeys();
-    void ReadIpv4();
-    void ReadIpv4Address(const std::string& number);
-    void ReadIpv6();
-    void ReadIpv6Address(const std::string& key, const std::string& text);
-    std::string ReadGateway(const std::string& key, int family);
-
-    KeyValueFile m_values;
-    ParsedFile m_parsed;
-};
-
-std::string Parser::Value(const std::string& key) const
+std::string InterfaceParser::Value(const std::string& key) const
 {
     std::string value = Trimmed(m_values.Get(key).value_or(""));
     if (value.size() >= 2 && value.front() == value.back() &&
@@ -76,21 +39,21 @@ std::string Parser::Value(const std::string& key) const
     return value;
 }
 
-void Parser::Leave(const std::string& reason)
+void InterfaceParser::Leave(const std::string& reason)
 {
     m_parsed.file.use = FileUse::kLeaveAlone;
     m_parsed.remarks.push_back(
         {Severity::kWarning, FileName() + ": " + reason + "; the interface is left as it is"});
 }
 
-void Parser::Refuse(const std::string& key, const std::string& reason)
+void InterfaceParser::Refuse(const std::string& key, const std::string& reason)
 {
     m_parsed.file.whole = false;
     m_parsed.remarks.push_back(
         {Severity::kError, FileName() + ": " + key + "=" + Value(key) + ": " + reason});
 }
 
-std::optional<bool> Parser::YesOrNo(const std::string& key)
+std::optional<bool> InterfaceParser::YesOrNo(const std::string& key)
 {
     const std::string value = Lower(Value(key));
     if (value == "yes" || value == "true" || value == "on" || value == "1") {
@@ -105,7 +68,8 @@ std::optional<bool> Parser::YesOrNo(const std::string& key)
     return std::nullopt;
 }
 
-std::optional<unsigned> Parser::Number(const std::string& key, unsigned least, unsigned most)
+std::optional<unsigned> InterfaceParser::Number(const std::string& key, unsigned least,
+                                                unsigned most)
 {
     const std::string value = Value(key);
     if (value.empty()) {
@@ -118,7 +82,7 @@ std::optional<unsigned> Parser::Number(const std::string& key, unsigned least, u
     return number;
 }
 
-bool Parser::IsOwnFile()
+bool InterfaceParser::IsOwnFile()
 {
     if (m_values.Text().find('=') == std::string::npos) {
         Leave("ignored, because it is empty");
@@ -132,7 +96,7 @@ bool Parser::IsOwnFile()
     return true;
 }
 
-void Parser::ReadStructure()
+void InterfaceParser::ReadStructure()
 {
     InterfaceFile& file = m_parsed.file;
     file.primary = Value("PRIMARY");
@@ -158,7 +122,7 @@ void Parser::ReadStructure()
     ReadVlan();
 }
 
-void Parser::ReadBondOptions()
+void InterfaceParser::ReadBondOptions()
 {
     std::istringstream options(Value("BONDING_OPTS"));
     for (std::string option; options >> option;) {
@@ -172,7 +136,7 @@ void Parser::ReadBondOptions()
 }
 
 /** A VLAN's interface is called PARENT.ID, or its file says what its parent and its id are. */
-void Parser::ReadVlan()
+void InterfaceParser::ReadVlan()
 {
     InterfaceFile& file = m_parsed.file;
     const auto dot = file.name.rfind('.');
@@ -190,17 +154,15 @@ void Parser::ReadVlan()
 }
 
 /** @return  why the addresses cannot be had; empty when the file itself says them. */
-std::string Parser::ProtocolProblem() const
+std::string InterfaceParser::ProtocolProblem() const
 {
     const std::string protocol = Lower(Value("BOOTPROTO"));
-    if (protocol == "dhcp" || protocol == "bootp") {
-        return "BOOTPROTO=" + protocol + " is not supported yet";
-    }
-    const bool known = protocol.empty() || protocol == "none" || protocol == "static";
+    const bool known =
+        protocol.empty() || protocol == "none" || protocol == "static" || protocol == "dhcp";
     return known ? "" : "BOOTPROTO=" + protocol + " is unknown";
 }
 
-void Parser::DecideUse()
+void InterfaceParser::DecideUse()
 {
     InterfaceFile& file = m_parsed.file;
     const bool bridgeName = file.name.rfind(kBridgePrefix, 0) == 0;
@@ -223,12 +185,13 @@ void Parser::DecideUse()
     }
 }
 
-void Parser::ReadLinkKeys()
+void InterfaceParser::ReadLinkKeys()
 {
     InterfaceFile& file = m_parsed.file;
     file.onBoot = YesOrNo("ONBOOT").value_or(true);
     file.mtu = Number("MTU", 68, 65535);
     file.metric = Number("METRIC", 0, UINT32_MAX);
+    file.metric6 = Number("IPV6_METRIC", 0, UINT32_MAX);
     file.vlanId = Number("OVS_VLAN_ID", 0, kMostVlan);
     file.requiredMac = Lower(Value("HWADDR"));
     if (!Value("MACADDR").empty()) {
@@ -236,89 +199,17 @@ void Parser::ReadLinkKeys()
     }
 }
 
-void Parser::ReadIpv4Address(const std::string& number)
+void InterfaceParser::ReadLinkCommands()
 {
-    const std::string key = "IPADDR" + number;
-    std::string text = Value(key);
-    if (text.empty()) {
-        return;
-    }
-    std::optional<unsigned> length;
-    if (const auto slash = text.find('/'); slash != std::string::npos) {
-        length = ToNumber(text.substr(slash + 1), 0, 32);
-        text.resize(slash);
-    } else if (!Value("PREFIX" + number).empty()) {
-        length = Number("PREFIX" + number, 0, 32);
-    } else if (!Value("NETMASK" + number).empty()) {
-        length = MaskLength(Value("NETMASK" + number));
-        if (!length) {
-            Refuse("NETMASK" + number, "not a netmask");
-        }
-    }
-    const std::string local = NormalAddress(AF_INET, text);
-    if (local.empty()) {
-        Refuse(key, "not an IPv4 address");
-    } else if (!length) {
-        Refuse(key, "no length: neither PREFIX" + number + " nor NETMASK" + number + " is usable");
+    const auto commands = ParseLinkCommands(Value("ETHTOOL_OPTS"));
+    if (commands) {
+        m_parsed.file.linkCommands = *commands;
     } else {
-        m_parsed.file.addresses.push_back({AF_INET, local, *length});
+        Refuse("ETHTOOL_OPTS", "not settings of a link");
     }
 }
 
-std::string Parser::ReadGateway(const std::string& key, int family)
-{
-    std::string text = Value(key);
-    // A zone says through which interface, and that is this one.
-    text.resize(std::min(text.size(), text.find('%')));
-    if (text.empty()) {
-        return {};
-    }
-    std::string gateway = NormalAddress(family, text);
-    if (gateway.empty()) {
-        Refuse(key, family == AF_INET ? "not an IPv4 address" : "not an IPv6 address");
-    }
-    return gateway;
-}
-
-void Parser::ReadIpv4()
-{
-    ReadIpv4Address("");
-    for (unsigned i = 0; i < kMostNumberedAddresses; ++i) {
-        ReadIpv4Address(std::to_string(i));
-    }
-    m_parsed.file.gateway = ReadGateway("GATEWAY", AF_INET);
-}
-
-void Parser::ReadIpv6Address(const std::string& key, const std::string& text)
-{
-    const auto slash = text.find('/');
-    const auto length =
-        slash == std::string::npos ? std::optional(64U) : ToNumber(text.substr(slash + 1), 0, 128);
-    const std::string local = NormalAddress(AF_INET6, text.substr(0, slash));
-    if (local.empty() || !length) {
-        Refuse(key, "not an IPv6 address with its length");
-        return;
-    }
-    m_parsed.file.addresses.push_back({AF_INET6, local, *length});
-}
-
-void Parser::ReadIpv6()
-{
-    if (YesOrNo("IPV6INIT") == false) {
-        return;
-    }
-    m_parsed.file.autoconf = YesOrNo("IPV6_AUTOCONF");
-    if (const std::string address = Value("IPV6ADDR"); !address.empty()) {
-        ReadIpv6Address("IPV6ADDR", address);
-    }
-    std::istringstream secondaries(Value("IPV6ADDR_SECONDARIES"));
-    for (std::string address; secondaries >> address;) {
-        ReadIpv6Address("IPV6ADDR_SECONDARIES", address);
-    }
-    m_parsed.file.gateway6 = ReadGateway("IPV6_DEFAULTGW", AF_INET6);
-}
-
-ParsedFile Parser::Parse()
+ParsedFile InterfaceParser::Parse()
 {
     if (!IsOwnFile()) {
         return m_parsed;
@@ -327,21 +218,19 @@ ParsedFile Parser::Parse()
     DecideUse();
     if (m_parsed.file.use != FileUse::kLeaveAlone) {
         ReadLinkKeys();
-        ReadIpv4();
-        ReadIpv6();
+        ReadLinkCommands();
+        ReadAddressing();
     }
     return m_parsed;
 }
-
-} // namespace
 
 std::optional<KeyValueFile> LoadInterfaceFile(const std::string& interface)
 {
     if (!IsInterfaceName(interface)) {
         return std::nullopt;
     }
-    auto file =
-        KeyValueFile::Load(std::string(kConfigurationFolder) + "/" + kFilePrefix + interface);
+    auto file = KeyValueFile::Load(std::string(kConfigurationFolder) + "/" + kInterfaceFilePrefix +
+                                   interface);
     if (file && !IsFileOf(*file, interface)) {
         return std::nullopt;
     }
@@ -353,10 +242,10 @@ std::string InterfaceOfFileName(const std::string& fileName)
     constexpr std::array kForeignEndings{"~",        ".bak",      ".orig",     ".old",
                                          ".rpmsave", ".rpmnew",   ".rpmorig",  ".swp",
                                          ".tmp",     ".dpkg-old", ".dpkg-new", ".dpkg-dist"};
-    if (fileName.rfind(kFilePrefix, 0) != 0) {
+    if (fileName.rfind(kInterfaceFilePrefix, 0) != 0) {
         return {};
     }
-    const std::string name = fileName.substr(sizeof kFilePrefix - 1);
+    const std::string name = fileName.substr(sizeof kInterfaceFilePrefix - 1);
     const bool foreign = std::any_of(
         kForeignEndings.begin(), kForeignEndings.end(), [&](const std::string_view ending) {
             return name.size() > ending.size() &&
@@ -367,7 +256,7 @@ std::string InterfaceOfFileName(const std::string& fileName)
 
 ParsedFile ParseInterfaceFile(const std::string& name, const std::string& text)
 {
-    return Parser(name, text).Parse();
+    return InterfaceParser(name, text).Parse();
 }
 
 } // namespace vornhost

@@ -4,6 +4,7 @@
 #ifndef VORNHOST_SUPPORT_INTERFACEFILE_H
 #define VORNHOST_SUPPORT_INTERFACEFILE_H
 
+#include "interfaceroute.h"
 #include "keyvaluefile.h"
 #include "remark.h"
 
@@ -38,6 +39,21 @@ struct FileVlan {
     bool operator==(const FileVlan&) const = default;
 };
 
+/** What is asked of servers and routers, and as whom. */
+struct FileClient {
+    bool dhcp = false;                   ///< An IPv4 address from a server.
+    std::optional<bool> dhcp6;           ///< IPv6 addresses from a server; nothing: as routers say.
+    std::optional<std::string> id;       ///< Hex with colons; empty: none is sent.
+    std::optional<std::string> hostName; ///< Empty: none is sent; nothing: the host's.
+    std::string duid;                    ///< Hex with colons; empty: the one that the host keeps.
+    std::optional<std::uint32_t> iaid;
+    bool nameServers = true;  ///< Whether servers and routers say who resolves names...
+    bool routes = true;       ///< ...and which routes there are...
+    bool defaultRoute = true; ///< ...and a default route.
+
+    bool operator==(const FileClient&) const = default;
+};
+
 /** What one file asks for. */
 struct InterfaceFile {
     std::string name;
@@ -59,13 +75,29 @@ struct InterfaceFile {
     bool onBoot = true;
     bool whole = true; ///< No value was refused: what is missing here is really not wanted.
     std::optional<unsigned> mtu;
-    std::optional<unsigned> metric;
-    std::optional<unsigned> vlanId; ///< The tag of the switch's port that carries the addresses.
-    std::optional<bool> autoconf;   ///< Whether IPv6 addresses are taken from routers.
-    std::string requiredMac;        ///< The interface must have this link address.
+    std::optional<unsigned> metric;  ///< Of default routes...
+    std::optional<unsigned> metric6; ///< ...and of those of IPv6, where they have their own.
+    std::optional<unsigned> vlanId;  ///< The tag of the switch's port that carries the addresses.
+    bool ipv6 = true;
+    /** Whether IPv6 addresses are taken from routers; nothing: as the kernel is set to. */
+    std::optional<bool> autoconf;
+    std::string token;               ///< The interface's half of addresses that the kernel makes.
+    std::string linkLocal;           ///< Instead of the one that is made of the link address.
+    std::optional<unsigned> privacy; ///< Temporary addresses, as the kernel numbers it.
+    FileClient client;
+    std::string requiredMac; ///< The interface must have this link address.
     std::vector<WantedAddress> addresses;
     std::string gateway;
     std::string gateway6;
+    std::vector<Route> routes; ///< Their hops have no index.
+    std::vector<std::string> nameServers;
+    std::vector<std::string> searchDomains;
+    std::vector<LinkCommand> linkCommands; ///< For the card.
+
+    /** Whether the DHCP client is to run: for either family or for routers' advertisements. */
+    bool UsesClient() const;
+    /** Whether that makes the addresses out of what routers say. */
+    bool ClientHearsRouters() const;
 };
 
 /** A parsed file and what there is to say about it. */

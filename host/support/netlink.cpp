@@ -231,6 +231,17 @@ std::vector<RouteMetric> ReadMetrics(nlattr* list)
     return metrics;
 }
 
+/** Whether somebody can have made it: the kernel makes the other kinds by itself. */
+bool IsRouteOfInterest(const rtmsg& header)
+{
+    const bool leadsNowhere = header.rtm_type == RTN_BLACKHOLE ||
+                              header.rtm_type == RTN_UNREACHABLE || header.rtm_type == RTN_PROHIBIT;
+    return (header.rtm_family == AF_INET || header.rtm_family == AF_INET6) &&
+           (header.rtm_type == RTN_UNICAST || leadsNowhere) &&
+           header.rtm_protocol != RTPROT_KERNEL && header.rtm_protocol != RTPROT_REDIRECT &&
+           (header.rtm_flags & RTM_F_CLONED) == 0;
+}
+
 void ReadRouteAttributes(const rtmsg& header, const Attributes& attributes, Route& route)
 {
     route.table = Number(attributes[RTA_TABLE], header.rtm_table);
@@ -239,7 +250,7 @@ void ReadRouteAttributes(const rtmsg& header, const Attributes& attributes, Rout
     route.source = IpText(route.family, attributes[RTA_PREFSRC]);
     if (attributes[RTA_MULTIPATH] != nullptr) {
         route.nextHops = ReadNextHops(route.family, attributes[RTA_MULTIPATH]);
-    } else {
+    } else if (route.type == RTN_UNICAST) {
         NextHop hop;
         hop.index = static_cast<int>(Number(attributes[RTA_OIF], 0));
         hop.onLink = (header.rtm_flags & RTNH_F_ONLINK) != 0;
@@ -264,16 +275,13 @@ void ReadRoute(nlmsghdr* message, std::vector<Route>& routes)
 {
     Attributes attributes;
     const auto* header = ParseMessage<rtmsg>(message, attributes);
-    if (header == nullptr || (header->rtm_family != AF_INET && header->rtm_family != AF_INET6)) {
-        return;
-    }
-    if (header->rtm_type != RTN_UNICAST || header->rtm_protocol == RTPROT_KERNEL ||
-        header->rtm_protocol == RTPROT_REDIRECT || (header->rtm_flags & RTM_F_CLONED) != 0) {
+    if (header == nullptr || !IsRouteOfInterest(*header)) {
         return;
     }
 
     Route route;
     route.family = header->rtm_family;
+    route.type = header->rtm_type;
     route.prefixLength = header->rtm_dst_len;
     route.tos = header->rtm_tos;
     route.scope = header->rtm_scope;

@@ -61,9 +61,10 @@ struct RouteMetric {
     bool locked = false;
 };
 
-/** One unicast route that somebody or something put into a table. */
+/** One route that somebody or something put into a table. */
 struct Route {
     int family = 0;
+    unsigned type = 1; ///< RTN_UNICAST, or one that leads nowhere and has no hop.
     unsigned table = 0;
     std::string destination; ///< Address without length; empty for the default route.
     unsigned prefixLength = 0;
@@ -95,7 +96,7 @@ std::vector<Link> ReadLinks();
 std::optional<std::vector<Address>> ReadAddresses();
 
 /**
- * @return  The unicast routes of both families and every table, in the kernel's order, without
+ * @return  The routes of both families and every table, in the kernel's order, without
  *          those that the kernel makes of addresses by itself; nullopt on failure.
  */
 std::optional<std::vector<Route>> ReadRoutes();

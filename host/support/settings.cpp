@@ -25,11 +25,11 @@ bool IsNumbered(std::string_view key, std::string_view name)
 
 bool IsAddressingKey(std::string_view key)
 {
-    constexpr std::array<std::string_view, 13> kNames{
-        "BOOTPROTO", "DEFROUTE", "DOMAIN", "GATEWAYDEV", "METRIC",   kMtu,    "PEERDNS",
-        "PEERNTP",   "SCOPE",    "SEARCH", "SRCADDR",    "ARPCHECK", "DNSSEC"};
-    constexpr std::array<std::string_view, 7> kNumbered{
-        "IPADDR", "PREFIX", "NETMASK", "NETWORK", "BROADCAST", "GATEWAY", "DNS"};
+    constexpr std::array<std::string_view, 14> kNames{
+        "BOOTPROTO", "DEFROUTE",   "DOMAIN", "GATEWAYDEV", "METRIC",  kMtu,       "PEERDNS",
+        "PEERNTP",   "PEERROUTES", "SCOPE",  "SEARCH",     "SRCADDR", "ARPCHECK", "DNSSEC"};
+    constexpr std::array<std::string_view, 8> kNumbered{
+        "IPADDR", "PREFIX", "NETMASK", "NETWORK", "BROADCAST", "GATEWAY", "DNS", "ROUTE"};
     constexpr std::array<std::string_view, 3> kBeginnings{"IPV4_", "IPV6", "DHCP"};
     return Contains(kNames, key) ||
            std::any_of(kNumbered.begin(), kNumbered.end(),
@@ -48,14 +48,15 @@ bool IsPlaceKey(std::string_view key)
 
 bool IsCardKey(std::string_view key)
 {
-    return key == "HWADDR" || key == "MACADDR";
+    return key == "HWADDR" || key == "MACADDR" || key == "ETHTOOL_OPTS";
 }
 
 void RemoveAddressing(KeyValueFile& file)
 {
-    constexpr std::array<std::string_view, 4> kKept{"BOOTPROTO", "IPV6INIT", "IPV6_AUTOCONF", kMtu};
+    constexpr std::array<std::string_view, 3> kKept{"BOOTPROTO", "IPV6INIT", kMtu};
     for (const std::string& key : file.Keys()) {
-        if (IsAddressingKey(key) && !Contains(kKept, key)) {
+        const bool refuses = key == "IPV6_AUTOCONF" && file.Get(key) == "no";
+        if (IsAddressingKey(key) && !Contains(kKept, key) && !refuses) {
             (void)file.Remove(key);
         }
     }

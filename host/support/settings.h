@@ -21,12 +21,12 @@ bool IsAddressingKey(std::string_view key);
 /** What says which interface of which kind a file is for; written anew by each conversion. */
 bool IsPlaceKey(std::string_view key);
 
-/** The link address of a card, which another interface does not take over. */
+/** What belongs to a card, its link address and settings, which no other interface takes over. */
 bool IsCardKey(std::string_view key);
 
 /**
- * Deletes what gives an interface addresses and gateways. Its MTU and whether it speaks IPv6 stay;
- * BOOTPROTO becomes "none".
+ * Deletes what gives an interface addresses and gateways. Its MTU and that it does without IPv6 or
+ * without routers stay; BOOTPROTO becomes "none".
  */
 void RemoveAddressing(KeyValueFile& file);
 

@@ -10,6 +10,7 @@ build_packages=(
     libgtest-dev
     libnl-3-dev
     libnl-route-3-dev
+    libsystemd-dev
     ninja-build
     nlohmann-json3-dev
     pkg-config
@@ -19,6 +20,7 @@ test_packages=(
     binutils
     clang
     iproute2
+    systemd
 )
 
 lint_packages=(

@@ -13,10 +13,11 @@ lab_packages=(
 # when the image is made.
 lab_packages+=(
     libacl1 libattr1 libbpf1 libbsd0 libc6 libcap-ng0 libcap2 libcom-err2 libdb5.3 libelf1
-    libevent-2.1-7 libgcc-s1 libgmp10 libgssapi-krb5-2 libhogweed6 libk5crypto3 libkeyutils1
-    libkrb5-3 libkrb5support0 libmd0 libmnl0 libnettle8 libnghttp2-14 libnl-3-200
-    libnl-route-3-200 libnuma1 libpcre2-8-0 libselinux1 libssl3 libstdc++6 libtinfo6
-    libtirpc3 libunbound8 libuuid1 libxdp1 libxtables12 zlib1g
+    libevent-2.1-7 libgcc-s1 libgcrypt20 libgmp10 libgpg-error0 libgssapi-krb5-2
+    libhogweed6 libk5crypto3 libkeyutils1 libkrb5-3 libkrb5support0 liblz4-1 liblzma5
+    libmd0 libmnl0 libnettle8 libnghttp2-14 libnl-3-200 libnl-route-3-200 libnuma1
+    libpcre2-8-0 libselinux1 libssl3 libstdc++6 libsystemd0 libtinfo6 libtirpc3 libunbound8
+    libuuid1 libxdp1 libxtables12 libzstd1 zlib1g
 )
 
 # Prints package=version of everything the appliance is made of, as apt offers it now.

@@ -1,5 +1,7 @@
 #include "support/interfacefile.h"
 
+#include "rcnetwork/ipcommand.h"
+
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -60,6 +62,139 @@ TEST(ParseInterfaceFile, ReadsAPlainFile)
     EXPECT_THAT(file.mtu, Optional(9000U));
     EXPECT_THAT(file.metric, Optional(7U));
     EXPECT_EQ(file.requiredMac, "02:00:00:00:00:0a");
+}
+
+TEST(ParseInterfaceFile, ReadsAsWhomAServerKnowsTheHost)
+{
+    const auto parsed = ParseInterfaceFile("eth0", "BOOTPROTO=\"dhcp\"\n"
+                                                   "IPV6_AUTOCONF=yes\n"
+                                                   "DHCPV6C=no\n"
+                                                   "DHCP_CLIENT_ID=FF:00:00:00:01:00:02:AB\n"
+                                                   "DHCP_HOSTNAME=nas-1.example\n"
+                                                   "DHCPV6_DUID=00:04:aa:bb\n"
+                                                   "DHCP_IAID=0A:00:00:ff\n"
+                                                   "PEERDNS=no\n"
+                                                   "PEERROUTES=no\n"
+                                                   "DEFROUTE=no\n"
+                                                   "METRIC=5\n"
+                                                   "IPV6_METRIC=6\n");
+
+    FileClient client;
+    client.dhcp = true;
+    client.dhcp6 = false;
+    client.id = "ff:00:00:00:01:00:02:ab";
+    client.hostName = "nas-1.example";
+    client.duid = "00:04:aa:bb";
+    client.iaid = 0x0a0000ff;
+    client.nameServers = client.routes = client.defaultRoute = false;
+    EXPECT_THAT(Texts(parsed), IsEmpty());
+    EXPECT_EQ(parsed.file.use, FileUse::kPlain);
+    EXPECT_EQ(parsed.file.client, client);
+    EXPECT_TRUE(parsed.file.UsesClient());
+    EXPECT_TRUE(parsed.file.ClientHearsRouters());
+    EXPECT_THAT(parsed.file.metric, Optional(5U));
+    EXPECT_THAT(parsed.file.metric6, Optional(6U));
+}
+
+TEST(ParseInterfaceFile, SendsNeitherIdNorNameWhereNoneIsAskedFor)
+{
+    const auto file =
+        ParseInterfaceFile("eth0", "BOOTPROTO=dhcp\nDHCP_CLIENT_ID=none\nDHCP_HOSTNAME=none\n")
+            .file;
+
+    EXPECT_THAT(file.client.id, Optional(std::string()));
+    EXPECT_THAT(file.client.hostName, Optional(std::string()));
+    EXPECT_EQ(ParseInterfaceFile("eth0", "BOOTPROTO=dhcp\n").file.client.id, std::nullopt);
+    EXPECT_EQ(ParseInterfaceFile("eth0", "BOOTPROTO=dhcp\n").file.client.hostName, std::nullopt);
+}
+
+TEST(ParseInterfaceFile, RunsAClientOnlyWhereItHasWorkToDo)
+{
+    const auto uses = [](const char* text) {
+        return ParseInterfaceFile("eth0", text).file.UsesClient();
+    };
+
+    EXPECT_TRUE(uses("BOOTPROTO=dhcp\n"));
+    EXPECT_TRUE(uses("DHCPV6C=yes\n"));
+    EXPECT_TRUE(uses("IPV6_AUTOCONF=yes\n"));
+    EXPECT_TRUE(uses("IPV6_AUTOCONF=yes\nIPV6_TOKEN=::1\nDHCPV6C=yes\n"));
+    EXPECT_FALSE(uses("IPADDR=192.0.2.5/24\n"));
+    EXPECT_FALSE(uses("IPV6_AUTOCONF=yes\nIPV6_TOKEN=::1\n"));
+    EXPECT_FALSE(uses("IPV6INIT=no\nIPV6_AUTOCONF=yes\nDHCPV6C=yes\n"));
+}
+
+TEST(ParseInterfaceFile, ReadsHowAddressesOfTheKernelsEnd)
+{
+    const auto file = ParseInterfaceFile("eth0", "IPV6_TOKEN=::AA:0:1\nIPV6_LINKLOCAL=FE80::7\n"
+                                                 "IPV6_PRIVACY=rfc3041\n")
+                          .file;
+
+    EXPECT_EQ(file.token, "::aa:0:1");
+    EXPECT_EQ(file.linkLocal, "fe80::7");
+    EXPECT_THAT(file.privacy, Optional(2U));
+    EXPECT_THAT(ParseInterfaceFile("eth0", "IPV6_PRIVACY=1\n").file.privacy, Optional(1U));
+    EXPECT_THAT(ParseInterfaceFile("eth0", "IPV6_PRIVACY=no\n").file.privacy, Optional(0U));
+}
+
+TEST(ParseInterfaceFile, ReadsResolverAndLinkSettings)
+{
+    const auto parsed = ParseInterfaceFile(
+        "eth0", "DNS1=192.0.2.53\nDNS3=2001:DB8::53\nDOMAIN=\"a.example b.example\"\n"
+                "ETHTOOL_OPTS=\"speed 100 duplex full; --offload ${DEVICE} tso off;\"\n");
+
+    EXPECT_THAT(Texts(parsed), IsEmpty());
+    EXPECT_THAT(parsed.file.nameServers, ElementsAre("192.0.2.53", "2001:db8::53"));
+    EXPECT_THAT(parsed.file.searchDomains, ElementsAre("a.example", "b.example"));
+    EXPECT_THAT(parsed.file.linkCommands,
+                ElementsAre(LinkCommand{"-s", "speed", "100", "duplex", "full"},
+                            LinkCommand{"-K", "tso", "off"}));
+}
+
+struct RouteRow {
+    const char* text;
+    const char* arguments; ///< As "ip" is told of it.
+};
+
+TEST(ParseInterfaceFile, ReadsRoutes)
+{
+    for (const RouteRow& row :
+         {RouteRow{"198.51.100.0/24 via 192.0.2.9 metric 50",
+                   "198.51.100.0/24 via 192.0.2.9 dev eth0 proto static scope global metric 50"},
+          RouteRow{"198.51.100.77/24 dev eth0", "198.51.100.0/24 dev eth0 proto static scope link"},
+          RouteRow{
+              "default via 192.0.2.1 onlink table 100 src 192.0.2.5",
+              "default via 192.0.2.1 dev eth0 table 100 proto static scope global src 192.0.2.5 "
+              "onlink"},
+          RouteRow{"default via FE80::1", "::/0 via fe80::1 dev eth0 proto static metric 1024"},
+          RouteRow{"198.51.100.9 via inet6 fe80::1 mtu 1400",
+                   "198.51.100.9/32 via inet6 fe80::1 dev eth0 proto static scope global mtu 1400"},
+          RouteRow{"unreachable 10.0.0.0/8 metric 4000",
+                   "unreachable 10.0.0.0/8 proto static scope global metric 4000"},
+          RouteRow{"blackhole 2001:db8::/32",
+                   "blackhole 2001:db8::/32 proto static metric 1024"}}) {
+        const auto parsed =
+            ParseInterfaceFile("eth0", std::string("ROUTE7=\"") + row.text + "\"\n");
+
+        ASSERT_THAT(Texts(parsed), IsEmpty());
+        ASSERT_EQ(parsed.file.routes.size(), 1U);
+        EXPECT_EQ(RouteArguments(parsed.file.routes[0], [](int) { return "eth0"; }), row.arguments);
+    }
+}
+
+TEST(ParseInterfaceFile, SaysWhatIsWrongWithARoute)
+{
+    const std::pair<const char*, const char*> rows[]{
+        {"198.51.100.0/33 via 192.0.2.9", "\"198.51.100.0/33\" is no prefix"},
+        {"nowhere", "\"nowhere\" is no prefix"},
+        {"2001:db8::/32 via 192.0.2.9", "addresses of two families"},
+        {"default via", "\"\" is no address"},
+        {"default metric much", "metric is followed by no number"},
+        {"default via 192.0.2.1 table vpn", "\"vpn\" is no number of a table"},
+        {"unreachable default via 192.0.2.1", "a route that leads nowhere has no gateway"}};
+    for (const auto& [text, problem] : rows) {
+        EXPECT_THAT(Texts(ParseInterfaceFile("eth0", std::string("ROUTE0=\"") + text + "\"\n")),
+                    ElementsAre(std::string("error: ifcfg-eth0: ROUTE0=") + text + ": " + problem));
+    }
 }
 
 TEST(ParseInterfaceFile, ReadsABridgeFile)
@@ -165,7 +300,7 @@ INSTANTIATE_TEST_SUITE_P(
                   "ignored, because its PRIMARY is \"\""},
         LeftAlone{"PlainWithBridgeType", "eth0", "DEVICE=eth0\nTYPE=OVS\n",
                   "ignored, because a plain interface cannot have TYPE=OVS"},
-        LeftAlone{"Dhcp", "eth0", "BOOTPROTO=DHCP\n", "BOOTPROTO=dhcp is not supported yet"},
+        LeftAlone{"Bootp", "eth0", "BOOTPROTO=BOOTP\n", "BOOTPROTO=bootp is unknown"},
         LeftAlone{"UnknownProtocol", "eth0", "BOOTPROTO=magic\n", "BOOTPROTO=magic is unknown"}),
     [](const testing::TestParamInfo<LeftAlone>& row) { return row.param.description; });
 
@@ -205,6 +340,23 @@ INSTANTIATE_TEST_SUITE_P(
         Refused{"Address6", "IPV6ADDR=2001:db8::5/129\n",
                 "IPV6ADDR=2001:db8::5/129: not an IPv6 address with its length"},
         Refused{"NeitherYesNorNo", "ONBOOT=maybe\n", "ONBOOT=maybe: neither yes nor no"},
+        Refused{"Privacy", "IPV6_PRIVACY=much\n", "IPV6_PRIVACY=much: not a number from 0 to 2"},
+        Refused{"Token", "IPV6_TOKEN=fd00::1\n",
+                "IPV6_TOKEN=fd00::1: not the lower half of an IPv6 address"},
+        Refused{"LinkLocal", "IPV6_LINKLOCAL=fd00::1\n",
+                "IPV6_LINKLOCAL=fd00::1: not a link-local address"},
+        Refused{"ClientId", "DHCP_CLIENT_ID=my-id\n",
+                "DHCP_CLIENT_ID=my-id: not 2 to 253 bytes in hexadecimal digits"},
+        Refused{"Iaid", "DHCP_IAID=12345\n",
+                "DHCP_IAID=12345: not 4 to 4 bytes in hexadecimal digits"},
+        Refused{"HostName", "DHCP_HOSTNAME=\"a b\"\n", "DHCP_HOSTNAME=a b: not the name of a host"},
+        Refused{"NameServer", "DNS1=dns.example\n", "DNS1=dns.example: not an address"},
+        Refused{"SearchDomain", "DOMAIN=\"a.example ;b\"\n",
+                "DOMAIN=a.example ;b: \";b\" is not a domain"},
+        Refused{"Route", "ROUTE0=\"default veja 192.0.2.1\"\n",
+                "ROUTE0=default veja 192.0.2.1: \"veja\" is not supported"},
+        Refused{"LinkCommands", "ETHTOOL_OPTS=\"-f eth0 firmware\"\n",
+                "ETHTOOL_OPTS=-f eth0 firmware: not settings of a link"},
         Refused{"LinkAddress", "MACADDR=02:00:00:00:00:01\n",
                 "MACADDR=02:00:00:00:00:01: changing the link address is not supported yet"}),
     [](const testing::TestParamInfo<Refused>& row) { return row.param.description; });

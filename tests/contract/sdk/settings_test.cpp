@@ -52,11 +52,16 @@ TEST(IsAddressingKey, KnowsWhatBelongsToAnAddress)
                                   "IPV4_FAILURE_FATAL",
                                   "DHCPV6C",
                                   "DHCP_HOSTNAME",
+                                  "PEERROUTES",
+                                  "IPV6_TOKEN",
+                                  "IPV6_METRIC",
+                                  "ROUTE0",
                                   "PEERDNS"}) {
         EXPECT_TRUE(vornhost::IsAddressingKey(key)) << key;
     }
-    for (const char* const key : {"DEVICE", "HWADDR", "MACADDR", "ONBOOT", "OVS_VLAN_ID", "VLAN",
-                                  "IPADDRESS", "PREFIXES", "DNSX", "SITE", "BRIDGE", "ZONE", ""}) {
+    for (const char* const key :
+         {"DEVICE", "HWADDR", "MACADDR", "ONBOOT", "OVS_VLAN_ID", "VLAN", "IPADDRESS", "PREFIXES",
+          "ETHTOOL_OPTS", "ROUTES", "DNSX", "SITE", "BRIDGE", "ZONE", ""}) {
         EXPECT_FALSE(vornhost::IsAddressingKey(key)) << key;
     }
 }
@@ -77,6 +82,14 @@ TEST(RemoveAddressing, LeavesTheMtuAndWhetherThereIsIPv6)
                              "IPV6ADDR=2001:db8::1/64\nSITE=a\n");
     vornhost::RemoveAddressing(file);
     EXPECT_EQ(file.Text(), "BOOTPROTO=none\nMTU=9000\nIPV6INIT=no\nSITE=a\n");
+
+    file = File("IPV6_AUTOCONF=yes\nDHCP_IAID=01020304\n");
+    vornhost::RemoveAddressing(file);
+    EXPECT_EQ(file.Text(), "");
+
+    file = File("IPV6_AUTOCONF=no\n");
+    vornhost::RemoveAddressing(file);
+    EXPECT_EQ(file.Text(), "IPV6_AUTOCONF=no\n");
 
     file = File("BOOTPROTO=static\n");
     vornhost::RemoveAddressing(file);

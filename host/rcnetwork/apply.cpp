@@ -1,6 +1,7 @@
 #include "apply.h"
 
 #include "announce.h"
+#include "clientcontrol.h"
 #include "inputs.h"
 #include "readiness.h"
 
@@ -66,6 +67,8 @@ private:
     bool WaitForBridges(const Stage& stage);
     bool WriteSettings(const Stage& stage);
     void AnnounceAll(const Stage& stage);
+    bool ManageClients(const Stage& stage);
+    bool ManageClient(const std::string& line);
     void WaitForAll(const Stage& stage);
     bool ForgetGateways(const Stage& stage);
 
@@ -204,6 +207,38 @@ void Applier::AnnounceAll(const Stage& stage)
     }
 }
 
+bool Applier::ManageClient(const std::string& line)
+{
+    const auto words = Words(line.substr(0, line.find(": ")));
+    std::string error;
+    bool done = false;
+    if (words.at(0) == "end") {
+        done = EndClient(words.at(1), error);
+    } else if (words.at(0) == "drop") {
+        done = DropClient(words.at(1), error);
+    } else {
+        std::istringstream names(words.at(3));
+        std::vector<std::string> formers;
+        for (std::string name; std::getline(names, name, ',');) {
+            formers.push_back(name);
+        }
+        const ClientOptions options = ParseClientText(line.substr(line.find(": ") + 2));
+        done = StartClient(words.at(1), formers, options, error);
+    }
+    return done ||
+           Fail("DHCP client of " + words.at(1) + ": cannot " + words.at(0) + " it: " + error);
+}
+
+/** One that does not start leaves the others their turn. */
+bool Applier::ManageClients(const Stage& stage)
+{
+    bool done = true;
+    for (const std::string& line : stage.lines) {
+        done = ManageClient(line) && done;
+    }
+    return done;
+}
+
 /** What does not come is said; the traffic then waits until it does. */
 void Applier::WaitForAll(const Stage& stage)
 {
@@ -244,6 +279,8 @@ bool Applier::Run(const Stage& stage)
     case StageKind::kAnnounce:
         AnnounceAll(stage);
         return true;
+    case StageKind::kClients:
+        return ManageClients(stage);
     case StageKind::kReady:
         WaitForAll(stage);
         return true;

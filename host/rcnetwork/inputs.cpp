@@ -1,5 +1,6 @@
 #include "inputs.h"
 
+#include "clientcontrol.h"
 #include "kinship.h"
 
 #include "support/keyvaluefile.h"
@@ -194,6 +195,7 @@ std::optional<Inputs> ReadInputs(const Request& request, std::vector<Remark>& re
     ReadSwitchState(inputs, remarks);
     ReadRunState(inputs);
     inputs.handover = LoadHandover();
+    inputs.clients = ReadClients();
     auto live = ReadLiveState();
     if (!live) {
         remarks.push_back({Severity::kError, "cannot read the kernel's network"});

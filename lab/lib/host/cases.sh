@@ -1,12 +1,43 @@
 # shellcheck shell=bash disable=SC2154,SC2034 # variables that the lab's files share
 # Running cases: each in a guest of its own.
 
-# Long cases, which have a deadline of their own, come first: the short ones fill the gaps.
+# The machine that a case is for: small or systemd.
+lab_case_machine()
+{
+    local file=$lab_source/cases/$1/machine
+    if [[ -f $file ]]; then
+        cat "$file"
+    else
+        echo small
+    fi
+}
+
+# True when one of the cases is for the machine: MACHINE CASE...
+lab_any_case_for()
+{
+    local machine=$1 name
+    shift
+    for name in "$@"; do
+        if [[ $(lab_case_machine "$name") == "$machine" ]]; then
+            return 0
+        fi
+    done
+    return 1
+}
+
+# lab_case_names MACHINE DAILY: the cases for a machine (empty: all). With DAILY "daily" a case for
+# the machine with systemd must have a file `daily`. Long cases, which have a deadline of their own,
+# come first: the short ones fill the gaps.
 lab_case_names()
 {
-    local folder
+    local machine=$1 daily=$2 folder name its
     for folder in "$lab_source"/cases/*/; do
-        printf '%d %s\n' "$([[ -e $folder/deadline ]] && echo 0 || echo 1)" "$(basename "$folder")"
+        name=$(basename "$folder")
+        its=$(lab_case_machine "$name")
+        if [[ (-z $machine || $its == "$machine") &&
+            (-z $daily || $its != systemd || -e $folder/daily) ]]; then
+            printf '%d %s\n' "$([[ -e $folder/deadline ]] && echo 0 || echo 1)" "$name"
+        fi
     done | sort | cut -d ' ' -f 2
 }
 
@@ -29,17 +60,19 @@ lab_case_deadline()
 # whatever else the case kept.
 lab_run_case()
 {
-    local name=$1 results=$lab_results/$1 topology began status=0 verdict
+    local name=$1 results=$lab_results/$1 machine topology began status=0 verdict
+    machine=$(lab_case_machine "$name")
     topology=$(<"$lab_source/cases/$name/topology")
     rm -rf "$results"
     mkdir -p "$results"
-    lab_make_guest_image "$results/guest.cpio" "$topology" "$lab_source/cases/$name"
+    lab_make_guest_image "$results/guest.cpio" "$machine" "$topology" "$lab_source/cases/$name"
 
     began=$(date +%s)
     # The deadline is of this machine's time: it ends a guest whose own clock may stand still.
-    (lab_start_guest "$(lab_case_deadline "$name")" "$topology" "$results/guest.cpio" '' \
-        -serial "file:$results/console" -serial "file:$results/report" \
-        -serial "file:$results/results.tar") </dev/null >"$results/qemu" 2>&1 || status=$?
+    (lab_start_guest "$(lab_case_deadline "$name")" "$machine" "$topology" \
+        "$results/guest.cpio" '' -serial "file:$results/console" \
+        -serial "file:$results/report" -serial "file:$results/results.tar") \
+        </dev/null >"$results/qemu" 2>&1 || status=$?
     echo $(($(date +%s) - began)) >"$results/seconds"
 
     # A guest that hung sends no results; the verdict is read from its report all the same.

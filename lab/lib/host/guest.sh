@@ -6,9 +6,17 @@
 # depend on what else this machine does. The seed makes the guest's random numbers repeat as well.
 lab_qemu_arguments()
 {
-    printf '%s\n' -machine pc,accel=tcg,usb=off -cpu Nehalem,+rdrand -smp 1 -m 512 \
+    printf '%s\n' -machine pc,accel=tcg,usb=off -cpu Nehalem,+rdrand -smp 1 \
         -icount shift=0,sleep=off,align=off -rtc base=2026-01-01,clock=vm -seed 1 \
-        -nodefaults -display none -no-reboot -no-user-config -monitor none
+        -nodefaults -display none -no-user-config -monitor none
+    if [[ $1 == systemd ]]; then
+        # What the guest writes goes into a file of its own, which ends with QEMU, not with a reboot.
+        printf '%s\n' -m 1024 \
+            -drive "file=$lab_disk,format=raw,if=none,id=disk,snapshot=on,cache=unsafe" \
+            -device virtio-blk-pci,drive=disk
+    else
+        printf '%s\n' -m 512 -no-reboot
+    fi
 }
 
 # Cards for the topology's virtio ports: each is connected to one of the outside's through a hub.
@@ -33,27 +41,28 @@ lab_kernel_line()
         "tsc=reliable nolapic_timer no_timer_check net.ifnames=0 audit=0 $*"
 }
 
-# lab_start_guest SECONDS TOPOLOGY IMAGE WORDS QEMU-ARGUMENT...: replaces the calling process by the
-# guest, which is ended after that many seconds (0: never). The serial lines are, in this order:
-# console, report, results.
+# lab_start_guest SECONDS MACHINE TOPOLOGY IMAGE WORDS QEMU-ARGUMENT...: replaces the calling process
+# by the guest, which is ended after that many seconds (0: never). The serial lines are, in this
+# order: console, report, results.
 lab_start_guest()
 {
-    local seconds=$1 topology=$2 image=$3 words=$4 arguments
-    shift 4
-    mapfile -t arguments < <(lab_qemu_arguments; lab_qemu_cards "$topology")
+    local seconds=$1 machine=$2 topology=$3 image=$4 words=$5 arguments
+    shift 5
+    mapfile -t arguments < <(lab_qemu_arguments "$machine"; lab_qemu_cards "$topology")
     exec timeout --foreground -k 5 "$seconds" qemu-system-x86_64 "${arguments[@]}" \
         -kernel "$lab_kernel" -initrd "$image" -append "$(lab_kernel_line "$words")" "$@"
 }
 
-# Replaces the calling process by a guest on this terminal: $1 topology, $2 case folder or empty.
+# Replaces the calling process by a guest on this terminal: $1 machine, $2 topology, $3 case folder
+# or empty, $4 network manager or empty.
 lab_stay()
 {
     local image
     image=$(mktemp "$lab_build/shell.XXXXXX")
-    lab_make_guest_image "$image" "$1" "$2"
+    lab_make_guest_image "$image" "$@"
     # The file goes as soon as the guest has read it: the descriptor keeps it.
     exec {lab_image_handle}<"$image"
     rm -f "$image"
-    lab_start_guest 0 "$1" "/dev/fd/$lab_image_handle" lab.here -serial mon:stdio \
+    lab_start_guest 0 "$1" "$2" "/dev/fd/$lab_image_handle" lab.here -serial mon:stdio \
         -serial null -serial null
 }

@@ -7,7 +7,7 @@
 lab_qemu_arguments()
 {
     printf '%s\n' -machine pc,accel=tcg,usb=off -cpu Nehalem,+rdrand -smp 1 \
-        -icount shift=0,sleep=off,align=off -rtc base=2026-01-01,clock=vm -seed 1 \
+        -icount shift=0,sleep=off,align=off -rtc base=2030-01-01,clock=vm -seed 1 \
         -nodefaults -display none -no-user-config -monitor none
     if [[ $1 == systemd ]]; then
         # What the guest writes goes into a file of its own, which ends with QEMU, not with a reboot.

@@ -46,6 +46,7 @@ lab_main()
             "$(topology_ports)"
         cd /root || exit 1
         lab_shell
+        printf 'lab-left\n' >/dev/ttyS1
     else
         lab_send_results
     fi

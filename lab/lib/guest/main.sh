@@ -8,6 +8,8 @@
 . /lab/wait.sh
 # shellcheck source=topology.sh
 . /lab/topology.sh
+# shellcheck source=servers.sh
+. /lab/servers.sh
 # shellcheck source=snapshot.sh
 . /lab/snapshot.sh
 # shellcheck source=probes.sh
@@ -23,6 +25,7 @@ lab_main()
 {
     mkdir -p "$lab_out"
     topology_build
+    servers_start
     if [ -e /lab/case/run.sh ]; then
         lab_run_case
     fi
@@ -64,6 +67,7 @@ lab_boot()
 lab_send_results()
 {
     cp /var/log/messages "$lab_out/syslog" 2>/dev/null
+    cp "$lab_servers_log" "$lab_out/servers-log" 2>/dev/null
     cp -r /var/log/openvswitch "$lab_out/openvswitch-log" 2>/dev/null
     tar -C "$lab_out" -cf - . >/dev/ttyS2 2>/dev/null
 }

@@ -38,7 +38,9 @@ snapshot_links()
 
 snapshot_addresses()
 {
-    ip -oneline address show | sed -E -e 's/^[0-9]+: //' -e 's/\\//g' -e 's/  +/ /g' | sort
+    # How long addresses of servers and routers are good for changes by itself.
+    ip -oneline address show |
+        sed -E -e 's/^[0-9]+: //' -e 's/_lft [0-9]+sec/_lft some/g' -e 's/\\//g' -e 's/  +/ /g' | sort
 }
 
 snapshot_routes()

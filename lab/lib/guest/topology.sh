@@ -12,6 +12,7 @@
 #                           the other ends of these ports are a bond with these options
 #   outside NAME ADDRESS... the outside's addresses on the segment of a port, a switch or a partner;
 #                           NAME.ID means the VLAN of that id on it
+#   server NAME OPTION...   dnsmasq serves the outside's segment of that name, with these options
 #   far ADDRESS...          addresses of a host behind the gateways
 # Its folder `host` is laid over the appliance's file system.
 
@@ -143,9 +144,11 @@ in_outside()
     ip netns exec outside "$@"
 }
 
-# The appliance's addresses as its files give them, one a line: FAMILY ADDRESS.
+# The appliance's addresses as its files and the outside's servers give them, one a line: FAMILY
+# ADDRESS.
 topology_addresses()
 {
+    servers_gave
     cat /lab/topology/host/etc/sysconfig/network-scripts/ifcfg-* | tr -d '"' |
         awk -F = '
             $1 ~ /^IPADDR[0-9]*$/ && $2 != "" { print 4, $2 }
@@ -177,6 +180,7 @@ topology_far_address()
 topology_ready()
 {
     local family address
+    servers_ready
     topology_addresses >"$lab_out/addresses"
     while read -r family address; do
         wait_until 30 in_outside fping "-$family" -q -r 0 -t 200 "$address"

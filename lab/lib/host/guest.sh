@@ -6,7 +6,7 @@
 # depend on what else this machine does. The seed makes the guest's random numbers repeat as well.
 lab_qemu_arguments()
 {
-    printf '%s\n' -machine pc,accel=tcg,usb=off -cpu Nehalem,+rdrand -smp 1 -m 512 \
+    printf '%s\n' -machine pc,accel=tcg,usb=off -cpu Nehalem,+rdrand -smp 1 -m 768 \
         -icount shift=0,sleep=off,align=off -rtc base=2026-01-01,clock=vm -seed 1 \
         -nodefaults -display none -no-reboot -no-user-config -monitor none
 }

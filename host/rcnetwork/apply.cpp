@@ -1,6 +1,7 @@
 #include "apply.h"
 
 #include "announce.h"
+#include "clientcontrol.h"
 #include "inputs.h"
 #include "readiness.h"
 
@@ -8,10 +9,12 @@
 #include "support/service.h"
 
 #include <algorithm>
+#include <array>
 #include <cerrno>
 #include <cstring>
 #include <fstream>
 #include <sstream>
+#include <string_view>
 #include <thread>
 
 #include <unistd.h>
@@ -49,6 +52,26 @@ std::string OneLine(std::string text)
     return text;
 }
 
+/**
+ * Writes protocols of routes as numbers: after one that has no name "ip" mistakes the name that it
+ * read last for that number.
+ */
+std::string WithNumbers(const std::string& line)
+{
+    constexpr std::array<std::pair<std::string_view, std::string_view>, 4> kProtocols{
+        {{" proto boot ", " proto 3 "},
+         {" proto static ", " proto 4 "},
+         {" proto ra ", " proto 9 "},
+         {" proto dhcp ", " proto 16 "}}};
+    std::string text = line + " ";
+    for (const auto& [name, number] : kProtocols) {
+        if (const auto at = text.find(name); at != std::string::npos) {
+            text.replace(at, name.size(), number);
+        }
+    }
+    return text;
+}
+
 class Applier {
 public:
     Applier(const Plan& plan, std::vector<Remark>& remarks) : m_plan(plan), m_remarks(remarks) {}
@@ -66,6 +89,8 @@ private:
     bool WaitForBridges(const Stage& stage);
     bool WriteSettings(const Stage& stage);
     void AnnounceAll(const Stage& stage);
+    bool ManageClients(const Stage& stage);
+    bool ManageClient(const std::string& line);
     void WaitForAll(const Stage& stage);
     bool ForgetGateways(const Stage& stage);
 
@@ -135,7 +160,7 @@ bool Applier::RunBatch(const Stage& stage)
     LoadBonding(stage);
     std::string input;
     for (const std::string& line : stage.lines) {
-        input += line + "\n";
+        input += WithNumbers(line) + "\n";
     }
     ProcessResult result;
     if (Program({kIpTool, "-batch", "-"}, kToolDeadline, input, result)) {
@@ -152,7 +177,7 @@ void Applier::RunAdditions(const Stage& stage) const
     for (const std::string& line : stage.lines) {
         const auto words = Words(line);
         const bool removes = words.size() > 1 && (words[1] == "del" || words.back() == "down");
-        input += removes ? "" : line + "\n";
+        input += removes ? "" : WithNumbers(line) + "\n";
     }
     ProcessResult result;
     (void)Program({kIpTool, "-force", "-batch", "-"}, kToolDeadline, input, result);
@@ -204,6 +229,38 @@ void Applier::AnnounceAll(const Stage& stage)
     }
 }
 
+bool Applier::ManageClient(const std::string& line)
+{
+    const auto words = Words(line.substr(0, line.find(": ")));
+    std::string error;
+    bool done = false;
+    if (words.at(0) == "end") {
+        done = EndClient(words.at(1), error);
+    } else if (words.at(0) == "drop") {
+        done = DropClient(words.at(1), error);
+    } else {
+        std::istringstream names(words.at(3));
+        std::vector<std::string> formers;
+        for (std::string name; std::getline(names, name, ',');) {
+            formers.push_back(name);
+        }
+        const ClientOptions options = ParseClientText(line.substr(line.find(": ") + 2));
+        done = StartClient(words.at(1), formers, options, error);
+    }
+    return done ||
+           Fail("DHCP client of " + words.at(1) + ": cannot " + words.at(0) + " it: " + error);
+}
+
+/** One that does not start leaves the others their turn. */
+bool Applier::ManageClients(const Stage& stage)
+{
+    bool done = true;
+    for (const std::string& line : stage.lines) {
+        done = ManageClient(line) && done;
+    }
+    return done;
+}
+
 /** What does not come is said; the traffic then waits until it does. */
 void Applier::WaitForAll(const Stage& stage)
 {
@@ -244,6 +301,8 @@ bool Applier::Run(const Stage& stage)
     case StageKind::kAnnounce:
         AnnounceAll(stage);
         return true;
+    case StageKind::kClients:
+        return ManageClients(stage);
     case StageKind::kReady:
         WaitForAll(stage);
         return true;

@@ -43,6 +43,7 @@ InterfaceRecord Both(const InterfaceRecord& former, const InterfaceRecord& next)
     both.broughtUp = former.broughtUp || next.broughtUp;
     both.formerMtu = former.formerMtu ? former.formerMtu : next.formerMtu;
     both.tag = next.tag ? next.tag : former.tag;
+    both.client = former.client || next.client;
     return both;
 }
 
@@ -72,6 +73,8 @@ void AddStages(const Steps& steps, Plan& plan)
     AddStage(plan, StageKind::kWait, "wait for bridges", steps.waitFor);
     AddStage(plan, StageKind::kBatch, "make devices", steps.devices.Lines());
     AddStage(plan, StageKind::kReady, "wait for links", steps.readyBefore);
+    // A client would put back what is taken away.
+    AddStage(plan, StageKind::kClients, "end clients", steps.endClients);
     AddStage(plan, StageKind::kSettings, "settings before", steps.settingsBefore);
     AddStage(plan, StageKind::kBatch, "build beside", steps.beside.Lines());
     std::vector<std::string> joinAndLeave = Once(steps.leave);
@@ -85,6 +88,7 @@ void AddStages(const Steps& steps, Plan& plan)
     AddStage(plan, StageKind::kBatch, "put in order", steps.order.Lines());
     AddStage(plan, StageKind::kSettings, "settings after", steps.settingsAfter);
     AddStage(plan, StageKind::kReady, "wait for partners", steps.negotiate);
+    AddStage(plan, StageKind::kClients, "start clients", steps.startClients);
     AddStage(plan, StageKind::kGateways, "forget gateways", steps.forgetGateways);
 }
 

@@ -5,6 +5,7 @@
 #ifndef VORNHOST_RCNETWORK_PLAN_H
 #define VORNHOST_RCNETWORK_PLAN_H
 
+#include "clientoptions.h"
 #include "handover.h"
 #include "livestate.h"
 #include "report.h"
@@ -58,6 +59,7 @@ struct Inputs {
     RunState runState;
     std::map<std::string, FormerBond> formerBonds; ///< By the bond's plain name.
     Handover handover;
+    std::map<std::string, LiveClient> clients; ///< By the interface that they were started for.
 };
 
 /** How the lines of a stage are carried out. */
@@ -68,6 +70,7 @@ enum class StageKind {
     kSettings, ///< "INTERFACE SETTING VALUE"
     kBatch,    ///< Lines of one "ip -batch".
     kAnnounce, ///< "INTERFACE" whose place the network outside is told.
+    kClients,  ///< "end NAME", "drop NAME" or "start NAME of NAME,NAME: OPTION; OPTION".
     kReady,    ///< "KIND NAME..." that is waited for as long as that makes sense.
     kGateways  ///< "INTERFACE" whose gateway records are dropped.
 };

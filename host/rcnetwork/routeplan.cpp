@@ -78,8 +78,10 @@ void RoutePlanner::AddWantedDefault(const Unit& unit, int family, std::vector<Ro
 {
     const AddressFamily storeFamily =
         family == AF_INET ? AddressFamily::kIPv4 : AddressFamily::kIPv6;
-    std::string gateway = family == AF_INET ? unit.file->gateway : unit.file->gateway6;
-    std::optional<unsigned> metric = unit.file->metric;
+    const InterfaceFile& file = *unit.file;
+    std::string gateway = family == AF_INET ? file.gateway : file.gateway6;
+    std::optional<unsigned> metric =
+        family == AF_INET6 && file.metric6 ? file.metric6 : file.metric;
     const std::string& holder = unit.target == Target::kSwitch ? unit.bridge : unit.name;
     for (const GatewayRecord& record : m_inputs.gateways) {
         if (record.interface == holder && record.family == storeFamily) {
@@ -143,9 +145,30 @@ bool RoutePlanner::IsRecorded(const Unit& unit, const Route& route) const
     return has(unit.name) || std::any_of(unit.absorbed.begin(), unit.absorbed.end(), has);
 }
 
+/** Whether a client of this unit made the route that is not to run any more. */
+bool RoutePlanner::IsLeftByClient(const Unit& unit, const Route& route) const
+{
+    const auto had = [&](const std::string& name) {
+        const auto record = m_inputs.runState.interfaces.find(name);
+        return record != m_inputs.runState.interfaces.end() && record->second.client;
+    };
+    if (!had(unit.name) && std::none_of(unit.absorbed.begin(), unit.absorbed.end(), had)) {
+        return false;
+    }
+    const bool served = route.protocol == RTPROT_DHCP && route.family == AF_INET;
+    const bool heard =
+        route.family == AF_INET6 && (route.protocol == RTPROT_RA || route.protocol == RTPROT_DHCP);
+    const bool serves = !unit.takeDown && unit.file != nullptr && unit.file->client.dhcp;
+    const bool hears = !unit.takeDown && unit.file != nullptr && unit.file->ClientHearsRouters();
+    return (served && !serves) || (heard && !hears);
+}
+
 /** Made by an earlier run, and nothing asks for it any more. */
 bool RoutePlanner::IsUnwanted(const Unit& unit, const Route& route) const
 {
+    if (unit.removeUnwanted && IsLeftByClient(unit, route)) {
+        return true;
+    }
     if (!unit.removeUnwanted || !IsRecorded(unit, route)) {
         return false;
     }

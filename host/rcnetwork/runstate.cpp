@@ -22,6 +22,7 @@ InterfaceRecord ReadRecord(const Json& object)
     record.unchecked = object.at("unchecked").get<std::set<std::string>>();
     record.broughtUp = object.at("broughtUp").get<bool>();
     record.made = object.value("made", false);
+    record.client = object.value("client", false);
     record.ownMac = object.value("ownMac", "");
     record.formerMtu = ReadNumber(object, "formerMtu");
     record.tag = ReadNumber(object, "tag");
@@ -38,6 +39,9 @@ Json WriteRecord(const InterfaceRecord& record)
                    {"formerSettings", record.formerSettings}};
     if (record.made) {
         object["made"] = true;
+    }
+    if (record.client) {
+        object["client"] = true;
     }
     if (!record.ownMac.empty()) {
         object["ownMac"] = record.ownMac;
@@ -56,7 +60,7 @@ Json WriteRecord(const InterfaceRecord& record)
 bool InterfaceRecord::Empty() const
 {
     return addresses.empty() && routes.empty() && unchecked.empty() && !broughtUp && !made &&
-           ownMac.empty() && !formerMtu && !tag && formerSettings.empty();
+           !client && ownMac.empty() && !formerMtu && !tag && formerSettings.empty();
 }
 
 RunState ParseRunState(const std::string& text)

@@ -22,6 +22,7 @@ struct InterfaceRecord {
     std::set<std::string> unchecked;
     bool broughtUp = false; ///< The link was down before.
     bool made = false;      ///< The link itself: a bond, a VLAN.
+    bool client = false;    ///< A DHCP client, and so what that put there.
     std::optional<unsigned> formerMtu;
     std::string ownMac;          ///< Of an interface that has its bond's address.
     std::optional<unsigned> tag; ///< The VLAN tag that was set on the bridge's port.

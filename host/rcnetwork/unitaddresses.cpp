@@ -60,7 +60,8 @@ bool UnitPlanner::IsWanted(const Address& address) const
 /** Made by an earlier run, and nothing asks for it any more. */
 bool UnitPlanner::IsUnwanted(const Address& address) const
 {
-    return m_unit.removeUnwanted && m_former.addresses.contains(AddressText(address)) &&
+    return m_unit.removeUnwanted &&
+           (m_former.addresses.contains(AddressText(address)) || IsLeftByClient(address)) &&
            (m_unit.takeDown || !IsWanted(address));
 }
 

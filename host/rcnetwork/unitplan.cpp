@@ -51,6 +51,7 @@ void UnitPlanner::AbsorbRecords()
         m_former.addresses.insert(other.addresses.begin(), other.addresses.end());
         m_former.routes.insert(other.routes.begin(), other.routes.end());
         m_former.unchecked.insert(other.unchecked.begin(), other.unchecked.end());
+        m_former.client = m_former.client || other.client;
     }
 }
 
@@ -63,6 +64,7 @@ void UnitPlanner::KeepRecordsOfOthers()
         record.addresses.clear();
         record.routes.clear();
         record.unchecked.clear();
+        record.client = false;
         const bool gone = std::find(members.begin(), members.end(), name) == members.end();
         m_steps.records[name] = gone ? InterfaceRecord() : record;
     }
@@ -115,6 +117,7 @@ void UnitPlanner::Run()
     SilencePorts();
     PlanAutoconf();
     PlanAddresses();
+    PlanClient();
     if (m_moves) {
         CarryNeighbours();
         // Another wire leads to the host than before, and switches outside have to know.

@@ -35,6 +35,7 @@ struct Steps {
     std::vector<std::string> waitFor;
     BatchParts devices; ///< Bonds and VLANs that are missing, members that leave or join early.
     std::vector<std::string> readyBefore;
+    std::vector<std::string> endClients;
     std::vector<std::string> settingsBefore;
     BatchParts beside; ///< Made while traffic still takes its former way.
     std::vector<std::string> leave;
@@ -47,6 +48,7 @@ struct Steps {
     BatchParts order; ///< Members that join anew, because of their order.
     std::vector<std::string> settingsAfter;
     std::vector<std::string> negotiate;
+    std::vector<std::string> startClients;
     std::vector<std::string> forgetGateways;
     std::map<std::string, InterfaceRecord> records; ///< What is made once they are done.
 };
@@ -147,6 +149,17 @@ private:
     bool IsUnwanted(const Address& address) const;
     const Address* FindOn(const Link* link, const Address& like) const;
     void CarryNeighbours();
+
+    // unitclient.cpp: the DHCP client
+    void PlanClient();
+    void EndClient(const std::string& name, const char* verb);
+    std::vector<std::string> ClientNames() const;
+    std::vector<std::string> OtherClients() const;
+    ClientOptions WantedClient() const;
+    ClientPlace PlaceOfClient() const;
+    const Link* CardOf(const std::string& name) const;
+    bool IsLeftByClient(const Address& address) const;
+    void CheckMetrics() const;
 
     const Inputs& m_inputs;
     const Kinship& m_kinship;

@@ -256,7 +256,9 @@ void UnitPlanner::PlanAutoconf()
     if (!m_unit.addWanted || !m_unit.file->autoconf) {
         return;
     }
-    const std::string wanted = *m_unit.file->autoconf ? "1" : "0";
+    // Either the kernel hears routers or the client does.
+    const bool kernel = *m_unit.file->autoconf && !m_unit.file->ClientHearsRouters();
+    const std::string wanted = kernel ? "1" : "0";
     for (const char* setting : {"ipv6.conf.accept_ra", "ipv6.conf.autoconf"}) {
         // While the interface moves, the target is about to have what the source has.
         const bool follows = m_moves && m_unit.MainSource() != nullptr;

@@ -14,6 +14,10 @@
 . /lab/manager.sh
 # shellcheck source=phases.sh
 . /lab/phases.sh
+# shellcheck source=packages.sh
+. /lab/packages.sh
+# shellcheck source=takeover.sh
+. /lab/takeover.sh
 # shellcheck source=snapshot.sh
 . /lab/snapshot.sh
 # shellcheck source=probes.sh
@@ -46,6 +50,7 @@ lab_main()
             "$(topology_ports)"
         cd /root || exit 1
         lab_shell
+        printf 'lab-left\n' >/dev/ttyS1
     else
         lab_send_results
     fi

@@ -11,6 +11,7 @@ reboot_machine()
 {
     declare -F "phase_$1" >/dev/null || fail "the case has no phase_$1"
     step "Reboot, then $1"
+    printf 'lab-reboot\n'
     echo "$1" >"$lab_next"
     exit 0
 }

@@ -60,29 +60,54 @@ lab_case_deadline()
 # whatever else the case kept.
 lab_run_case()
 {
-    local name=$1 results=$lab_results/$1 machine topology began status=0 verdict
+    local name=$1 results=$lab_results/$1 machine began status=0 verdict
     machine=$(lab_case_machine "$name")
-    topology=$(<"$lab_source/cases/$name/topology")
     rm -rf "$results"
     mkdir -p "$results"
-    lab_make_guest_image "$results/guest.cpio" "$machine" "$topology" "$lab_source/cases/$name"
 
     began=$(date +%s)
-    # The deadline is of this machine's time: it ends a guest whose own clock may stand still.
-    (lab_start_guest "$(lab_case_deadline "$name")" "$machine" "$topology" \
-        "$results/guest.cpio" '' -serial "file:$results/console" \
-        -serial "file:$results/report" -serial "file:$results/results.tar") \
-        </dev/null >"$results/qemu" 2>&1 || status=$?
+    lab_run_guest "$name" "$machine" "$(<"$lab_source/cases/$name/topology")" || status=$?
     echo $(($(date +%s) - began)) >"$results/seconds"
 
     # A guest that hung sends no results; the verdict is read from its report all the same.
     tar -C "$results" -xf "$results/results.tar" 2>/dev/null || true
-    rm -f "$results/results.tar" "$results/guest.cpio"
-    verdict=$(sed -n 's/^lab-verdict: //p' "$results/report" 2>/dev/null | tr -d '\r' | tail -n 1)
+    rm -f "$results"/{results.tar,guest.cpio,disk}
+    verdict=$(lab_report_verdict "$results/report")
     if [[ -z $verdict ]]; then
         verdict="failed: $(lab_why_no_verdict "$status" "$name")"
     fi
     echo "$verdict" >"$results/verdict"
+}
+
+# Runs a case's guest, again after each reboot that the case asked for.
+lab_run_guest()
+{
+    local name=$1 machine=$2 topology=$3 results=$lab_results/$1 lines deadline left boots=0
+    # The deadline is of this machine's time: it ends a guest whose own clock may stand still.
+    deadline=$(($(date +%s) + $(lab_case_deadline "$name")))
+    lab_make_guest_image "$results/guest.cpio" "$machine" "$topology" "$lab_source/cases/$name"
+    if [[ $machine == systemd ]]; then
+        lab_make_guest_disk "$results/disk"
+    fi
+    mapfile -t lines < <(lab_line "$results/console"; lab_line "$results/report";
+        lab_line "$results/results.tar")
+    while [[ $(lab_reboots "$results/report") -eq $boots ]]; do
+        boots=$((boots + 1))
+        left=$((deadline - $(date +%s)))
+        (lab_start_guest "$((left > 0 ? left : 1))" "$machine" "$topology" "$results/guest.cpio" \
+            "$results/disk" '' "${lines[@]}") </dev/null >>"$results/qemu" 2>&1 || return
+    done
+}
+
+# lab_reboots REPORT: how often the case has asked for a reboot.
+lab_reboots()
+{
+    { cat "$1" 2>/dev/null || true; } | grep -c '^lab-reboot' || true
+}
+
+lab_report_verdict()
+{
+    { sed -n 's/^lab-verdict: //p' "$1" 2>/dev/null || true; } | tr -d '\r' | tail -n 1
 }
 
 lab_why_no_verdict()

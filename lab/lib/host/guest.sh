@@ -7,16 +7,21 @@
 lab_qemu_arguments()
 {
     printf '%s\n' -machine pc,accel=tcg,usb=off -cpu Nehalem,+rdrand -smp 1 \
-        -icount shift=0,sleep=off,align=off -rtc base=2026-01-01,clock=vm -seed 1 \
-        -nodefaults -display none -no-user-config -monitor none
+        -icount shift=0,sleep=off,align=off -rtc base=2030-01-01,clock=vm -seed 1 \
+        -nodefaults -display none -no-reboot -no-user-config -monitor none
     if [[ $1 == systemd ]]; then
-        # What the guest writes goes into a file of its own, which ends with QEMU, not with a reboot.
         printf '%s\n' -m 1024 \
-            -drive "file=$lab_disk,format=raw,if=none,id=disk,snapshot=on,cache=unsafe" \
+            -drive "file=$2,format=qcow2,if=none,id=disk,cache=unsafe" \
             -device virtio-blk-pci,drive=disk
     else
-        printf '%s\n' -m 512 -no-reboot
+        printf '%s\n' -m 512
     fi
+}
+
+# lab_make_guest_disk FILE: what a guest with a disk writes goes here, over the one all begin with.
+lab_make_guest_disk()
+{
+    qemu-img create -q -f qcow2 -F raw -b "$lab_disk" "$1"
 }
 
 # Cards for the topology's virtio ports: each is connected to one of the outside's through a hub.
@@ -41,28 +46,43 @@ lab_kernel_line()
         "tsc=reliable nolapic_timer no_timer_check net.ifnames=0 audit=0 $*"
 }
 
-# lab_start_guest SECONDS MACHINE TOPOLOGY IMAGE WORDS QEMU-ARGUMENT...: replaces the calling process
-# by the guest, which is ended after that many seconds (0: never). The serial lines are, in this
-# order: console, report, results.
+# lab_start_guest SECONDS MACHINE TOPOLOGY IMAGE DISK WORDS QEMU-ARGUMENT...: replaces the calling
+# process by the guest, which is ended after that many seconds (0: never). The serial lines are, in
+# this order: console, report, results.
 lab_start_guest()
 {
-    local seconds=$1 machine=$2 topology=$3 image=$4 words=$5 arguments
-    shift 5
-    mapfile -t arguments < <(lab_qemu_arguments "$machine"; lab_qemu_cards "$topology")
+    local seconds=$1 machine=$2 topology=$3 image=$4 disk=$5 words=$6 arguments
+    shift 6
+    mapfile -t arguments < <(lab_qemu_arguments "$machine" "$disk"; lab_qemu_cards "$topology")
     exec timeout --foreground -k 5 "$seconds" qemu-system-x86_64 "${arguments[@]}" \
         -kernel "$lab_kernel" -initrd "$image" -append "$(lab_kernel_line "$words")" "$@"
 }
 
-# Replaces the calling process by a guest on this terminal: $1 machine, $2 topology, $3 case folder
-# or empty, $4 network manager or empty.
+# lab_line FILE: a serial line that goes on where an earlier boot ended.
+lab_line()
+{
+    local id=${1##*/}
+    printf '%s\n' -chardev "file,id=line-$id,path=$1,append=on" -serial "chardev:line-$id"
+}
+
+# A guest on this terminal: $1 machine, $2 topology, $3 case folder or empty, $4 network manager or
+# empty. A guest with a disk is started again when it restarts.
 lab_stay()
 {
-    local image
-    image=$(mktemp "$lab_build/shell.XXXXXX")
-    lab_make_guest_image "$image" "$@"
-    # The file goes as soon as the guest has read it: the descriptor keeps it.
-    exec {lab_image_handle}<"$image"
-    rm -f "$image"
-    lab_start_guest 0 "$1" "$2" "/dev/fd/$lab_image_handle" lab.here -serial mon:stdio \
-        -serial null -serial null
+    local folder lines
+    folder=$(mktemp -d "$lab_build/shell.XXXXXX")
+    # shellcheck disable=SC2064 # the folder's name as it is now
+    trap "rm -rf '$folder'" EXIT
+    lab_make_guest_image "$folder/image" "$@"
+    if [[ $1 == systemd ]]; then
+        lab_make_guest_disk "$folder/disk"
+    fi
+    mapfile -t lines < <(lab_line "$folder/report")
+    while true; do
+        (lab_start_guest 0 "$1" "$2" "$folder/image" "$folder/disk" lab.here -serial mon:stdio \
+            "${lines[@]}" -serial null) || true
+        if [[ $1 != systemd ]] || grep -q '^lab-left' "$folder/report"; then
+            return
+        fi
+    done
 }

@@ -11,6 +11,10 @@ mkdir -p /run/lock /lab/out
 modprobe -a virtio_net veth bridge bonding 8021q
 hostname debian
 ip link set lo up
+# The clock goes on where it was when the machine was shut down.
+if [ /lab/state/clock -nt /proc/uptime ]; then
+    date -s "@$(stat -c %Y /lab/state/clock)" >/dev/null
+fi
 
 (
     set -e
@@ -24,6 +28,7 @@ ip link set lo up
 # The lab's own units are in /run: nothing of them is on the host's disk.
 mkdir -p /run/systemd/system/multi-user.target.wants /run/systemd/system/sysinit.target.wants
 cp /lab/machine/*.service /run/systemd/system/
+ln -s ../lab-clock.service /run/systemd/system/sysinit.target.wants/
 if [ -e /lab/topology/dnsmasq.conf ]; then
     ln -s ../lab-servers.service /run/systemd/system/sysinit.target.wants/
 fi

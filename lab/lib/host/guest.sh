@@ -37,7 +37,7 @@ lab_qemu_cards()
                 -device "virtio-net-pci,netdev=out-$name,mac=06${mac#??},romfile="
             hub=$((hub + 1))
         fi
-    done <"$lab_source/topologies/$1/topology"
+    done <"$(lab_topology_folder "$1")/topology"
 }
 
 lab_kernel_line()

@@ -155,13 +155,31 @@ lab_make_product()
 {
     local root=$1 file
     mkdir -p "$root/usr/lib/x86_64-linux-gnu"
-    DESTDIR=$root cmake --install "$lab_release" --prefix /usr >"$lab_build/install.log" ||
-        die "cmake --install failed: see $lab_build/install.log"
-    rm -rf "$root/usr/include" "$root/usr/share/man"
-    lab_build_clients "$root"
+    if lab_is_installed; then
+        lab_copy_installed "$root"
+    else
+        DESTDIR=$root cmake --install "$lab_release" --prefix /usr >"$lab_build/install.log" ||
+            die "cmake --install failed: see $lab_build/install.log"
+        lab_build_clients "$root"
+    fi
+    rm -rf "$root/usr/include" "$root"/usr/share/{man,vornovs-lab,zsh,bash-completion}
     while read -r file; do
         lab_copy_libraries "$root" "$file"
     done < <(find "$root" -type f \( -perm -u+x -o -name '*.so*' \))
+}
+
+# What this machine has of the repository's packages, without settings and state.
+lab_copy_installed()
+{
+    local root=$1 path
+    while read -r path; do
+        if [[ -d $path && ! -L $path ]]; then
+            mkdir -p "$root$path"
+        else
+            cp -P "$path" "$root$path"
+        fi
+    done < <(dpkg-query -L "${lab_product_packages[@]}" | sed -e '/^$/d' -e '/^\/\.$/d' \
+        -e '/^\/usr\/share\/doc/d' | LC_ALL=C sort -u)
 }
 
 # The lab's own clients, one source file each: lib*.cpp are loaded into other programs, the others
@@ -242,6 +260,12 @@ lab_make_image()
 lab_product_files()
 {
     printf '%s\n' "${BASH_SOURCE[0]}" "$lab_debian/.packages"
+    if lab_is_installed; then
+        dpkg-query -L "${lab_product_packages[@]}" | while read -r path; do
+            [[ ! -f $path ]] || printf '%s\n' "$path"
+        done
+        return
+    fi
     find "$lab_root/lab/clients" -name '*.cpp'
     find "$lab_release/bin" "$lab_release/lib" -type f
     find "$lab_root/host" "$lab_root/tools" -type f ! -name '*.cpp' ! -name '*.h'
@@ -256,7 +280,7 @@ lab_make_guest_image()
     root=$(mktemp -d "$lab_build/guest.XXXXXX")
     mkdir -p "$root/lab/topology" "$root/lab/case"
     cp "$lab_source"/lib/guest/* "$root/lab/"
-    cp -r "$lab_source/topologies/$topology/." "$root/lab/topology/"
+    cp -r "$(lab_topology_folder "$topology")/." "$root/lab/topology/"
     if [[ -n $case_folder ]]; then
         cp -r "$case_folder/." "$root/lab/case/"
     fi

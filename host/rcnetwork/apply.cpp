@@ -9,10 +9,12 @@
 #include "support/service.h"
 
 #include <algorithm>
+#include <array>
 #include <cerrno>
 #include <cstring>
 #include <fstream>
 #include <sstream>
+#include <string_view>
 #include <thread>
 
 #include <unistd.h>
@@ -46,6 +48,26 @@ std::string OneLine(std::string text)
     }
     for (std::string::size_type at = 0; (at = text.find('\n', at)) != std::string::npos;) {
         text.replace(at, 1, "; ");
+    }
+    return text;
+}
+
+/**
+ * Writes protocols of routes as numbers: after one that has no name "ip" mistakes the name that it
+ * read last for that number.
+ */
+std::string WithNumbers(const std::string& line)
+{
+    constexpr std::array<std::pair<std::string_view, std::string_view>, 4> kProtocols{
+        {{" proto boot ", " proto 3 "},
+         {" proto static ", " proto 4 "},
+         {" proto ra ", " proto 9 "},
+         {" proto dhcp ", " proto 16 "}}};
+    std::string text = line + " ";
+    for (const auto& [name, number] : kProtocols) {
+        if (const auto at = text.find(name); at != std::string::npos) {
+            text.replace(at, name.size(), number);
+        }
     }
     return text;
 }
@@ -138,7 +160,7 @@ bool Applier::RunBatch(const Stage& stage)
     LoadBonding(stage);
     std::string input;
     for (const std::string& line : stage.lines) {
-        input += line + "\n";
+        input += WithNumbers(line) + "\n";
     }
     ProcessResult result;
     if (Program({kIpTool, "-batch", "-"}, kToolDeadline, input, result)) {
@@ -155,7 +177,7 @@ void Applier::RunAdditions(const Stage& stage) const
     for (const std::string& line : stage.lines) {
         const auto words = Words(line);
         const bool removes = words.size() > 1 && (words[1] == "del" || words.back() == "down");
-        input += removes ? "" : line + "\n";
+        input += removes ? "" : WithNumbers(line) + "\n";
     }
     ProcessResult result;
     (void)Program({kIpTool, "-force", "-batch", "-"}, kToolDeadline, input, result);

@@ -90,8 +90,9 @@ ClientOptions MakeClientOptions(const InterfaceFile& file, const ClientPlace& pl
         "nodelay",
         "script /usr/vorn/lib/vornovs-dhcp-event",
         std::string("nohook hostname") + (client.nameServers ? "" : ", resolv.conf"),
-        "option domain_name_servers, domain_name, domain_search, classless_static_routes",
-        "option ntp_servers, dhcp6_name_servers, dhcp6_domain_search",
+        "option domain_name_servers, domain_name, domain_search, ntp_servers",
+        "option classless_static_routes",
+        "option dhcp6_name_servers, dhcp6_domain_search",
         "require dhcp_server_identifier",
         client.duid.empty() ? "duid" : "duid " + client.duid,
     };

@@ -46,6 +46,8 @@ std::string ProtocolText(unsigned protocol)
         return "static";
     case RTPROT_RA:
         return "ra";
+    case RTPROT_DHCP:
+        return "dhcp";
     default:
         return std::to_string(protocol);
     }

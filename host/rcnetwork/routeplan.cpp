@@ -156,7 +156,8 @@ bool RoutePlanner::IsLeftByClient(const Unit& unit, const Route& route) const
         return false;
     }
     const bool served = route.protocol == RTPROT_DHCP && route.family == AF_INET;
-    const bool heard = route.protocol == RTPROT_RA;
+    const bool heard =
+        route.family == AF_INET6 && (route.protocol == RTPROT_RA || route.protocol == RTPROT_DHCP);
     const bool serves = !unit.takeDown && unit.file != nullptr && unit.file->client.dhcp;
     const bool hears = !unit.takeDown && unit.file != nullptr && unit.file->ClientHearsRouters();
     return (served && !serves) || (heard && !hears);

@@ -49,7 +49,8 @@ topology_build()
         esac
     done </lab/topology/topology
 
-    if [ -d /lab/topology/host ]; then
+    # A machine that has a disk got them once, with its manager.
+    if [ -d /lab/topology/host ] && ! machine_has_systemd; then
         cp -a /lab/topology/host/. /
     fi
 }

@@ -81,14 +81,14 @@ std::optional<std::string> LeaseTextOf(const HostView& host, const Wish& wish)
 }
 
 AdoptedInterface InterfaceOf(const HostView& host, const Hands& hands, const Wish& wish,
-                             const std::map<std::string, std::string>& profiles)
+                             const std::map<std::string, NetworkManagerDevice>& profiles)
 {
     AdoptedInterface interface;
     interface.name = wish.name;
     interface.manager = wish.manager;
     interface.origin = wish.origin;
     if (const auto profile = profiles.find(wish.name); profile != profiles.end()) {
-        interface.profile = profile->second;
+        interface.profile = profile->second.profile;
     }
     const std::string path = FilePathOf(wish.name);
     interface.files.push_back({path, FileTextOf(wish), kReadable, hands.Read(path)});

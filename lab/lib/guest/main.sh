@@ -14,6 +14,10 @@
 . /lab/manager.sh
 # shellcheck source=phases.sh
 . /lab/phases.sh
+# shellcheck source=packages.sh
+. /lab/packages.sh
+# shellcheck source=takeover.sh
+. /lab/takeover.sh
 # shellcheck source=snapshot.sh
 . /lab/snapshot.sh
 # shellcheck source=probes.sh

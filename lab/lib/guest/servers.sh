@@ -26,11 +26,13 @@ servers_stop()
 servers_asked()
 {
     local words="$*"
-    { grep -Eo "(${words// /|})\(out-[^)]*\)" "$lab_servers_log" || true; } | wc -l
+    { grep -Eo "(${words// /|})\(out-[^)]*\)" "$lab_servers_log" 2>/dev/null || true; } | wc -l
 }
 
-# The IPv4 addresses leased now, one a line: MAC ADDRESS NAME CLIENT-ID.
-servers_leases4()
+# Who has what now, one a line, without until when: MAC ADDRESS NAME CLIENT-ID, and of IPv6
+# IAID ADDRESS NAME DUID.
+servers_leases()
 {
-    { grep -E '^[0-9]+ [0-9a-f:]+ [0-9.]+ ' "$lab_leases" || true; } | cut -d ' ' -f 2- | sort
+    { grep -E '^[0-9]+ [^ ]+ [0-9a-f.:]+ ' "$lab_leases" 2>/dev/null || true; } |
+        cut -d ' ' -f 2- | sort
 }

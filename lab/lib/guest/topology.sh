@@ -143,9 +143,14 @@ in_outside()
     ip netns exec outside "$@"
 }
 
-# The appliance's addresses as its files give them, one a line: FAMILY ADDRESS.
+# The appliance's addresses as its files give them, one a line: FAMILY ADDRESS; on a host with a
+# manager of its own, those that it had at first.
 topology_addresses()
 {
+    if [ -e "$lab_out/host-addresses" ]; then
+        cat "$lab_out/host-addresses"
+        return
+    fi
     cat /lab/topology/host/etc/sysconfig/network-scripts/ifcfg-* | tr -d '"' |
         awk -F = '
             $1 ~ /^IPADDR[0-9]*$/ && $2 != "" { print 4, $2 }

@@ -262,6 +262,8 @@ lab_make_guest_image()
         base=$lab_loader
         cp -r "$lab_source/lib/machine" "$root/lab/"
         cp -r "$lab_layers/product/lab/clients" "$root/lab/"
+        mkdir -p "$root/lab/packages/vornovs"
+        cp "$lab_packages_folder"/{*.deb,Packages} "$root/lab/packages/vornovs/"
         ln -s lab/machine/init "$root/init"
     else
         ln -s lab/init "$root/init"
@@ -270,6 +272,15 @@ lab_make_guest_image()
     lab_archive "$root" "$root.cpio"
     cat "$base" "$root.cpio" >"$archive"
     rm -rf "$root" "$root.cpio"
+}
+
+# Builds the packages that the host with systemd installs.
+lab_build_packages()
+{
+    "$lab_root/scripts/package" >"$lab_build/packages.log" 2>&1 || {
+        tail -n 30 "$lab_build/packages.log" >&2
+        die "the packages do not build: see $lab_build/packages.log"
+    }
 }
 
 # Builds what the appliance runs; the tests are not part of it.

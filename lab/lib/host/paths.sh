@@ -5,6 +5,7 @@ lab_root=$(cd "$(dirname "${BASH_SOURCE[0]}")/../../.." && pwd)
 lab_source=$lab_root/lab
 lab_build=${LAB_BUILD:-$lab_root/build/lab}
 lab_release=${LAB_RELEASE:-$lab_root/build/release}
+lab_packages_folder=${VORNOVS_PACKAGES:-$lab_root/build/packages}
 lab_results=$lab_build/results
 lab_debian=$lab_build/debian
 lab_layers=$lab_build/layers

@@ -158,7 +158,7 @@ lab_make_product()
     if lab_is_installed; then
         lab_copy_installed "$root"
     else
-        DESTDIR=$root cmake --install "$lab_release" --prefix /usr >"$lab_build/install.log" ||
+        DESTDIR=$root cmake --install "$lab_release" --strip --prefix /usr >"$lab_build/install.log" ||
             die "cmake --install failed: see $lab_build/install.log"
         lab_build_clients "$root"
     fi

@@ -34,6 +34,19 @@ std::vector<std::string> UnitPlanner::ClientNames() const
     return names;
 }
 
+/** Clients of interfaces that are gone: of a plan that was cut short, if it was the same client. */
+std::vector<std::string> UnitPlanner::LostClients(const ClientOptions& wanted) const
+{
+    std::vector<std::string> names;
+    for (const auto& [name, client] : m_inputs.clients) {
+        if (m_inputs.live.FindLink(name) == nullptr && name != Carrier() && !wanted.empty() &&
+            WithInterface(client.options, Carrier()) == wanted) {
+            names.push_back(name);
+        }
+    }
+    return names;
+}
+
 /** Clients of what the carrier takes over from, which have no follower. */
 std::vector<std::string> UnitPlanner::OtherClients() const
 {
@@ -114,6 +127,14 @@ ClientOptions UnitPlanner::WantedClient() const
     return {};
 }
 
+/** Whether the client gives the carrier its link-local address, and turns the kernel's way off. */
+bool UnitPlanner::ClientHasIpv6() const
+{
+    const ClientOptions options = WantedClient();
+    return !options.empty() &&
+           std::find(options.begin(), options.end(), kOnlyIPv4) == options.end();
+}
+
 /** Its addresses are told by that the kernel makes no route for their prefix. */
 bool UnitPlanner::IsLeftByClient(const Address& address) const
 {
@@ -152,7 +173,12 @@ void UnitPlanner::EndClient(const std::string& name, const char* verb)
 void UnitPlanner::PlanClient()
 {
     const ClientOptions wanted = WantedClient();
-    const std::vector<std::string> formers = ClientNames();
+    std::vector<std::string> formers = ClientNames();
+    for (const std::string& name : LostClients(wanted)) {
+        if (std::find(formers.begin(), formers.end(), name) == formers.end()) {
+            formers.push_back(name);
+        }
+    }
     const auto own = m_inputs.clients.find(Carrier());
     const bool stays = !wanted.empty() && own != m_inputs.clients.end() && own->second.running &&
                        own->second.options == wanted && m_unit.carrierLink != nullptr;
@@ -172,6 +198,12 @@ void UnitPlanner::PlanClient()
     }
     if (m_unit.file != nullptr) {
         CheckMetrics();
+    }
+    // The client had turned off that the kernel makes the link-local address.
+    const std::string mode = Live(kNewInterface, kAddressMode);
+    if (m_former.client && wanted.empty() && m_unit.removeUnwanted && !mode.empty() &&
+        Live(Carrier(), kAddressMode) == kAddressModeNone && mode != kAddressModeNone) {
+        Set(m_steps.settingsAfter, Carrier(), kAddressMode, mode);
     }
     m_record.client = !wanted.empty();
 }

@@ -314,7 +314,7 @@ lab_build_release()
     ensure_host_packages "${build_packages[@]}"
     mkdir -p "$lab_build"
     (cd "$lab_root" && cmake --preset release &&
-        cmake --build --preset release --target src/all host/all tools/all) \
+        cmake --build --preset release --target src/all host/all tools/all man/all) \
         >"$lab_build/release.log" 2>&1 || {
         tail -n 30 "$lab_build/release.log" >&2
         die "the release does not build: see $lab_build/release.log"

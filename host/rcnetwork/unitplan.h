@@ -158,6 +158,7 @@ private:
     ClientOptions WantedClient() const;
     ClientPlace PlaceOfClient() const;
     const Link* CardOf(const std::string& name) const;
+    bool HadClientFor(int family) const;
     bool IsLeftByClient(const Address& address) const;
     void CheckMetrics() const;
 

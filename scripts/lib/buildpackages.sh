@@ -34,8 +34,14 @@ package_packages=(
     debhelper
     dpkg-dev
     fakeroot
-    lintian
     scdoc
+)
+
+package_test_packages=(
+    bsdextrautils
+    lintian
+    man-db
+    zsh
 )
 
 coverage_packages=(

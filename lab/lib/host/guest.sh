@@ -14,7 +14,7 @@ lab_qemu_arguments()
             -object "memory-backend-file,id=disk,mem-path=$2,size=$(stat -c %s "$2"),share=on" \
             -device nvdimm,memdev=disk
     else
-        printf '%s\n' -m 512
+        printf '%s\n' -m 768
     fi
 }
 
@@ -40,7 +40,7 @@ lab_qemu_cards()
                 -device "virtio-net-pci,netdev=out-$name,mac=06${mac#??},romfile="
             hub=$((hub + 1))
         fi
-    done <"$lab_source/topologies/$1/topology"
+    done <"$(lab_topology_folder "$1")/topology"
 }
 
 lab_kernel_line()

@@ -10,7 +10,7 @@
 # What the guest runs of Debian's, besides busybox.
 lab_programs=(
     bin/bash bin/dash bin/cp bin/ip sbin/bridge sbin/tc bin/ss usr/bin/chrt usr/bin/flock usr/bin/fping
-    usr/bin/uuidgen sbin/ldconfig usr/bin/getconf
+    usr/bin/uuidgen sbin/ldconfig usr/bin/getconf sbin/ethtool usr/sbin/dhcpcd usr/sbin/dnsmasq
     usr/bin/ovs-vsctl usr/bin/ovs-appctl usr/bin/ovs-ofctl usr/bin/ovs-dpctl
     usr/bin/ovsdb-tool usr/bin/ovsdb-client usr/sbin/ovsdb-server
     usr/lib/openvswitch-switch/ovs-vswitchd
@@ -134,8 +134,13 @@ lab_make_system()
     cp "$lab_debian/etc/default/openvswitch-switch" "$root/etc/default/"
     find "$lab_debian/etc/iproute2" -maxdepth 1 -type f -exec cp -t "$root/etc/iproute2" {} +
 
+    cp -r "$lab_debian/usr/lib/dhcpcd" "$root/usr/lib/"
+    cp "$lab_debian/etc/dhcpcd.conf" "$root/etc/"
+    mkdir -p "$root/var/lib/dhcpcd"
+
     printf 'root:x:0:0:root:/root:/bin/sh\n' >"$root/etc/passwd"
-    printf 'root:x:0:\n' >"$root/etc/group"
+    printf 'dhcpcd:x:102:65534::/usr/lib/dhcpcd:/bin/false\n' >>"$root/etc/passwd"
+    printf 'root:x:0:\nnogroup:x:65534:\n' >"$root/etc/group"
     printf '127.0.0.1 localhost appliance\n::1 localhost\n' >"$root/etc/hosts"
     printf 'passwd: files\ngroup: files\nhosts: files\n' >"$root/etc/nsswitch.conf"
     printf 'icmp 1 ICMP\nudp 17 UDP\ntcp 6 TCP\nipv6-icmp 58 IPv6-ICMP\n' >"$root/etc/protocols"
@@ -150,13 +155,31 @@ lab_make_product()
 {
     local root=$1 file
     mkdir -p "$root/usr/lib/x86_64-linux-gnu"
-    DESTDIR=$root cmake --install "$lab_release" --prefix /usr >"$lab_build/install.log" ||
-        die "cmake --install failed: see $lab_build/install.log"
-    rm -rf "$root/usr/include" "$root/usr/share/man"
-    lab_build_clients "$root"
+    if lab_is_installed; then
+        lab_copy_installed "$root"
+    else
+        DESTDIR=$root cmake --install "$lab_release" --strip --prefix /usr >"$lab_build/install.log" ||
+            die "cmake --install failed: see $lab_build/install.log"
+        lab_build_clients "$root"
+    fi
+    rm -rf "$root/usr/include" "$root"/usr/share/{man,vornovs-lab,zsh,bash-completion}
     while read -r file; do
         lab_copy_libraries "$root" "$file"
     done < <(find "$root" -type f \( -perm -u+x -o -name '*.so*' \))
+}
+
+# What this machine has of the repository's packages, without settings and state.
+lab_copy_installed()
+{
+    local root=$1 path
+    while read -r path; do
+        if [[ -d $path && ! -L $path ]]; then
+            mkdir -p "$root$path"
+        else
+            cp -P "$path" "$root$path"
+        fi
+    done < <(dpkg-query -L "${lab_product_packages[@]}" | sed -e '/^$/d' -e '/^\/\.$/d' \
+        -e '/^\/usr\/share\/doc/d' | LC_ALL=C sort -u)
 }
 
 # The lab's own clients, one source file each: lib*.cpp are loaded into other programs, the others
@@ -237,6 +260,12 @@ lab_make_image()
 lab_product_files()
 {
     printf '%s\n' "${BASH_SOURCE[0]}" "$lab_debian/.packages"
+    if lab_is_installed; then
+        dpkg-query -L "${lab_product_packages[@]}" | while read -r path; do
+            [[ ! -f $path ]] || printf '%s\n' "$path"
+        done
+        return
+    fi
     find "$lab_root/lab/clients" -name '*.cpp'
     find "$lab_release/bin" "$lab_release/lib" -type f
     find "$lab_root/host" "$lab_root/tools" -type f ! -name '*.cpp' ! -name '*.h'
@@ -251,7 +280,7 @@ lab_make_guest_image()
     root=$(mktemp -d "$lab_build/guest.XXXXXX")
     mkdir -p "$root/lab/topology" "$root/lab/case"
     cp "$lab_source"/lib/guest/* "$root/lab/"
-    cp -r "$lab_source/topologies/$topology/." "$root/lab/topology/"
+    cp -r "$(lab_topology_folder "$topology")/." "$root/lab/topology/"
     if [[ -n $case_folder ]]; then
         cp -r "$case_folder/." "$root/lab/case/"
     fi
@@ -290,7 +319,7 @@ lab_build_release()
     ensure_host_packages "${build_packages[@]}"
     mkdir -p "$lab_build"
     (cd "$lab_root" && cmake --preset release &&
-        cmake --build --preset release --target src/all host/all tools/all) \
+        cmake --build --preset release --target src/all host/all tools/all man/all) \
         >"$lab_build/release.log" 2>&1 || {
         tail -n 30 "$lab_build/release.log" >&2
         die "the release does not build: see $lab_build/release.log"

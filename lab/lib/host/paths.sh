@@ -17,6 +17,21 @@ lab_layers=$lab_build/layers
 # shellcheck source=scripts/lib/buildpackages.sh
 . "$lab_root/scripts/lib/buildpackages.sh"
 
+# Where a topology is: one of the lab's own by its name, any other by its path.
+lab_topology_folder()
+{
+    case $1 in
+        */*) printf '%s' "$1" ;;
+        *) printf '%s' "$lab_source/topologies/$1" ;;
+    esac
+}
+
+# The lab without the sources beside it is an installed one: its appliance gets what is installed.
+lab_is_installed()
+{
+    [[ ! -f $lab_root/CMakeLists.txt ]]
+}
+
 # A name for the content of files: paths on standard input, one a line.
 fingerprint()
 {

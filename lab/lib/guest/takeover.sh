@@ -48,10 +48,11 @@ host_answers()
     done < <(takeover_expected)
 }
 
-# The default routes. Whether a gateway was said to be on the link makes no difference where it is.
+# The default routes, without what makes no difference: that a gateway was said to be on the link,
+# where it is, and an MTU and a hop limit that are the interface's own.
 ways_out()
 {
-    default_routes | sed 's/ onlink//'
+    default_routes | sed -E -e 's/ onlink//' -e 's/ mtu 1500//' -e 's/ hoplimit 64//'
 }
 
 host_has_routes()

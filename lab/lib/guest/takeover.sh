@@ -191,6 +191,12 @@ takeover_phases()
     }
 }
 
+# Probes that come often enough for the limits here, at a quarter of the work.
+takeover_probes()
+{
+    lab_probe_interval=20 probes_start
+}
+
 takeover_install()
 {
     step "Install"
@@ -208,7 +214,7 @@ takeover_adopt()
     step "Adopt"
     expect_success vornovsctl adopt --dry-run | show
     expect_nothing_done
-    probes_start
+    takeover_probes
     timed adopt vornovsctl adopt
     expect_same_host "after adopt"
     lab_probe_after=3 probes_finish adopt "${takeover_limit:-100}"
@@ -224,7 +230,7 @@ expect_nothing_done()
 takeover_register()
 {
     step "Register"
-    probes_start
+    takeover_probes
     timed register vornovsctl register alpha
     expect_ports_on_switch
     expect_same_host "on the switch"
@@ -248,7 +254,7 @@ takeover_switched()
     expect_registered alpha
 
     step "Unregister"
-    probes_start
+    takeover_probes
     timed unregister vornovsctl unregister alpha
     expect_no_switch_devices
     expect_same_host "plain again"
@@ -256,7 +262,7 @@ takeover_switched()
     expect_no_new_client "plain again"
 
     step "Release"
-    probes_start
+    takeover_probes
     timed release vornovsctl release
     expect_same_host "after release"
     lab_probe_after=3 probes_finish release "${takeover_limit:-100}"

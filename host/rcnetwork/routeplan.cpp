@@ -105,12 +105,40 @@ void RoutePlanner::AddWantedDefault(const Unit& unit, int family, std::vector<Ro
     routes.push_back(std::move(route));
 }
 
+/** Whether the unit has the address, now or as its file asks. */
+bool RoutePlanner::HasAddress(const Unit& unit, const std::string& local) const
+{
+    const auto& wanted = unit.file->addresses;
+    const auto& live = m_inputs.live.addresses;
+    return std::any_of(wanted.begin(), wanted.end(),
+                       [&](const WantedAddress& each) { return each.local == local; }) ||
+           std::any_of(live.begin(), live.end(), [&](const Address& each) {
+               return UnitOf(each.index) == &unit && each.local == local;
+           });
+}
+
+/** A route from an address that is not there yet has to wait for it. */
+void RoutePlanner::AddStaticRoutes(const Unit& unit, std::vector<Route>& routes) const
+{
+    for (Route route : unit.file->routes) {
+        if (!route.source.empty() && !HasAddress(unit, route.source)) {
+            continue;
+        }
+        for (NextHop& hop : route.nextHops) {
+            hop.onLink = hop.onLink ||
+                         (!hop.gateway.empty() && !IsOnLink(unit, hop.gatewayFamily, hop.gateway));
+        }
+        routes.push_back(route);
+    }
+}
+
 std::vector<Route> RoutePlanner::WantedRoutes(const Unit& unit) const
 {
     std::vector<Route> routes;
     if (unit.file != nullptr) {
         AddWantedDefault(unit, AF_INET, routes);
         AddWantedDefault(unit, AF_INET6, routes);
+        AddStaticRoutes(unit, routes);
     }
     return routes;
 }
@@ -145,6 +173,21 @@ bool RoutePlanner::IsRecorded(const Unit& unit, const Route& route) const
     return has(unit.name) || std::any_of(unit.absorbed.begin(), unit.absorbed.end(), has);
 }
 
+/** Where it does not, routes to routers are the kernel's or of somebody before us. */
+bool RoutePlanner::ClientHeardRouters(const Unit& unit) const
+{
+    for (const std::string& name : {unit.carrier, unit.name, unit.bridge}) {
+        const auto client = m_inputs.clients.find(name);
+        if (client != m_inputs.clients.end()) {
+            const ClientOptions& options = client->second.options;
+            return std::none_of(options.begin(), options.end(), [](const std::string& option) {
+                return option == kOnlyIPv4 || option == "noipv6rs";
+            });
+        }
+    }
+    return true;
+}
+
 /** Whether a client of this unit made the route that is not to run any more. */
 bool RoutePlanner::IsLeftByClient(const Unit& unit, const Route& route) const
 {
@@ -156,8 +199,9 @@ bool RoutePlanner::IsLeftByClient(const Unit& unit, const Route& route) const
         return false;
     }
     const bool served = route.protocol == RTPROT_DHCP && route.family == AF_INET;
-    const bool heard =
-        route.family == AF_INET6 && (route.protocol == RTPROT_RA || route.protocol == RTPROT_DHCP);
+    const bool heard = route.family == AF_INET6 &&
+                       (route.protocol == RTPROT_RA || route.protocol == RTPROT_DHCP) &&
+                       ClientHeardRouters(unit);
     const bool serves = !unit.takeDown && unit.file != nullptr && unit.file->client.dhcp;
     const bool hears = !unit.takeDown && unit.file != nullptr && unit.file->ClientHearsRouters();
     return (served && !serves) || (heard && !hears);
@@ -264,6 +308,13 @@ void RoutePlanner::PlanLiveRoute(const Route& route)
     if (unit == nullptr && route.nextHops.size() == 1) {
         unit = UnitOf(route.nextHops[0].index);
     }
+    if (route.nextHops.empty()) {
+        if (std::any_of(m_units.begin(), m_units.end(),
+                        [&](const Unit& each) { return IsUnwanted(each, route); })) {
+            RemoveRoute(route);
+        }
+        return;
+    }
     if (unit == nullptr) {
         RestoreRoute(route);
         return;
@@ -309,7 +360,8 @@ void RoutePlanner::MakeWantedRoute(const Unit& unit, const Route& wanted)
     const auto& all = m_inputs.live.routes;
     bool slotIsElsewhere = false;
     for (const Route& live : all) {
-        const bool here = HasHopOn(live, unit.carrierLink) || HasHopOnSource(live, unit);
+        const bool here = HasHopOn(live, unit.carrierLink) || HasHopOnSource(live, unit) ||
+                          (live.nextHops.empty() && wanted.nextHops.empty());
         if (here && RouteKeyText(live) == RouteKeyText(wanted)) {
             return;
         }

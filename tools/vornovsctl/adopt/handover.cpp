@@ -6,6 +6,7 @@
 #include <arpa/inet.h>
 #include <array>
 #include <linux/if_addr.h>
+#include <linux/rtnetlink.h>
 #include <sstream>
 #include <sys/socket.h>
 

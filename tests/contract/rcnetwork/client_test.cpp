@@ -132,7 +132,9 @@ TEST_F(DhcpHost, TheLeaseGoesWhereTheAddressesGo)
     const std::string plain = Served("eth0");
     EXPECT_THAT(plain, HasSubstr("default via 192.0.2.1 dev eth0 proto dhcp src 192.0.2.1"));
     EXPECT_THAT(plain, HasSubstr("proto ra metric 7 mtu 1500 pref medium"));
-    EXPECT_THAT(ReadFile("/etc/resolv.conf"), HasSubstr("nameserver 192.0.2.53\n"));
+    EXPECT_TRUE(WaitUntil([] {
+        return ReadFile("/etc/resolv.conf").find("nameserver 192.0.2.53\n") != std::string::npos;
+    }));
     EXPECT_EQ(RcNetwork({"--dry-run", "start"}), (Outcome{0, "", ""}));
 
     File("br0", On(kDhcp, "eth0", "br0") + "TYPE=Bridge\n");
@@ -149,7 +151,9 @@ TEST_F(DhcpHost, TheLeaseGoesWhereTheAddressesGo)
     EXPECT_EQ(RcNetwork({"start"}), (Outcome{0, "", ""}));
     EXPECT_TRUE(WaitUntil([&] { return Requests("DHCPACK") > acknowledged + 1; }));
     EXPECT_EQ(Served("eth0"), plain);
-    EXPECT_THAT(ReadFile("/etc/resolv.conf"), HasSubstr("from eth0.dhcp\n"));
+    EXPECT_TRUE(WaitUntil([] {
+        return ReadFile("/etc/resolv.conf").find("from eth0.dhcp\n") != std::string::npos;
+    })) << ReadFile("/etc/resolv.conf");
     EXPECT_EQ(Requests("DHCPDISCOVER"), 1);
     EXPECT_EQ(Requests("DHCPRELEASE"), 0);
 }

@@ -6,6 +6,7 @@
 #include "readiness.h"
 
 #include "support/process.h"
+#include "support/service.h"
 
 #include <algorithm>
 #include <array>
@@ -119,10 +120,12 @@ bool Applier::Program(const std::vector<std::string>& command, std::chrono::mill
 
 bool Applier::RunServices(const Stage& stage)
 {
-    ProcessResult result;
     return std::all_of(stage.lines.begin(), stage.lines.end(), [&](const std::string& line) {
-        return Program(Words(line), kServiceDeadline, "", result) ||
-               Fail(line + " failed: " + OneLine(result.errors));
+        const auto words = Words(line);
+        const std::string service = words.at(0).substr(words.at(0).rfind('/') + 1);
+        std::string error;
+        return RunService(service, words.at(1), kServiceDeadline, error) ||
+               Fail(line + " failed: " + OneLine(error));
     });
 }
 

@@ -16,6 +16,7 @@ using ClientOptions = std::vector<std::string>;
 
 /** The option of a client that leaves IPv6 alone. */
 constexpr char kOnlyIPv4[] = "ipv4only";
+constexpr char kOnlyIPv6[] = "ipv6only";
 
 /** A client as an earlier run left it. */
 struct LiveClient {

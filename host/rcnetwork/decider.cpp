@@ -4,6 +4,8 @@
 
 #include <algorithm>
 
+#include <linux/rtnetlink.h>
+
 namespace vornhost {
 namespace {
 
@@ -110,6 +112,30 @@ bool Decider::BridgeIsLive() const
     return m_unit.bridgeLink != nullptr || m_anyBridge != nullptr;
 }
 
+/**
+ * So it is at boot, and then there is no reason to leave anything as it is: a bridge that the
+ * switch knows from before carries nothing yet.
+ */
+bool Decider::NothingIsLive() const
+{
+    const auto record = m_inputs.runState.interfaces.find(m_unit.name);
+    if (record != m_inputs.runState.interfaces.end() && !record->second.Empty()) {
+        return false;
+    }
+    const auto& addresses = m_inputs.live.addresses;
+    const std::string master =
+        m_unit.port == nullptr ? "" : m_inputs.live.NameOf(m_unit.port->master);
+    const bool isMember = !master.empty() && master != kDatapathLink;
+    return !isMember &&
+           std::none_of(addresses.begin(), addresses.end(), [&](const Address& address) {
+               const Link* link = m_inputs.live.FindLink(address.index);
+               return address.scope == RT_SCOPE_UNIVERSE && link != nullptr &&
+                      (PlainOf(link->name) == m_unit.name ||
+                       PlainOf(link->name) == PlainOf(m_unit.bridge) ||
+                       m_inputs.live.NameOf(link->parent) == m_unit.name);
+           });
+}
+
 /** Such an interface is no unit of its own: its bond is. */
 bool Decider::IsPartOfABond() const
 {
@@ -138,7 +164,7 @@ void Decider::ChooseForStart()
     if (usable && !file->slave) {
         m_unit.target = Target::kSwitch;
         m_unit.file = file;
-    } else if (file == nullptr || usable || !BridgeIsLive()) {
+    } else if (file == nullptr || usable || !BridgeIsLive() || NothingIsLive()) {
         ChooseWithoutBridgeFile();
     }
     if (m_unit.target == Target::kSwitch && m_inputs.request.withoutSwitch.contains(m_unit.name)) {
@@ -182,6 +208,13 @@ void Decider::ChooseWithoutBridgeFile()
         return;
     }
     const InterfaceFile& file = found->second;
+    if (file.fromBridge && NothingIsLive()) {
+        Say(Severity::kWarning, "nothing of " + m_unit.name + " is live; ifcfg-" + file.name +
+                                    " counts for it all the same");
+        m_unit.target = Target::kPlain;
+        m_unit.file = &file;
+        return;
+    }
     if (file.use != FileUse::kPlain || m_kinship.HasUnclearMaster(m_unit.name)) {
         return;
     }
@@ -208,7 +241,7 @@ void Decider::ChooseWithoutBridgeFile()
     if (file.bridge == m_unit.bridge && !file.slave && !m_inputs.files.contains(m_unit.bridge)) {
         Say(Severity::kWarning, "ifcfg-" + file.name + " names the bridge " + file.bridge +
                                     ", which has no usable file");
-        if (BridgeIsLive()) {
+        if (BridgeIsLive() && !NothingIsLive()) {
             return;
         }
     }

@@ -29,6 +29,7 @@ private:
     bool IsJoined() const;
     bool IsOurs() const;
     bool BridgeIsLive() const;
+    bool NothingIsLive() const;
     bool IsPartOfABond() const;
     void ChooseForStop();
     void ChooseForStart();

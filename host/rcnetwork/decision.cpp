@@ -78,6 +78,20 @@ std::vector<Unit> DecideUnits(const Inputs& inputs, const Kinship& kinship,
     return units;
 }
 
+std::set<std::string> WantedOnSwitch(const Inputs& inputs)
+{
+    const std::set<std::string> concerned = Concerned(inputs);
+    std::set<std::string> names;
+    for (const auto& [name, file] : inputs.files) {
+        const bool asked =
+            inputs.request.names.empty() ? file.onBoot : concerned.contains(PlainOf(name));
+        if (file.use == FileUse::kBridge && !file.slave && asked) {
+            names.insert(PlainOf(name));
+        }
+    }
+    return names;
+}
+
 std::set<std::string> NotOnSwitch(const Inputs& inputs)
 {
     std::vector<Remark> remarks;

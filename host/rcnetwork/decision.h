@@ -14,6 +14,9 @@ namespace vornhost {
 std::vector<Unit> DecideUnits(const Inputs& inputs, const Kinship& kinship,
                               std::vector<Remark>& remarks);
 
+/** @return  the interfaces whose files ask for the switch, whatever can be had. */
+std::set<std::string> WantedOnSwitch(const Inputs& inputs);
+
 /** @return  the interfaces that shall be carried by the switch and are not. */
 std::set<std::string> NotOnSwitch(const Inputs& inputs);
 

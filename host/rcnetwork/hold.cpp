@@ -1,24 +1,17 @@
 #include "hold.h"
 
-#include "inputs.h"
-#include "reconcile.h"
+#include "alone.h"
+#include "hostsettings.h"
 
 #include "support/atomicfile.h"
-#include "support/keyvaluefile.h"
 
 #include <algorithm>
-#include <array>
-#include <cerrno>
-#include <charconv>
-#include <csignal>
 #include <ctime>
 #include <fstream>
 #include <sstream>
 #include <thread>
 
-#include <fcntl.h>
 #include <nlohmann/json.hpp>
-#include <sys/wait.h>
 #include <unistd.h>
 
 namespace vornhost {
@@ -27,12 +20,7 @@ namespace {
 using Json = nlohmann::json;
 
 constexpr char kHoldPath[] = "/run/vornovs/network.hold";
-constexpr char kSettingsPath[] = "/etc/vornovs-host.conf";
-constexpr char kOwnProgram[] = "/proc/self/exe";
-constexpr unsigned kDefaultSeconds = 30;
-constexpr unsigned kMostSeconds = 3600;
 constexpr mode_t kPrivate = 0600;
-constexpr unsigned kLowestOtherDescriptor = 3;
 
 struct Hold {
     std::string token;
@@ -68,69 +56,23 @@ std::string NewToken()
            std::to_string(now.tv_nsec);
 }
 
-/** Gives the holder nothing of its caller's: no descriptors, no folder, no signal settings. */
-void Detach()
-{
-    if (chdir("/") != 0) {
-        _exit(1);
-    }
-    const int null = open("/dev/null", O_RDWR | O_CLOEXEC);
-    for (const int descriptor : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
-        (void)dup2(null, descriptor);
-    }
-    (void)close_range(kLowestOtherDescriptor, ~0U, 0);
-    for (int signal = 1; signal < NSIG; ++signal) {
-        (void)std::signal(signal, SIG_DFL);
-    }
-    sigset_t none;
-    (void)sigemptyset(&none);
-    (void)sigprocmask(SIG_SETMASK, &none, nullptr);
-}
-
-/** Starts the holder as nobody's child. */
+/** In a unit of its own nothing that ends the client reaches it, not even what ends all of it. */
 bool StartHolder(const std::string& token)
 {
-    std::string program = "rc.network";
-    std::string verb = kHolderVerb;
-    std::string argument = token;
-    std::array<char*, 4> arguments{program.data(), verb.data(), argument.data(), nullptr};
-    std::vector<std::string> settings = ToolEnvironment();
-    std::vector<char*> environment;
-    environment.reserve(settings.size() + 1);
-    for (std::string& setting : settings) {
-        environment.push_back(setting.data());
-    }
-    environment.push_back(nullptr);
-
-    const pid_t child = fork();
-    if (child == 0) {
-        // Before the holder exists, so that nothing meant for its caller's group can reach it.
-        (void)setsid();
-        const pid_t holder = fork();
-        if (holder == 0) {
-            Detach();
-            (void)execve(kOwnProgram, arguments.data(), environment.data());
-            _exit(1);
-        }
-        _exit(holder < 0 ? 1 : 0);
-    }
-    int status = -1;
-    while (child > 0 && waitpid(child, &status, 0) < 0 && errno == EINTR) {
-    }
-    return child > 0 && status == 0;
+    return StartAlone("vornovs-hold@" + token + ".service", {kHolderVerb, token});
 }
 
 } // namespace
 
 std::chrono::seconds HoldTime()
 {
-    const auto settings = KeyValueFile::Load(kSettingsPath);
-    const std::string text = settings ? settings->Get("HOLD_SECONDS").value_or("") : "";
-    unsigned seconds = 0;
-    const auto [stop, error] = std::from_chars(text.data(), text.data() + text.size(), seconds);
-    const bool usable = error == std::errc() && stop == text.data() + text.size() && seconds > 0 &&
-                        seconds <= kMostSeconds;
-    return std::chrono::seconds(usable ? seconds : kDefaultSeconds);
+    constexpr unsigned kUsual = 30;
+    return HostSeconds("HOLD_SECONDS", kUsual, 1);
+}
+
+bool IsHeld()
+{
+    return ReadHold().has_value();
 }
 
 bool BeginHold(const Request& request)

@@ -29,6 +29,9 @@ std::chrono::seconds HoldTime();
  */
 bool BeginHold(const Request& request);
 
+/** @return  whether a start is still to come. */
+bool IsHeld();
+
 /** Ends the hold of these interfaces, all of them when none is named. */
 void EndHold(const std::set<std::string>& names);
 

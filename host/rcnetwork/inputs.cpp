@@ -39,13 +39,15 @@ std::string CommentValue(const std::string& script, const std::string& key)
     return {};
 }
 
-bool ServiceRuns(const std::string& script)
+/** @return  the number of a service's process, empty when it does not run. */
+std::string ServiceProcess(const std::string& script)
 {
     const std::string process = FirstLine(CommentValue(script, "pidfile"));
     const bool isNumber =
         !process.empty() && process.find_first_not_of("0123456789") == std::string::npos;
-    return isNumber &&
-           FirstLine("/proc/" + process + "/comm") == CommentValue(script, "processname");
+    const bool runs =
+        isNumber && FirstLine("/proc/" + process + "/comm") == CommentValue(script, "processname");
+    return runs ? process : "";
 }
 
 ParsedFile ReadInterfaceFile(const std::string& name, const std::filesystem::path& path)
@@ -63,8 +65,11 @@ ParsedFile ReadInterfaceFile(const std::string& name, const std::filesystem::pat
     return parsed;
 }
 
-bool ReadFiles(Inputs& inputs, std::vector<Remark>& remarks)
+} // namespace
+
+std::optional<std::map<std::string, InterfaceFile>> ReadInterfaceFiles(std::vector<Remark>& remarks)
 {
+    std::map<std::string, InterfaceFile> files;
     std::error_code error;
     std::filesystem::directory_iterator entries(kConfigurationFolder, error);
     for (; !error && entries != std::filesystem::directory_iterator(); entries.increment(error)) {
@@ -74,14 +79,17 @@ bool ReadFiles(Inputs& inputs, std::vector<Remark>& remarks)
         }
         ParsedFile parsed = ReadInterfaceFile(name, entries->path());
         remarks.insert(remarks.end(), parsed.remarks.begin(), parsed.remarks.end());
-        inputs.files[name] = std::move(parsed.file);
+        files[name] = std::move(parsed.file);
     }
     if (error) {
         remarks.push_back({Severity::kError, std::string("cannot read ") + kConfigurationFolder +
                                                  ": " + error.message()});
+        return std::nullopt;
     }
-    return !error;
+    return files;
 }
+
+namespace {
 
 void ReadGateways(Inputs& inputs, std::vector<Remark>& remarks)
 {
@@ -103,7 +111,7 @@ void ReadSwitchState(Inputs& inputs, std::vector<Remark>& remarks)
         inputs.switchState.hung = true;
         return;
     }
-    if (!ServiceRuns(kDatabaseService) || !ServiceRuns(kSwitchService)) {
+    if (SwitchProcesses().empty()) {
         return;
     }
     if (auto bridges = vornhost::ReadSwitch(kReadLimit)) {
@@ -161,6 +169,13 @@ void ReadAllSettings(Inputs& inputs)
 
 } // namespace
 
+std::string SwitchProcesses()
+{
+    const std::string database = ServiceProcess(kDatabaseService);
+    const std::string daemon = ServiceProcess(kSwitchService);
+    return database.empty() || daemon.empty() ? "" : database + " " + daemon;
+}
+
 std::vector<std::string> ToolEnvironment()
 {
     return {"PATH=/usr/local/sbin:/usr/local/bin:/usr/sbin:/usr/bin:/sbin:/bin", "LC_ALL=C",
@@ -171,9 +186,11 @@ std::optional<Inputs> ReadInputs(const Request& request, std::vector<Remark>& re
 {
     Inputs inputs;
     inputs.request = request;
-    if (!ReadFiles(inputs, remarks)) {
+    auto files = ReadInterfaceFiles(remarks);
+    if (!files) {
         return std::nullopt;
     }
+    inputs.files = std::move(*files);
     ReadGateways(inputs, remarks);
     ReadSwitchState(inputs, remarks);
     ReadRunState(inputs);

@@ -6,6 +6,7 @@
 
 #include "plan.h"
 
+#include <map>
 #include <optional>
 #include <string>
 #include <vector>
@@ -18,6 +19,17 @@ constexpr char kSwitchService[] = "/etc/init.d/vornovs-vswitch";
 
 /** The environment of the programs that are run; a switch that hangs ends their wait. */
 std::vector<std::string> ToolEnvironment();
+
+/** @return  which processes the switch's daemons are; empty while not both of them run. */
+std::string SwitchProcesses();
+
+/**
+ * Reads the files of all interfaces.
+ * @param remarks  Receives what there is to say about them.
+ * @return  nullopt when their folder could not be read.
+ */
+std::optional<std::map<std::string, InterfaceFile>>
+ReadInterfaceFiles(std::vector<Remark>& remarks);
 
 /**
  * Reads files, gateways, the kernel, the switch and what earlier runs made.

@@ -1,16 +1,18 @@
-#include "handover.h"
+#include "automatic.h"
 #include "hold.h"
+#include "online.h"
 #include "reconcile.h"
 #include "report.h"
+#include "retry.h"
+#include "runs.h"
 
 #include "support/interfacename.h"
-#include "support/runlock.h"
 
-#include <cerrno>
+#include <algorithm>
+#include <array>
 #include <csignal>
 #include <cstdio>
 #include <cstdlib>
-#include <cstring>
 
 #include <sys/prctl.h>
 #include <syslog.h>
@@ -18,46 +20,78 @@
 namespace vornhost {
 namespace {
 
-constexpr char kLockName[] = "network.lock";
-constexpr int kLockSeconds = 90;
 constexpr int kUsageError = 2;
 constexpr char kBondVerb[] = "set-ovs-bond";
 /** Of the hook program that is told of conversions: "begin" or "end". */
 constexpr char kHandoverVerb[] = "handover";
 
+/** Of the tool that gives interfaces back to another manager. */
+constexpr char kLeaveVerb[] = "leave";
+
 constexpr char kUsage[] =
     "Usage: rc.network [--dry-run] start|stop [interface...]\n"
     "       rc.network set-ovs-bond bond\n"
+    "       rc.network leave interface...\n"
+    "       rc.network wait-online\n"
     "Brings the network to what the files in /etc/sysconfig/network-scripts ask for (start),\n"
     "or takes down what start made (stop); without interfaces, all of them. set-ovs-bond brings\n"
     "the options of a bond on the switch to what its file says, while it goes on to work.\n"
+    "leave ends what works for interfaces and changes nothing on them: somebody else takes over.\n"
+    "wait-online waits until the addresses that the files ask for answer.\n"
+    "  --boot      wait for interfaces that have not appeared yet, within a limit\n"
     "  --dry-run   print what would be done and change nothing\n"
     "Exit status: 0 all of it is so now, 1 something is not (it says what), 2 wrong usage.\n";
 
-int Fail(const std::string& text)
-{
-    Say({Severity::kError, text});
-    return EXIT_FAILURE;
-}
+/** What a verb is followed by. */
+enum class Words { kNone, kInterfaces, kInterface, kText };
 
-/** Lets one run at a time change the network; free again when its owner dies. */
-Descriptor TakeNetworkLock()
-{
-    return TakeRunLock(kLockName, LockDeadlineIn(kLockSeconds));
-}
+struct VerbForm {
+    const char* name;
+    Words words;
+    bool takesTime; ///< It waits, and locks the network only when it changes something.
+};
 
-int FailWithoutLock()
+constexpr std::array kVerbs = {
+    VerbForm{"start", Words::kInterfaces, false},     VerbForm{"stop", Words::kInterfaces, false},
+    VerbForm{kLeaveVerb, Words::kInterfaces, false},  VerbForm{kOnlineVerb, Words::kNone, true},
+    VerbForm{kBondVerb, Words::kInterface, false},    VerbForm{kHandoverVerb, Words::kText, false},
+    VerbForm{kHolderVerb, Words::kText, true},        VerbForm{kRetryVerb, Words::kNone, true},
+    VerbForm{kAppearedVerb, Words::kInterface, true},
+};
+
+const VerbForm* FindVerb(const std::string& name)
 {
-    return Fail(std::string("cannot get the lock ") + kRunFolder + "/" + kLockName);
+    const auto* const found = std::find_if(kVerbs.begin(), kVerbs.end(),
+                                           [&](const VerbForm& verb) { return name == verb.name; });
+    return found == kVerbs.end() ? nullptr : found;
 }
 
 struct CommandLine {
     std::string verb;
     Request request;
-    std::string token; ///< Of the holder.
-    std::string bond;  ///< Of the verb for bonds.
+    std::string word; ///< The one word of a verb that has one.
     bool dryRun = false;
+    bool boot = false;
 };
+
+/** Takes a word that follows the verb. @return  whether it may stand there. */
+bool TakeWord(const std::string& argument, CommandLine& line)
+{
+    const Words words = FindVerb(line.verb)->words;
+    if (words == Words::kInterfaces && IsInterfaceName(argument)) {
+        line.request.names.insert(PlainOf(argument));
+        return true;
+    }
+    const bool taken =
+        line.word.empty() &&
+        (words == Words::kText || (words == Words::kInterface && IsInterfaceName(argument)));
+    if (taken) {
+        line.word = argument;
+    } else if (words != Words::kText && !IsInterfaceName(argument)) {
+        (void)std::fprintf(stderr, "rc.network: \"%s\" is no interface name\n", argument.c_str());
+    }
+    return taken;
+}
 
 bool ParseCommandLine(int count, char** arguments, CommandLine& line)
 {
@@ -65,87 +99,84 @@ bool ParseCommandLine(int count, char** arguments, CommandLine& line)
         const std::string argument = arguments[i];
         if (argument == "--dry-run") {
             line.dryRun = true;
-        } else if (line.verb.empty()) {
+        } else if (argument == "--boot") {
+            line.boot = true;
+        } else if (line.verb.empty() && FindVerb(argument) != nullptr) {
             line.verb = argument;
-        } else if (line.token.empty() && (line.verb == kHolderVerb || line.verb == kHandoverVerb)) {
-            line.token = argument;
-        } else if (line.verb == kBondVerb && line.bond.empty() && IsInterfaceName(argument)) {
-            line.bond = argument;
-        } else if (line.verb != kBondVerb && IsInterfaceName(argument)) {
-            line.request.names.insert(PlainOf(argument));
-        } else {
-            (void)std::fprintf(stderr, "rc.network: \"%s\" is no interface name\n", arguments[i]);
+        } else if (line.verb.empty() || !TakeWord(argument, line)) {
             return false;
         }
     }
+    if (line.verb.empty()) {
+        return false;
+    }
     line.request.verb = line.verb == "stop" ? Verb::kStop : Verb::kStart;
-    return line.verb == "start" || line.verb == "stop" ||
-           (line.verb == kBondVerb && !line.bond.empty() && !line.dryRun) ||
-           (line.verb == kHandoverVerb && (line.token == "begin" || line.token == "end")) ||
-           (line.verb == kHolderVerb && !line.token.empty());
+    const Words words = FindVerb(line.verb)->words;
+    const bool isPlain = words == Words::kInterfaces;
+    return line.word.empty() == (isPlain || words == Words::kNone) && (isPlain || !line.dryRun) &&
+           (!line.boot || line.verb == "start") &&
+           (line.verb != kLeaveVerb || (!line.request.names.empty() && !line.dryRun)) &&
+           (line.verb != kHandoverVerb || line.word == "begin" || line.word == "end");
 }
 
-int Start(const Request& request)
+bool RunHolder(const std::string& token)
 {
-    // The hold lasts until all is done: if this run is killed, its holder finishes the work.
-    const std::set<std::string> concerned = ConcernedBy(request);
-    if (!Reconcile(request)) {
-        return EXIT_FAILURE;
-    }
-    EndHold(concerned);
-    return EXIT_SUCCESS;
-}
-
-int Stop(const Request& request)
-{
-    if (IsPartOfConversion()) {
-        const bool kept = KeepTags();
-        return BeginHold(request)
-                   ? (kept ? EXIT_SUCCESS : EXIT_FAILURE)
-                   : Fail(std::string("cannot hold the network: ") + std::strerror(errno));
-    }
-    EndHold(ConcernedBy(request));
-    return Reconcile(request) ? EXIT_SUCCESS : EXIT_FAILURE;
-}
-
-int RunHolder(const std::string& token)
-{
-    // Started through /proc it would be listed as "exe".
-    (void)prctl(PR_SET_NAME, "rc.network");
     WaitForStart(token, HoldTime());
     const Descriptor lock = TakeNetworkLock();
     if (!lock) {
-        return FailWithoutLock();
+        return false;
     }
     const auto request = HeldBy(token);
     if (!request) {
-        return EXIT_SUCCESS;
+        return true;
     }
     Say({Severity::kWarning, "no start followed a stop; the network is brought to its files"});
     const bool done = Reconcile(*request);
     EndHold(request->names);
-    return done ? EXIT_SUCCESS : EXIT_FAILURE;
+    return done;
 }
 
-int Run(const CommandLine& line)
+bool RunWithoutLock(const CommandLine& line)
 {
-    if (line.dryRun) {
-        return PrintPlan(line.request) ? EXIT_SUCCESS : EXIT_FAILURE;
-    }
+    // Started through /proc it would be listed as "exe".
+    (void)prctl(PR_SET_NAME, "rc.network");
     if (line.verb == kHolderVerb) {
-        return RunHolder(line.token);
+        return RunHolder(line.word);
     }
+    if (line.verb == kRetryVerb) {
+        RetryUntilDone();
+        return true;
+    }
+    if (line.verb == kAppearedVerb) {
+        return StartAppeared(line.word);
+    }
+    return line.verb == kOnlineVerb ? WaitUntilOnline() : StartAtBoot(line.request);
+}
+
+bool RunLocked(const CommandLine& line)
+{
     const Descriptor lock = TakeNetworkLock();
     if (!lock) {
-        return FailWithoutLock();
+        return false;
+    }
+    if (line.verb == kLeaveVerb) {
+        return Leave(line.request);
     }
     if (line.verb == kBondVerb) {
-        return SetSwitchBond(line.bond) ? EXIT_SUCCESS : EXIT_FAILURE;
+        return SetSwitchBond(line.word);
     }
     if (line.verb == kHandoverVerb) {
-        return BeginHandover(line.token == "begin") ? EXIT_SUCCESS : EXIT_FAILURE;
+        return BeginHandover(line.word == "begin");
     }
     return line.request.verb == Verb::kStop ? Stop(line.request) : Start(line.request);
+}
+
+bool Run(const CommandLine& line)
+{
+    if (line.dryRun) {
+        return PrintPlan(line.request);
+    }
+    return line.boot || FindVerb(line.verb)->takesTime ? RunWithoutLock(line) : RunLocked(line);
 }
 
 } // namespace
@@ -163,8 +194,9 @@ int main(int count, char** arguments)
             (void)std::fputs(vornhost::kUsage, stderr);
             return vornhost::kUsageError;
         }
-        return vornhost::Run(line);
+        return vornhost::Run(line) ? EXIT_SUCCESS : EXIT_FAILURE;
     } catch (const std::exception& exception) {
-        return vornhost::Fail(exception.what());
+        vornhost::Say({vornhost::Severity::kError, exception.what()});
+        return EXIT_FAILURE;
     }
 }

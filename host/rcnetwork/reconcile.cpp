@@ -3,6 +3,7 @@
 #include "apply.h"
 #include "decision.h"
 #include "inputs.h"
+#include "retry.h"
 
 #include "support/atomicfile.h"
 #include "support/wholebonds.h"
@@ -43,6 +44,8 @@ class Reconciler {
 public:
     explicit Reconciler(Request request) : m_request(std::move(request)) {}
     bool Run();
+    /** Leaves word of what is to be on the switch and is not. */
+    void MindWaiting() const;
 
 private:
     void SayOnce(const std::vector<Remark>& remarks);
@@ -58,6 +61,8 @@ private:
 
     Request m_request;
     std::vector<Remark> m_said;
+    std::set<std::string> m_concerned; ///< None: everything.
+    std::set<std::string> m_unasked;   ///< What a switch that does not answer was to carry.
     bool m_failed = false;
     bool m_canGoOn = true;
 };
@@ -82,6 +87,8 @@ std::optional<Inputs> Reconciler::Read()
     m_canGoOn = inputs.has_value();
     m_request.switchHung = inputs && inputs->switchState.hung;
     if (inputs) {
+        m_concerned = m_request.names.empty() ? std::set<std::string>() : Concerned(*inputs);
+        m_unasked = inputs->switchState.hung ? WantedOnSwitch(*inputs) : std::set<std::string>();
         RememberNames(*inputs);
         UpdateHandover(*inputs);
     }
@@ -233,6 +240,16 @@ bool Reconciler::ReportRest()
     return false;
 }
 
+void Reconciler::MindWaiting() const
+{
+    if (!m_canGoOn) {
+        return;
+    }
+    std::set<std::string> waiting = m_unasked;
+    waiting.insert(m_request.withoutSwitch.begin(), m_request.withoutSwitch.end());
+    MindRetry(m_concerned, m_request.verb == Verb::kStart ? waiting : std::set<std::string>());
+}
+
 bool Reconciler::Run()
 {
     if (m_request.verb == Verb::kStart) {
@@ -270,7 +287,10 @@ bool PrintPlan(const Request& request)
 
 bool Reconcile(const Request& request)
 {
-    return Reconciler(request).Run();
+    Reconciler reconciler(request);
+    const bool done = reconciler.Run();
+    reconciler.MindWaiting();
+    return done;
 }
 
 std::set<std::string> ConcernedBy(const Request& request)

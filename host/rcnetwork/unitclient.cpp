@@ -135,11 +135,27 @@ bool UnitPlanner::ClientHasIpv6() const
            std::find(options.begin(), options.end(), kOnlyIPv4) == options.end();
 }
 
+/** What a client of the other family only finds on the interface is somebody else's. */
+bool UnitPlanner::HadClientFor(int family) const
+{
+    const char* const other = family == AF_INET ? kOnlyIPv6 : kOnlyIPv4;
+    std::vector<std::string> names = ClientNames();
+    names.insert(names.begin(), Carrier());
+    for (const std::string& name : names) {
+        const auto client = m_inputs.clients.find(name);
+        if (client != m_inputs.clients.end()) {
+            const ClientOptions& options = client->second.options;
+            return std::find(options.begin(), options.end(), other) == options.end();
+        }
+    }
+    return true;
+}
+
 /** Its addresses are told by that the kernel makes no route for their prefix. */
 bool UnitPlanner::IsLeftByClient(const Address& address) const
 {
     if (!m_former.client || (address.flags & IFA_F_NOPREFIXROUTE) == 0 ||
-        address.scope != RT_SCOPE_UNIVERSE) {
+        address.scope != RT_SCOPE_UNIVERSE || !HadClientFor(address.family)) {
         return false;
     }
     if (m_unit.takeDown || m_unit.file == nullptr) {

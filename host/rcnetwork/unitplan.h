@@ -188,6 +188,7 @@ private:
     ClientPlace PlaceOfClient() const;
     const Link* CardOf(const std::string& name) const;
     bool ClientHasIpv6() const;
+    bool HadClientFor(int family) const;
     bool IsLeftByClient(const Address& address) const;
     void CheckMetrics() const;
 

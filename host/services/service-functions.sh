@@ -122,15 +122,20 @@ run_clean()
         exec "$@"' run_clean "$@" </dev/null
 }
 
-# start_daemon COMMAND...: the daemon leaves our session by itself, is restarted when it crashes,
-# and its first process returns once it is ready.
+# start_daemon COMMAND...: the daemon leaves our session by itself, is restarted when it crashes, by
+# itself or by systemd, and its first process returns once it is ready.
 start_daemon()
 {
     make_folder 0755 "$run_folder"
     make_folder 0750 "$log_folder"
+    monitor=--monitor
+    if [ "${VORNOVS_SCRIPT-}" = unit ]; then
+        monitor=
+    fi
+    # shellcheck disable=SC2086 # one word or none
     run_clean timeout "$start_limit" "$@" \
         -vconsole:emer -vsyslog:err -vfile:info \
-        --log-file="$log_folder/$daemon.log" --pidfile="$pid_file" --detach --monitor
+        --log-file="$log_folder/$daemon.log" --pidfile="$pid_file" --detach $monitor
 }
 
 stop()
@@ -167,9 +172,31 @@ status()
     return 3
 }
 
+# Where systemd runs, it is asked: the daemon shall be in its unit and not in the caller's session.
+# VORNOVS_SCRIPT: "unit" when the unit calls, "alone" when systemd is not to be asked.
+belongs_to_systemd()
+{
+    [ -z "${VORNOVS_SCRIPT-}" ] && [ -d /run/systemd/system ] &&
+        [ -e "/usr/lib/systemd/system/$service.service" ]
+}
+
 # perform VERB: the script's start() and these functions under the usual verbs.
 perform()
 {
+    case $1 in
+    start | restart | force-reload)
+        if belongs_to_systemd; then
+            exec systemctl "$1" "$service.service"
+        fi
+        ;;
+    stop)
+        # Then by ourselves, too: the daemon may be another's.
+        if belongs_to_systemd; then
+            systemctl stop "$service.service"
+        fi
+        ;;
+    esac
+
     case $1 in
     start)
         take_turn

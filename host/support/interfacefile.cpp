@@ -91,7 +91,8 @@ bool InterfaceParser::IsOwnFile()
     const std::string device = Value("DEVICE");
     if (!device.empty() && device != m_parsed.file.name) {
         Leave("ignored, because its DEVICE is " + device);
-        return false;
+        m_parsed.file.fromBridge = IsFileOf(m_values, m_parsed.file.name);
+        return m_parsed.file.fromBridge;
     }
     return true;
 }
@@ -214,9 +215,11 @@ ParsedFile InterfaceParser::Parse()
     if (!IsOwnFile()) {
         return m_parsed;
     }
-    ReadStructure();
-    DecideUse();
-    if (m_parsed.file.use != FileUse::kLeaveAlone) {
+    if (!m_parsed.file.fromBridge) {
+        ReadStructure();
+        DecideUse();
+    }
+    if (m_parsed.file.use != FileUse::kLeaveAlone || m_parsed.file.fromBridge) {
         ReadLinkKeys();
         ReadLinkCommands();
         ReadAddressing();

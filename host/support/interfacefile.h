@@ -58,6 +58,9 @@ struct FileClient {
 struct InterfaceFile {
     std::string name;
     FileUse use = FileUse::kNone;
+    /** To be left alone while anything of it is live: its bridge's file, which is no more, was
+        copied over it and not edited yet. */
+    bool fromBridge = false;
     std::string primary;                  ///< The plain interface of a bridge file.
     std::string bridge;                   ///< The bridge that a plain file names.
     bool slave = false;                   ///< A member of a bond, or the bridge of one.

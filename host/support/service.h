@@ -13,7 +13,7 @@ namespace vornhost {
 constexpr char kServiceScripts[] = "/etc/init.d/";
 
 /** In the environment of a script that shall do the work itself and not pass it on to systemd. */
-constexpr char kScriptMark[] = "VORNOVS_SCRIPT=1";
+constexpr char kScriptMark[] = "VORNOVS_SCRIPT=alone";
 
 /**
  * Starts, stops or restarts a service: has systemd do it where it runs and knows a unit of that

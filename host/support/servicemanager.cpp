@@ -203,6 +203,17 @@ bool RunJob(const char* method, const std::string& unit, milliseconds deadline, 
     }
 }
 
+/** What failed too often is not started any more; somebody who asks for it anew wants it tried. */
+void ForgetFailures(const std::string& unit)
+{
+    const Bus bus = Connect();
+    if (bus != nullptr &&
+        sd_bus_set_method_call_timeout(bus.get(), microseconds(kAnswerLimit).count()) >= 0) {
+        (void)sd_bus_call_method(bus.get(), kDestination, kManagerPath, kManager, "ResetFailedUnit",
+                                 nullptr, nullptr, "s", unit.c_str());
+    }
+}
+
 /** @return  a property of a unit, which is loaded for that; nullopt when systemd does not answer,
  *           empty when it knows no unit of that name. */
 std::optional<std::string> UnitProperty(const std::string& unit, const char* property)
@@ -235,6 +246,7 @@ std::optional<std::string> UnitProperty(const std::string& unit, const char* pro
 
 bool StartUnit(const std::string& unit, milliseconds deadline, std::string* error)
 {
+    ForgetFailures(unit);
     return RunJob("StartUnit", unit, deadline, error);
 }
 

@@ -11,14 +11,14 @@ namespace {
 
 using nlohmann::json;
 
-constexpr char kSocket[] = "/var/run/openvswitch/db.sock";
-
-constexpr char kRequest[] = R"({"method":"transact","id":0,"params":["Open_vSwitch",)"
-                            R"({"op":"select","table":"Bridge","where":[],"columns":)"
-                            R"(["name","ports","external_ids","other_config","datapath_type"]},)"
-                            R"({"op":"select","table":"Port","where":[]},)"
-                            R"({"op":"select","table":"Interface","where":[],"columns":)"
-                            R"(["_uuid","name","ofport","error","mtu_request","lacp_current"]}]})";
+constexpr char kRequest[] =
+    R"({"method":"transact","id":0,"params":["Open_vSwitch",)"
+    R"({"op":"select","table":"Bridge","where":[],"columns":)"
+    R"(["name","ports","external_ids","other_config","datapath_type"]},)"
+    R"({"op":"select","table":"Port","where":[]},)"
+    R"({"op":"select","table":"Interface","where":[],"columns":)"
+    R"(["_uuid","name","ofport","error","mtu_request","lacp_current","mac_in_use",)"
+    R"("link_state"]}]})";
 
 // A reference is ["uuid", text]; a column of several values ["set", [values]].
 std::string Reference(const json& value)
@@ -88,7 +88,7 @@ SwitchValues SingleValues(const json& row)
     return values;
 }
 
-bool ByName(const SwitchPort& one, const SwitchPort& other)
+bool ByName(const auto& one, const auto& other)
 {
     return one.name < other.name;
 }
@@ -96,17 +96,42 @@ bool ByName(const SwitchPort& one, const SwitchPort& other)
 using InterfaceRows = std::map<std::string, json>;
 using Ports = std::map<std::string, SwitchPort>;
 
+SwitchInterface ParseState(const json& row)
+{
+    SwitchInterface state;
+    state.name = row.at("name").get<std::string>();
+    state.mac = Text(row, "mac_in_use");
+    const std::string link = Text(row, "link_state");
+    if (!link.empty()) {
+        state.link = link == "up";
+    }
+    state.negotiated = row.value("lacp_current", json()) == json(true);
+    state.error = Text(row, "error");
+    return state;
+}
+
 void ParseInterface(const json& row, SwitchPort& port)
 {
-    const auto name = row.at("name").get<std::string>();
+    const SwitchInterface state = ParseState(row);
     if (port.interfaces.empty()) {
         port.mtuRequest = Number(row, "mtu_request");
     }
-    port.interfaces.push_back(name);
-    if (Number(row, "ofport") && Text(row, "error").empty()) {
-        port.working.push_back(name);
+    port.interfaces.push_back(state.name);
+    if (Number(row, "ofport") && state.error.empty()) {
+        port.working.push_back(state.name);
     }
-    port.negotiated = port.negotiated || row.value("lacp_current", json()) == json(true);
+    port.negotiated = port.negotiated || state.negotiated;
+    port.state.push_back(state);
+}
+
+// A column of one VLAN is a number; of several, or none, ["set", [numbers]].
+std::vector<unsigned> Vlans(const json& row, const char* column)
+{
+    if (const auto single = Number(row, column)) {
+        return {*single};
+    }
+    const auto found = row.find(column);
+    return found == row.end() ? std::vector<unsigned>() : found->at(1).get<std::vector<unsigned>>();
 }
 
 SwitchPort ParsePort(const json& row, const InterfaceRows& interfaces)
@@ -118,12 +143,14 @@ SwitchPort ParsePort(const json& row, const InterfaceRows& interfaces)
     }
     std::sort(port.interfaces.begin(), port.interfaces.end());
     std::sort(port.working.begin(), port.working.end());
+    std::sort(port.state.begin(), port.state.end(), ByName<SwitchInterface, SwitchInterface>);
     port.columns = SingleValues(row);
     port.otherConfig = Pairs(row, "other_config");
     port.externalIds = Pairs(row, "external_ids");
     port.bond = port.interfaces.size() > 1 || port.columns.contains("bond_mode");
     port.marked = HoldsMark(port.externalIds);
     port.tag = Number(row, "tag");
+    port.trunks = Vlans(row, "trunks");
     return port;
 }
 
@@ -149,7 +176,7 @@ std::vector<SwitchBridge> ParseBridges(const json& rows, const Ports& ports)
         for (const std::string& port : References(row.at("ports"))) {
             bridge.ports.push_back(ports.at(port));
         }
-        std::sort(bridge.ports.begin(), bridge.ports.end(), ByName);
+        std::sort(bridge.ports.begin(), bridge.ports.end(), ByName<SwitchPort, SwitchPort>);
         bridge.marked = HoldsMark(Pairs(row, "external_ids"));
         bridge.hwaddr = Pairs(row, "other_config")["hwaddr"];
         bridge.datapathType = Text(row, "datapath_type");
@@ -180,7 +207,7 @@ std::optional<std::vector<SwitchBridge>> ParseSwitchReply(std::string_view reply
 
 std::optional<std::vector<SwitchBridge>> ReadSwitch(std::chrono::milliseconds limit)
 {
-    const auto reply = AskDatabase(kSocket, kRequest, limit);
+    const auto reply = AskDatabase(kSwitchSocket, kRequest, limit);
     return reply ? ParseSwitchReply(*reply) : std::nullopt;
 }
 

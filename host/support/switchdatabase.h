@@ -13,6 +13,9 @@
 
 namespace vornhost {
 
+/** Where the database server listens. */
+constexpr char kSwitchSocket[] = "/var/run/openvswitch/db.sock";
+
 /** The key and the value that the network program leaves with what it makes on the switch. */
 constexpr char kSwitchMarkKey[] = "vornovs-network";
 constexpr char kSwitchMarkValue[] = "rc.network";
@@ -22,6 +25,17 @@ constexpr char kFurtherPortKey[] = "vornovs-further";
 
 /** Columns of text and numbers, or the pairs of one column, by name. */
 using SwitchValues = std::map<std::string, std::string>;
+
+/** How the switch finds an interface of one of its ports. */
+struct SwitchInterface {
+    std::string name;
+    std::string mac{};          ///< In use; empty: not known.
+    std::optional<bool> link{}; ///< Whether it has a link; nothing: not known.
+    bool negotiated = false;    ///< Its partner speaks LACP.
+    std::string error{};        ///< Why the switch cannot use it.
+
+    bool operator==(const SwitchInterface&) const = default;
+};
 
 struct SwitchPort {
     std::string name;
@@ -35,6 +49,8 @@ struct SwitchPort {
     SwitchValues columns{};               ///< bond_mode, lacp... without those that are empty.
     SwitchValues otherConfig{};
     SwitchValues externalIds{};
+    std::vector<unsigned> trunks{};       ///< VLANs that it carries tagged; none: all.
+    std::vector<SwitchInterface> state{}; ///< Of its interfaces, sorted.
 
     bool operator==(const SwitchPort&) const = default;
     /** Whether the network program put it beside the port that the bridge stands for. */

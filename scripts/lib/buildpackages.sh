@@ -23,6 +23,7 @@ test_packages=(
     dnsmasq-base
     ethtool
     iproute2
+    systemd
 )
 
 lint_packages=(
@@ -30,6 +31,20 @@ lint_packages=(
     clang-tidy
     cppcheck
     shellcheck
+)
+
+package_packages=(
+    debhelper
+    dpkg-dev
+    fakeroot
+    scdoc
+)
+
+package_test_packages=(
+    bsdextrautils
+    lintian
+    man-db
+    zsh
 )
 
 coverage_packages=(

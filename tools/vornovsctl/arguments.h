@@ -15,6 +15,7 @@ struct Arguments {
     std::map<std::string, std::string> bondModes;             /**< bond to mode name */
     std::string format = "text";                              /**< "text", "dot" or "json" */
     bool yes = false;
+    bool dryRun = false;
 
     const std::string& Get(const char* operand) const { return operands.at(operand).front(); }
     const std::vector<std::string>& All(const char* operand) const { return operands.at(operand); }

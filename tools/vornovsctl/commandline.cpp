@@ -158,6 +158,9 @@ private:
             sub.add_option("--format", m_arguments.format, "text, dot or json")
                 ->check(CLI::IsMember({"text", "dot", "json"}));
             break;
+        case Option::kDryRun:
+            sub.add_flag("--dry-run", m_arguments.dryRun, "Only say what would be done");
+            break;
         case Option::kNone:
             break;
         }

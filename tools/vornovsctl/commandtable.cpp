@@ -17,6 +17,9 @@ const Operand kAddedInterface{"INTERFACE", "The interface, such as eth0", "the i
 const Operand kInterfaces{
     "INTERFACE", "Interfaces; none: every one", "the interface's name", InterfaceFault, 0,
     kMostNames};
+const Operand kTakenInterfaces{
+    "INTERFACE", "Interfaces; none: every one", "the interface's name", PlainInterfaceFault, 0,
+    kMostNames};
 const Operand kBridge{"BRIDGE", "The bridge, such as ovs_eth0", "the bridge's name",
                       InterfaceFault};
 const Operand kPort{"PORT", "The port, such as tap0", "the port's name", InterfaceFault};
@@ -71,6 +74,16 @@ const std::vector<CommandRow> kCommands{
      Unregister},
     {"", "status", kAboutStatus, kStatusMore, {}, kNone, kReads, kForRoot, Status},
     {"", "show", kAboutShow, kShowMore, {}, kFormat, kReads, kForAnyone, Show},
+    {"", "adopt", kAboutAdopt, kAdoptMore, {kTakenInterfaces}, kDryRun, kChanges, kForRoot, Adopt},
+    {"",
+     "release",
+     kAboutRelease,
+     kReleaseMore,
+     {kTakenInterfaces},
+     kDryRun,
+     kChanges,
+     kForRoot,
+     Release},
     {"", "reset", kAboutReset, kResetMore, {}, kYes, kChanges, kForRoot, Reset},
 
     {"interface",

@@ -22,7 +22,7 @@ struct Operand {
     std::size_t most = 1;
 };
 
-enum class Option { kNone, kSwitchModes, kLinuxModes, kYes, kConfirm, kFormat };
+enum class Option { kNone, kSwitchModes, kLinuxModes, kYes, kConfirm, kFormat, kDryRun };
 
 struct CommandRow {
     const char* group; /**< first word of two; empty: the command has one */

@@ -72,6 +72,37 @@ constexpr char kStatusMore[] =
     "  vornovsctl status\n"
     "  vornovsctl status --json | jq -r '.clients[]'";
 
+constexpr char kAboutAdopt[] = "Take interfaces over from the host's network manager";
+
+constexpr char kAdoptMore[] =
+    "Reads what ifupdown, systemd-networkd, NetworkManager or netplan do for the interfaces and\n"
+    "what is live, writes their files in /etc/sysconfig/network-scripts, and has the manager let\n"
+    "go of them, now and at every boot. Addresses, routes, leases and name servers stay as they\n"
+    "are while that happens. A bond comes with its members, and an interface with its VLANs.\n"
+    "\n"
+    "Without names it takes every wired interface that somebody manages. Wireless interfaces,\n"
+    "and others when some are named, stay with their manager. What cannot be carried over, such\n"
+    "as a bridge, is told with the reason, and then nothing at all is changed.\n"
+    "\n"
+    "When something is missing afterwards, all of it is undone. One that was cut short is\n"
+    "finished by another 'adopt' and undone by 'release'.\n"
+    "\n"
+    "Examples:\n"
+    "  vornovsctl adopt --dry-run\n"
+    "  vornovsctl adopt eth0 eth1";
+
+constexpr char kAboutRelease[] = "Give adopted interfaces back to the manager they had";
+
+constexpr char kReleaseMore[] =
+    "Makes the manager's files, and what is started at boot, what they were, and has the manager\n"
+    "go on with the interfaces. What was edited in its files since stays. Our own files of the\n"
+    "interfaces go, with what was edited in them.\n"
+    "\n"
+    "While clients are registered nothing is given back: unregister them first.\n"
+    "\n"
+    "Example:\n"
+    "  vornovsctl release";
+
 constexpr char kAboutReset[] = "Forget every client and both interface lists, nothing else";
 
 constexpr char kResetMore[] =

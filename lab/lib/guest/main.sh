@@ -10,6 +10,16 @@
 . /lab/topology.sh
 # shellcheck source=servers.sh
 . /lab/servers.sh
+# shellcheck source=manager.sh
+. /lab/manager.sh
+# shellcheck source=phases.sh
+. /lab/phases.sh
+# shellcheck source=packages.sh
+. /lab/packages.sh
+# shellcheck source=booting.sh
+. /lab/booting.sh
+# shellcheck source=takeover.sh
+. /lab/takeover.sh
 # shellcheck source=snapshot.sh
 . /lab/snapshot.sh
 # shellcheck source=probes.sh
@@ -21,21 +31,43 @@
 # shellcheck source=killed.sh
 . /lab/killed.sh
 
+# lab_main case|here: what the guest is for. The small machine's outside world is made here; the
+# other's is there since before its first program.
 lab_main()
 {
     mkdir -p "$lab_out"
-    topology_build
-    servers_start
+    if ! machine_has_systemd; then
+        topology_build
+        servers_start
+    fi
     if [ -e /lab/case/run.sh ]; then
         lab_run_case
+        if phase_ends_in_reboot; then
+            systemctl reboot
+            return
+        fi
     fi
     if [ "$1" = here ]; then
         printf '\nPorts: %s  The outside: ip netns exec outside ...  Leave with: exit\n\n' \
             "$(topology_ports)"
         cd /root || exit 1
-        setsid cttyhack bash
+        lab_shell
+        printf 'lab-left\n' >/dev/ttyS1
     else
         lab_send_results
+    fi
+    if machine_has_systemd; then
+        sync
+        poweroff -ff
+    fi
+}
+
+lab_shell()
+{
+    if machine_has_systemd; then
+        bash -i
+    else
+        setsid cttyhack bash
     fi
 }
 
@@ -45,12 +77,20 @@ lab_run_case()
     (
         set -eEu -o pipefail
         trap 'report_ended_at "$?" "${BASH_SOURCE[0]}" "$LINENO" "$BASH_COMMAND"' ERR
-        lab_boot
-        # shellcheck source=/dev/null
-        . /lab/case/run.sh
+        [ ! -e "$lab_out/failure" ] || exit 1
+        if machine_has_systemd; then
+            # shellcheck source=/dev/null
+            . /lab/case/run.sh
+            phase_run
+        else
+            lab_boot
+            # shellcheck source=/dev/null
+            . /lab/case/run.sh
+        fi
     )
-    report_verdict "$?"
+    lab_status=$?
     probes_stop >/dev/null 2>&1
+    phase_ends_in_reboot || report_verdict "$lab_status"
 }
 
 # Brings the appliance's own network up as its boot does, unless the case does without it.
@@ -66,8 +106,11 @@ lab_boot()
 
 lab_send_results()
 {
-    cp /var/log/messages "$lab_out/syslog" 2>/dev/null
-    cp "$lab_servers_log" "$lab_out/servers-log" 2>/dev/null
+    system_log >"$lab_out/syslog" 2>/dev/null
     cp -r /var/log/openvswitch "$lab_out/openvswitch-log" 2>/dev/null
-    tar -C "$lab_out" -cf - . >/dev/ttyS2 2>/dev/null
+    # Set on the open line: a line that somebody closed may have forgotten how it was set.
+    {
+        stty raw -echo <&1
+        tar -C "$lab_out" -cf - . 2>/dev/null | cat
+    } >/dev/ttyS2
 }

@@ -1,7 +1,27 @@
 # shellcheck shell=bash disable=SC2154 # variables of the guest's other files
 # What a case says: steps, figures, and failures with their reason.
 
+# True on the machine with systemd.
+machine_has_systemd()
+{
+    [ -d /lab/machine ]
+}
+
+# On the disk where there is one: what a case left before a reboot is there after it.
 lab_out=/run/lab
+if machine_has_systemd; then
+    lab_out=/lab/out
+fi
+
+# All that programs said to the system's log, of all boots.
+system_log()
+{
+    if machine_has_systemd; then
+        journalctl --quiet --no-pager --output=short-monotonic
+    else
+        cat /var/log/messages
+    fi
+}
 
 # Guest time in seconds since boot, with hundredths: the clock that counts instructions.
 guest_time()
@@ -102,12 +122,12 @@ expect_at_most()
 # expect_logged PATTERN: a line of the system log matches.
 expect_logged()
 {
-    grep -Eq -- "$1" /var/log/messages || fail "the system log has no line '$1'"
+    system_log | grep -E -- "$1" >/dev/null || fail "the system log has no line '$1'"
 }
 
 expect_not_logged()
 {
-    if grep -E -- "$1" /var/log/messages; then
+    if system_log | grep -E -- "$1"; then
         fail "the system log has a line '$1'"
     fi
 }

@@ -1,31 +1,44 @@
 # shellcheck shell=bash disable=SC2154 # variables of the guest's other files
-# The outside's servers: DHCP, DHCPv6 and router advertisements on the segments that a topology's
-# `server` lines name.
+# The outside world's DHCP servers and routers: dnsmasq, as the topology's dnsmasq.conf says, and
+# what it has been asked. Leases and log outlive a reboot where the machine has a disk.
 
-lab_servers_log=/var/log/servers
+lab_servers_log=$lab_out/servers.log
+lab_leases=$lab_out/leases
 
-# One process for all segments: two would contend for the ports of DHCPv6.
-servers_start()
-{
-    local word name options option configuration=/etc/servers.conf
-    grep -q '^server ' /lab/topology/topology || return 0
-    printf '%s\n' port=0 no-ping user=root bind-dynamic dhcp-authoritative \
-        "log-facility=$lab_servers_log" dhcp-leasefile=/var/lib/servers.leases \
-        pid-file=/run/servers.pid >"$configuration"
-    while read -r word name options; do
-        [ "$word" = server ] || continue
-        echo "interface=out-$name" >>"$configuration"
-        for option in $options; do
-            echo "$option" >>"$configuration"
-        done
-    done </lab/topology/topology
-    in_outside dnsmasq --conf-file="$configuration"
-}
-
-# True when dnsmasq serves anybody.
+# True when the outside serves anybody.
 servers_there()
 {
-    [ -e /run/servers.pid ]
+    [ -e /lab/topology/dnsmasq.conf ]
+}
+
+# Starts them where a topology has any.
+servers_start()
+{
+    servers_there || return 0
+    in_outside dnsmasq --conf-file=/lab/topology/dnsmasq.conf --user=root --pid-file=/run/servers.pid \
+        --bind-dynamic --except-interface=lo --no-resolv --no-hosts --no-ping --dhcp-authoritative \
+        --log-dhcp --log-facility="$lab_servers_log" --dhcp-leasefile="$lab_leases"
+}
+
+servers_stop()
+{
+    kill "$(cat /run/servers.pid)"
+}
+
+# servers_asked WORD...: how often a client sent one of these, as dnsmasq names them: DHCPDISCOVER,
+# DHCPREQUEST, DHCPRELEASE, DHCPSOLICIT, RTR-SOLICIT...
+servers_asked()
+{
+    local words="$*"
+    { grep -Eo "(${words// /|})\(out-[^)]*\)" "$lab_servers_log" 2>/dev/null || true; } | wc -l
+}
+
+# Who has what now, one a line, without until when: MAC ADDRESS NAME CLIENT-ID, and of IPv6
+# IAID ADDRESS NAME DUID.
+servers_leases()
+{
+    { grep -E '^[0-9]+ [^ ]+ [0-9a-f.:]+ ' "$lab_leases" 2>/dev/null || true; } |
+        cut -d ' ' -f 2- | sort
 }
 
 # servers_key INTERFACE KEY: the value in the file of the interface.
@@ -81,11 +94,10 @@ servers_ready()
     servers_count >"$lab_out/first-requests"
 }
 
-# The requests of a client that knows nothing of an earlier lease.
+# The requests of clients that know nothing of an earlier lease.
 servers_count()
 {
-    awk '/DHCPDISCOVER/ { discover++ } /DHCPSOLICIT/ { solicit++ }
-        END { printf "DISCOVER %d SOLICIT %d\n", discover, solicit }' "$lab_servers_log"
+    echo "DISCOVER $(servers_asked DHCPDISCOVER) SOLICIT $(servers_asked DHCPSOLICIT)"
 }
 
 # Nobody asked for a lease anew since the first boot, and nothing was refused or given back.

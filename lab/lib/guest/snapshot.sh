@@ -18,6 +18,18 @@ snapshot()
     snapshot_files "$folder"
 }
 
+# snapshot_network NAME: only what is live in the kernel.
+snapshot_network()
+{
+    local folder="$lab_out/snapshots/$1"
+    wait_until 10 addresses_settled
+    rm -rf "$folder"
+    mkdir -p "$folder"
+    snapshot_links >"$folder/links"
+    snapshot_addresses >"$folder/addresses"
+    snapshot_routes >"$folder/routes"
+}
+
 # An address of IPv6 is tentative until nobody else has claimed it.
 addresses_settled()
 {
@@ -38,9 +50,10 @@ snapshot_links()
 
 snapshot_addresses()
 {
-    # How long addresses of servers and routers are good for changes by itself.
+    # How long addresses of servers and routers are good changes by itself.
     ip -oneline address show |
-        sed -E -e 's/^[0-9]+: //' -e 's/_lft [0-9]+sec/_lft some/g' -e 's/\\//g' -e 's/  +/ /g' | sort
+        sed -E -e 's/^[0-9]+: //' -e 's/\\//g' -e 's/_lft [0-9]+sec/_lft SECONDS/g' -e 's/  +/ /g' |
+        sort
 }
 
 snapshot_routes()
@@ -97,7 +110,9 @@ snapshot_files()
     local file
     mkdir -p "$1/files"
     # A host need not have each of them; one that comes or goes changes the list.
-    { find /etc/sysconfig /usr/vorn/etc /etc/vornovs-host.conf /etc/vorninfo.conf -type f \
+    { find /etc/sysconfig /usr/vorn/etc /etc/vornovs-host.conf /etc/vorninfo.conf \
+        /etc/network /etc/systemd /etc/NetworkManager /etc/netplan /etc/udev /etc/sysctl.d \
+        /etc/modprobe.d /etc/dhcp /etc/resolvconf.conf /etc/resolv.conf -type f \
         2>/dev/null || true; } | sort >"$1/file-list"
     while read -r file; do
         stat -c '%A %U:%G %n' "$file"

@@ -12,7 +12,6 @@
 #                           the other ends of these ports are a bond with these options
 #   outside NAME ADDRESS... the outside's addresses on the segment of a port, a switch or a partner;
 #                           NAME.ID means the VLAN of that id on it
-#   server NAME OPTION...   dnsmasq serves the outside's segment of that name, with these options
 #   far ADDRESS...          addresses of a host behind the gateways
 # Its folder `host` is laid over the appliance's file system.
 
@@ -50,7 +49,8 @@ topology_build()
         esac
     done </lab/topology/topology
 
-    if [ -d /lab/topology/host ]; then
+    # A machine that has a disk got them once, with its manager.
+    if [ -d /lab/topology/host ] && ! machine_has_systemd; then
         cp -a /lab/topology/host/. /
     fi
 }
@@ -145,9 +145,13 @@ in_outside()
 }
 
 # The appliance's addresses as its files and the outside's servers give them, one a line: FAMILY
-# ADDRESS.
+# ADDRESS; on a host with a manager of its own, those that it had at first.
 topology_addresses()
 {
+    if [ -e "$lab_out/host-addresses" ]; then
+        cat "$lab_out/host-addresses"
+        return
+    fi
     servers_gave
     cat /lab/topology/host/etc/sysconfig/network-scripts/ifcfg-* | tr -d '"' |
         awk -F = '

@@ -1,12 +1,40 @@
 # shellcheck shell=bash disable=SC2154,SC2034 # variables that the lab's files share
 # Running cases: each in a guest of its own.
 
-# Long cases, which have a deadline of their own, come first: the short ones fill the gaps.
+# The machine that a case is for: small or systemd.
+lab_case_machine()
+{
+    local file=$lab_source/cases/$1/machine
+    if [[ -f $file ]]; then
+        cat "$file"
+    else
+        echo small
+    fi
+}
+
+# The disk that a case begins with: fresh or ready; empty for a machine without.
+lab_case_disk()
+{
+    if [[ -e $lab_source/cases/$1/fresh ]]; then
+        echo fresh
+    elif [[ $(lab_case_machine "$1") == systemd ]]; then
+        echo ready
+    fi
+}
+
+# lab_case_names MACHINE DAILY: the cases for a machine (empty: all). With DAILY "daily" a case for
+# the machine with systemd must have a file `daily`. Long cases, which have a deadline of their own,
+# come first: the short ones fill the gaps.
 lab_case_names()
 {
-    local folder
+    local machine=$1 daily=$2 folder name its
     for folder in "$lab_source"/cases/*/; do
-        printf '%d %s\n' "$([[ -e $folder/deadline ]] && echo 0 || echo 1)" "$(basename "$folder")"
+        name=$(basename "$folder")
+        its=$(lab_case_machine "$name")
+        if [[ (-z $machine || $its == "$machine") &&
+            (-z $daily || $its != systemd || -e $folder/daily) ]]; then
+            printf '%d %s\n' "$([[ -e $folder/deadline ]] && echo 0 || echo 1)" "$name"
+        fi
     done | sort | cut -d ' ' -f 2
 }
 
@@ -29,27 +57,55 @@ lab_case_deadline()
 # whatever else the case kept.
 lab_run_case()
 {
-    local name=$1 results=$lab_results/$1 topology began status=0 verdict
-    topology=$(<"$lab_source/cases/$name/topology")
+    local name=$1 results=$lab_results/$1 machine began status=0 verdict
+    machine=$(lab_case_machine "$name")
     rm -rf "$results"
     mkdir -p "$results"
-    lab_make_guest_image "$results/guest.cpio" "$topology" "$lab_source/cases/$name"
 
     began=$(date +%s)
-    # The deadline is of this machine's time: it ends a guest whose own clock may stand still.
-    (lab_start_guest "$(lab_case_deadline "$name")" "$topology" "$results/guest.cpio" '' \
-        -serial "file:$results/console" -serial "file:$results/report" \
-        -serial "file:$results/results.tar") </dev/null >"$results/qemu" 2>&1 || status=$?
+    lab_run_guest "$name" "$machine" "$(<"$lab_source/cases/$name/topology")" || status=$?
     echo $(($(date +%s) - began)) >"$results/seconds"
 
     # A guest that hung sends no results; the verdict is read from its report all the same.
     tar -C "$results" -xf "$results/results.tar" 2>/dev/null || true
-    rm -f "$results/results.tar" "$results/guest.cpio"
-    verdict=$(sed -n 's/^lab-verdict: //p' "$results/report" 2>/dev/null | tr -d '\r' | tail -n 1)
+    rm -f "$results"/{results.tar,guest.cpio,disk}
+    verdict=$(lab_report_verdict "$results/report")
     if [[ -z $verdict ]]; then
         verdict="failed: $(lab_why_no_verdict "$status" "$name")"
     fi
     echo "$verdict" >"$results/verdict"
+}
+
+# Runs a case's guest, again after each reboot that the case asked for.
+lab_run_guest()
+{
+    local name=$1 machine=$2 topology=$3 results=$lab_results/$1 lines deadline left boots=0
+    # The deadline is of this machine's time: it ends a guest whose own clock may stand still.
+    deadline=$(($(date +%s) + $(lab_case_deadline "$name")))
+    lab_make_guest_image "$results/guest.cpio" "$machine" "$topology" \
+        "$lab_source/cases/$name" ''
+    if [[ $machine == systemd ]]; then
+        lab_make_guest_disk "$results/disk" "$(lab_case_disk "$name")"
+    fi
+    mapfile -t lines < <(lab_line "$results/console"; lab_line "$results/report";
+        lab_line "$results/results.tar")
+    while [[ $(lab_reboots "$results/report") -eq $boots ]]; do
+        boots=$((boots + 1))
+        left=$((deadline - $(date +%s)))
+        (lab_start_guest "$((left > 0 ? left : 1))" "$machine" "$topology" "$results/guest.cpio" \
+            "$results/disk" '' "${lines[@]}") </dev/null >>"$results/qemu" 2>&1 || return
+    done
+}
+
+# lab_reboots REPORT: how often the case has asked for a reboot.
+lab_reboots()
+{
+    { cat "$1" 2>/dev/null || true; } | grep -c '^lab-reboot' || true
+}
+
+lab_report_verdict()
+{
+    { sed -n 's/^lab-verdict: //p' "$1" 2>/dev/null || true; } | tr -d '\r' | tail -n 1
 }
 
 lab_why_no_verdict()

@@ -6,9 +6,25 @@
 # depend on what else this machine does. The seed makes the guest's random numbers repeat as well.
 lab_qemu_arguments()
 {
-    printf '%s\n' -machine pc,accel=tcg,usb=off -cpu Nehalem,+rdrand -smp 1 -m 768 \
-        -icount shift=0,sleep=off,align=off -rtc base=2026-01-01,clock=vm -seed 1 \
+    printf '%s\n' -machine pc,accel=tcg,usb=off -cpu Nehalem,+rdrand -smp 1 \
+        -icount shift=0,sleep=off,align=off -rtc base=2030-01-01,clock=vm -seed 1 \
         -nodefaults -display none -no-reboot -no-user-config -monitor none
+    if [[ $1 == systemd ]]; then
+        printf '%s\n' -m 1024,slots=1,maxmem=4G -machine nvdimm=on \
+            -object "memory-backend-file,id=disk,mem-path=$2,size=$(stat -c %s "$2"),share=on" \
+            -device nvdimm,memdev=disk
+    else
+        printf '%s\n' -m 768
+    fi
+}
+
+# lab_make_guest_disk FILE KIND: a disk of the guest's own, like the one that it begins with, fresh
+# or ready. To the guest it is memory: for an answer of a real disk's it would have to wait while its
+# clock jumps ahead, by minutes when this machine is busy.
+lab_make_guest_disk()
+{
+    local base=lab_disk_$2
+    cp --sparse=always "${!base}" "$1"
 }
 
 # Cards for the topology's virtio ports: each is connected to one of the outside's through a hub.
@@ -24,7 +40,7 @@ lab_qemu_cards()
                 -device "virtio-net-pci,netdev=out-$name,mac=06${mac#??},romfile="
             hub=$((hub + 1))
         fi
-    done <"$lab_source/topologies/$1/topology"
+    done <"$(lab_topology_folder "$1")/topology"
 }
 
 lab_kernel_line()
@@ -33,27 +49,43 @@ lab_kernel_line()
         "tsc=reliable nolapic_timer no_timer_check net.ifnames=0 audit=0 $*"
 }
 
-# lab_start_guest SECONDS TOPOLOGY IMAGE WORDS QEMU-ARGUMENT...: replaces the calling process by the
-# guest, which is ended after that many seconds (0: never). The serial lines are, in this order:
-# console, report, results.
+# lab_start_guest SECONDS MACHINE TOPOLOGY IMAGE DISK WORDS QEMU-ARGUMENT...: replaces the calling
+# process by the guest, which is ended after that many seconds (0: never). The serial lines are, in
+# this order: console, report, results.
 lab_start_guest()
 {
-    local seconds=$1 topology=$2 image=$3 words=$4 arguments
-    shift 4
-    mapfile -t arguments < <(lab_qemu_arguments; lab_qemu_cards "$topology")
+    local seconds=$1 machine=$2 topology=$3 image=$4 disk=$5 words=$6 arguments
+    shift 6
+    mapfile -t arguments < <(lab_qemu_arguments "$machine" "$disk"; lab_qemu_cards "$topology")
     exec timeout --foreground -k 5 "$seconds" qemu-system-x86_64 "${arguments[@]}" \
         -kernel "$lab_kernel" -initrd "$image" -append "$(lab_kernel_line "$words")" "$@"
 }
 
-# Replaces the calling process by a guest on this terminal: $1 topology, $2 case folder or empty.
+# lab_line FILE: a serial line that goes on where an earlier boot ended.
+lab_line()
+{
+    local id=${1##*/}
+    printf '%s\n' -chardev "file,id=line-$id,path=$1,append=on" -serial "chardev:line-$id"
+}
+
+# A guest on this terminal: $1 machine, $2 topology, $3 case folder or empty, $4 network manager or
+# empty, $5 its disk, fresh or ready. A guest with a disk is started again when it restarts.
 lab_stay()
 {
-    local image
-    image=$(mktemp "$lab_build/shell.XXXXXX")
-    lab_make_guest_image "$image" "$1" "$2"
-    # The file goes as soon as the guest has read it: the descriptor keeps it.
-    exec {lab_image_handle}<"$image"
-    rm -f "$image"
-    lab_start_guest 0 "$1" "/dev/fd/$lab_image_handle" lab.here -serial mon:stdio \
-        -serial null -serial null
+    local folder lines
+    folder=$(mktemp -d "$lab_build/shell.XXXXXX")
+    # shellcheck disable=SC2064 # the folder's name as it is now
+    trap "rm -rf '$folder'" EXIT
+    lab_make_guest_image "$folder/image" "$1" "$2" "$3" "$4"
+    if [[ $1 == systemd ]]; then
+        lab_make_guest_disk "$folder/disk" "$5"
+    fi
+    mapfile -t lines < <(lab_line "$folder/report")
+    while true; do
+        (lab_start_guest 0 "$1" "$2" "$folder/image" "$folder/disk" lab.here -serial mon:stdio \
+            "${lines[@]}" -serial null) || true
+        if [[ $1 != systemd ]] || grep -q '^lab-left' "$folder/report"; then
+            return
+        fi
+    done
 }

@@ -3,6 +3,8 @@
 #   system   Debian's programs, their libraries, the kernel's modules
 #   product  what this repository installs
 #   guest    the guest's scripts, a topology and a case; made anew for each guest
+# The machine with systemd has a disk, and only what finds it in memory:
+#   loader   busybox and the modules that the disk needs
 # A layer is kept as long as nothing it is made of changes.
 
 # What the guest runs of Debian's, besides busybox.
@@ -16,6 +18,7 @@ lab_programs=(
 
 # What the kernel needs for the lab, in any order: what they need in turn is found below.
 lab_modules=(openvswitch bonding 8021q bridge dummy veth virtio_net virtio_pci)
+lab_loader_modules=(nfit nd_pmem ext4)
 
 lab_busybox()
 {
@@ -74,17 +77,27 @@ lab_module_order()
     printf '%s\n' "$file"
 }
 
+# lab_install_modules FOLDER MODULE...
 lab_install_modules()
 {
-    local root=$1 modules name file
+    local folder=$1 modules name file
+    shift
     modules=$(echo "$lab_debian"/lib/modules/*)
-    mkdir -p "$root/lab/modules"
-    for name in "${lab_modules[@]}"; do
+    mkdir -p "$folder"
+    for name in "$@"; do
         lab_module_order "$modules" "$name"
     done | awk '!seen[$0]++' | while read -r file; do
-        cp "$file" "$root/lab/modules/"
-        printf '%s\n' "${file##*/}" >>"$root/lab/modules/order"
+        cp "$file" "$folder/"
+        printf '%s\n' "${file##*/}" >>"$folder/order"
     done
+}
+
+lab_make_loader()
+{
+    local root=$1
+    mkdir -p "$root"/{bin,dev,proc,sys,root}
+    cp "$lab_debian/bin/busybox" "$root/bin/"
+    lab_install_modules "$root/modules" "${lab_loader_modules[@]}"
 }
 
 lab_make_system()
@@ -134,7 +147,7 @@ lab_make_system()
     printf '12\n' >"$root/etc/debian_version"
     : >"$root/etc/resolv.conf"
     printf 'appliance\n' >"$root/etc/hostname"
-    lab_install_modules "$root"
+    lab_install_modules "$root/lab/modules" "${lab_modules[@]}"
 }
 
 # What the repository installs, and the libraries of Debian's that it needs.
@@ -142,13 +155,31 @@ lab_make_product()
 {
     local root=$1 file
     mkdir -p "$root/usr/lib/x86_64-linux-gnu"
-    DESTDIR=$root cmake --install "$lab_release" --prefix /usr >"$lab_build/install.log" ||
-        die "cmake --install failed: see $lab_build/install.log"
-    rm -rf "$root/usr/include" "$root/usr/share/man"
-    lab_build_clients "$root"
+    if lab_is_installed; then
+        lab_copy_installed "$root"
+    else
+        DESTDIR=$root cmake --install "$lab_release" --strip --prefix /usr >"$lab_build/install.log" ||
+            die "cmake --install failed: see $lab_build/install.log"
+        lab_build_clients "$root"
+    fi
+    rm -rf "$root/usr/include" "$root"/usr/share/{man,vornovs-lab,zsh,bash-completion}
     while read -r file; do
         lab_copy_libraries "$root" "$file"
     done < <(find "$root" -type f \( -perm -u+x -o -name '*.so*' \))
+}
+
+# What this machine has of the repository's packages, without settings and state.
+lab_copy_installed()
+{
+    local root=$1 path
+    while read -r path; do
+        if [[ -d $path && ! -L $path ]]; then
+            mkdir -p "$root$path"
+        else
+            cp -P "$path" "$root$path"
+        fi
+    done < <(dpkg-query -L "${lab_product_packages[@]}" | sed -e '/^$/d' -e '/^\/\.$/d' \
+        -e '/^\/usr\/share\/doc/d' | LC_ALL=C sort -u)
 }
 
 # The lab's own clients, one source file each: lib*.cpp are loaded into other programs, the others
@@ -198,7 +229,7 @@ lab_layer()
     lab_archive "$root" "$lab_layer"
 }
 
-# Makes the system and product layers; sets $lab_kernel and $lab_image.
+# Makes the layers; sets $lab_kernel, $lab_image and $lab_loader.
 lab_make_image()
 {
     local here=${BASH_SOURCE[0]} system product turn
@@ -212,6 +243,8 @@ lab_make_image()
     lab_layer system lab_make_system \
         "$(printf '%s\n' "$here" "$lab_debian/.packages" | fingerprint)"
     system=$lab_layer
+    lab_layer loader lab_make_loader "$(printf '%s\n' "$here" "$lab_debian/.packages" | fingerprint)"
+    lab_loader=$lab_layer
     lab_layer product lab_make_product "$(lab_product_files | fingerprint)"
     product=$lab_layer
 
@@ -227,29 +260,56 @@ lab_make_image()
 lab_product_files()
 {
     printf '%s\n' "${BASH_SOURCE[0]}" "$lab_debian/.packages"
+    if lab_is_installed; then
+        dpkg-query -L "${lab_product_packages[@]}" | while read -r path; do
+            [[ ! -f $path ]] || printf '%s\n' "$path"
+        done
+        return
+    fi
     find "$lab_root/lab/clients" -name '*.cpp'
     find "$lab_release/bin" "$lab_release/lib" -type f
     find "$lab_root/host" "$lab_root/tools" -type f ! -name '*.cpp' ! -name '*.h'
     find "$lab_release" -name cmake_install.cmake
 }
 
-# Adds the guest's scripts, a topology and a case to the image: $1 archive to write, $2 topology,
-# $3 case folder or empty.
+# Writes the archive that a guest starts from: $1 archive, $2 machine, $3 topology, $4 case folder
+# or empty, $5 network manager, empty for the case's.
 lab_make_guest_image()
 {
-    local archive=$1 topology=$2 case_folder=$3 root
+    local archive=$1 machine=$2 topology=$3 case_folder=$4 manager=$5 root base=$lab_image
     root=$(mktemp -d "$lab_build/guest.XXXXXX")
     mkdir -p "$root/lab/topology" "$root/lab/case"
     cp "$lab_source"/lib/guest/* "$root/lab/"
-    cp -r "$lab_source/topologies/$topology/." "$root/lab/topology/"
+    cp -r "$(lab_topology_folder "$topology")/." "$root/lab/topology/"
     if [[ -n $case_folder ]]; then
         cp -r "$case_folder/." "$root/lab/case/"
     fi
-    chmod 755 "$root/lab/init"
-    ln -s lab/init "$root/init"
+    if [[ -n $manager ]]; then
+        echo "$manager" >"$root/lab/case/manager"
+    fi
+    if [[ $machine == systemd ]]; then
+        base=$lab_loader
+        cp -r "$lab_source/lib/machine" "$root/lab/"
+        cp -r "$lab_layers/product/lab/clients" "$root/lab/"
+        mkdir -p "$root/lab/packages/vornovs"
+        cp "$lab_packages_folder"/{*.deb,Packages} "$root/lab/packages/vornovs/"
+        ln -s lab/machine/init "$root/init"
+    else
+        ln -s lab/init "$root/init"
+    fi
+    chmod 755 "$root/init"
     lab_archive "$root" "$root.cpio"
-    cat "$lab_image" "$root.cpio" >"$archive"
+    cat "$base" "$root.cpio" >"$archive"
     rm -rf "$root" "$root.cpio"
+}
+
+# Builds the packages that the host with systemd installs.
+lab_build_packages()
+{
+    "$lab_root/scripts/package" >"$lab_build/packages.log" 2>&1 || {
+        tail -n 30 "$lab_build/packages.log" >&2
+        die "the packages do not build: see $lab_build/packages.log"
+    }
 }
 
 # Builds what the appliance runs; the tests are not part of it.
@@ -259,7 +319,7 @@ lab_build_release()
     ensure_host_packages "${build_packages[@]}"
     mkdir -p "$lab_build"
     (cd "$lab_root" && cmake --preset release &&
-        cmake --build --preset release --target src/all host/all tools/all) \
+        cmake --build --preset release --target src/all host/all tools/all man/all) \
         >"$lab_build/release.log" 2>&1 || {
         tail -n 30 "$lab_build/release.log" >&2
         die "the release does not build: see $lab_build/release.log"

@@ -8,6 +8,8 @@ lab_library=$(dirname "${BASH_SOURCE[0]}")
 . "$lab_library/packages.sh"
 # shellcheck source=lab/lib/host/image.sh
 . "$lab_library/image.sh"
+# shellcheck source=lab/lib/host/disk.sh
+. "$lab_library/disk.sh"
 # shellcheck source=lab/lib/host/guest.sh
 . "$lab_library/guest.sh"
 # shellcheck source=lab/lib/host/cases.sh

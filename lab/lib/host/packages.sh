@@ -10,6 +10,9 @@ lab_packages=(
     openvswitch-common openvswitch-switch
 )
 
+# The repository's own that an installed lab takes from this machine.
+lab_product_packages=(vornovs-host libvornovs1 vornovs-tools)
+
 # Libraries that those and the repository's own programs need. One that is missing here is named
 # when the image is made.
 lab_packages+=(

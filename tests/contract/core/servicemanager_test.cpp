@@ -60,6 +60,13 @@ TEST(ServiceManager, TellsHowAJobEnded)
     }
 }
 
+TEST(ServiceManager, StartsAUnitAnewThatHasFailedTooOften)
+{
+    FakeSystemd systemd;
+    systemd.AddUnit(kUnit, "failed");
+    EXPECT_TRUE(StartUnit(kUnit, kEnough));
+}
+
 TEST(ServiceManager, TellsWhatSystemdAnswersWhenItRefuses)
 {
     FakeSystemd systemd;

@@ -52,7 +52,7 @@ TEST_F(ServiceUnit, IsStoppedTogetherWithADaemonThatIsNotItsOwn)
     systemd.AddUnit(kUnit);
     EXPECT_EQ(VLIBServiceStop(kService, 0), 0);
     EXPECT_THAT(systemd.Jobs(), ElementsAre("StopUnit vornovs-db.service"));
-    EXPECT_EQ(ReadFile(kVerbs), "stop 1\n");
+    EXPECT_EQ(ReadFile(kVerbs), "stop alone\n");
 }
 
 TEST_F(ServiceUnit, IsStoppedWithoutAScript)
@@ -79,7 +79,7 @@ TEST_F(ServiceUnit, IsRestartedByStoppingADaemonThatIsNotItsOwn)
     EXPECT_EQ(VLIBServiceRestart(kService), 0);
     EXPECT_THAT(systemd.Jobs(),
                 ElementsAre("StopUnit vornovs-db.service", "StartUnit vornovs-db.service"));
-    EXPECT_EQ(ReadFile(kVerbs), "stop 1\n");
+    EXPECT_EQ(ReadFile(kVerbs), "stop alone\n");
 }
 
 TEST_F(ServiceUnit, ThatFailsIsReported)
@@ -100,7 +100,7 @@ TEST_F(ServiceUnit, ThatIsNotThereLeavesTheWorkToTheScript)
     EXPECT_EQ(VLIBServiceRestart(kService), 0);
     EXPECT_LT(VLIBServiceStart("vornwifid", 0), 0);
     EXPECT_THAT(systemd.Jobs(), IsEmpty());
-    EXPECT_EQ(ReadFile(kVerbs), "start 1\nstop 1\nrestart 1\n");
+    EXPECT_EQ(ReadFile(kVerbs), "start alone\nstop alone\nrestart alone\n");
 }
 
 TEST_F(ServiceUnit, KeepsTheLockUntilItIsStartedWhenTheClientIsKilled)

@@ -1,4 +1,5 @@
 #include "host.h"
+#include "systemd/fakesystemd.h"
 
 #include <gmock/gmock.h>
 
@@ -16,6 +17,15 @@ constexpr char kBeforeNetwork[] =
 constexpr char kAfter[] = "IPADDR=192.0.2.6\nPREFIX=24\nGATEWAY=192.0.2.1\n";
 constexpr char kAfterNetwork[] = "eth0 192.0.2.6/24\ndefault via 192.0.2.1 dev eth0 proto static\n";
 constexpr char kHoldPath[] = "/run/vornovs/network.hold";
+
+/** Of the hold that is there. */
+std::string Token()
+{
+    const std::string text = ReadFile(kHoldPath);
+    const std::string beginning = "\"token\":\"";
+    const auto begin = text.find(beginning) + beginning.size();
+    return text.substr(begin, text.find('"', begin) - begin);
+}
 
 class Hold : public Host {
 protected:
@@ -137,6 +147,56 @@ TEST_F(Hold, TheHolderKeepsNothingOfItsCallersOpen)
     // A start that comes before the hold's end lets the holder end, too.
     EXPECT_EQ(RcNetworkOfLibrary({"start"}), (Outcome{0, "", ""}));
     ASSERT_EQ(kill(std::stoi(holder.filename()), SIGKILL), 0);
+}
+
+TEST_F(Hold, TheHolderRunsInAUnitOfItsOwnWhereSystemdRuns)
+{
+    harness::FakeSystemd systemd;
+    systemd.AddUnit("vornovs-hold@.service");
+
+    EXPECT_EQ(RcNetworkOfLibrary({"stop"}), (Outcome{0, "", ""}));
+
+    EXPECT_THAT(systemd.Jobs(),
+                testing::ElementsAre("StartUnit vornovs-hold@" + Token() + ".service"));
+    EXPECT_TRUE(Holders().empty());
+    EXPECT_EQ(RcNetworkOfLibrary({"start"}), (Outcome{0, "", ""}));
+}
+
+TEST_F(Hold, TheHolderIsNobodysChildWhereSystemdDoesNotStartIt)
+{
+    harness::FakeSystemd systemd;
+
+    EXPECT_EQ(RcNetworkOfLibrary({"stop"}), (Outcome{0, "", ""}));
+
+    EXPECT_THAT(systemd.Jobs(), testing::SizeIs(1));
+    EXPECT_TRUE(WaitUntil([] { return Holders().size() == 1; }));
+    EXPECT_EQ(RcNetworkOfLibrary({"start"}), (Outcome{0, "", ""}));
+}
+
+TEST_F(Hold, AStartOfTheLibraryIsOneItselfWhereItsWholeServiceCanBeEnded)
+{
+    harness::FakeSystemd systemd;
+    systemd.AddUnit("vornovs-hold@.service");
+    File("eth0", kAfter);
+
+    EXPECT_EQ(RcNetworkOfLibrary({"start", "eth0"}), (Outcome{0, "", ""}));
+    EXPECT_EQ(RcNetwork({"start"}), (Outcome{0, "", ""})) << "an administrator's is none";
+
+    EXPECT_THAT(systemd.Jobs(),
+                testing::ElementsAre(testing::StartsWith("StartUnit vornovs-hold@")));
+    EXPECT_EQ(Network(), kAfterNetwork);
+    EXPECT_EQ(ReadFile(kHoldPath), "(none)");
+}
+
+TEST_F(Hold, AStartOfTheLibraryThatFailsLeavesNoneOfItsOwn)
+{
+    harness::FakeSystemd systemd;
+    systemd.AddUnit("vornovs-hold@.service");
+
+    EXPECT_EQ(RcNetworkOfLibrary({"start", "eth7"}).exitCode, 1);
+
+    EXPECT_THAT(systemd.Jobs(), testing::SizeIs(1));
+    EXPECT_EQ(ReadFile(kHoldPath), "(none)");
 }
 
 TEST_F(Hold, ATokenLeftByAnEarlierBootIsHarmless)

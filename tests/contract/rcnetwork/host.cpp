@@ -102,6 +102,8 @@ void Host::SetUp()
 
 void Host::TearDown()
 {
+    // Whoever would go on in the background finds nothing to do any more.
+    Delete(kState);
     Ip("link del dev eth0");
     Ip("link del dev eth1");
 }

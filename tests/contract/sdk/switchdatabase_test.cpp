@@ -20,16 +20,18 @@ constexpr char kReply[] = R"({"id":0,"error":null,"result":[
              {"name":"empty","ports":["set",[]],"datapath_type":"",
               "external_ids":["map",[]],"other_config":["map",[]]}]},
     {"rows":[{"_uuid":["uuid","p1"],"name":"eth0","interfaces":["uuid","i1"],
-              "bond_mode":["set",[]],"tag":["set",[]],"other_config":["map",[]],
+              "bond_mode":["set",[]],"tag":["set",[]],"other_config":["map",[]],"trunks":7,
               "external_ids":["map",[["a","b"],["vornovs-network","rc.network"]]]},
              {"_uuid":["uuid","p2"],"name":"ovs_eth0","interfaces":["uuid","i2"],"tag":10,
-              "bond_mode":["set",[]],"external_ids":["map",[]],"other_config":["map",[]]},
+              "bond_mode":["set",[]],"external_ids":["map",[]],"other_config":["map",[]],
+              "trunks":["set",[]]},
              {"_uuid":["uuid","p3"],"name":"bond0","interfaces":["set",[["uuid","i4"],["uuid","i3"]]],
-              "bond_mode":"balance-tcp","lacp":"active","bond_updelay":100,"tag":["set",[]],
+              "bond_mode":"balance-tcp","lacp":"active","bond_updelay":100,"trunks":["set",[8,9]],"tag":["set",[]],
               "other_config":["map",[["lacp-time","fast"]]],
               "external_ids":["map",[["vornovs-network","other"]]]}]},
     {"rows":[{"_uuid":["uuid","i1"],"name":"eth0","ofport":1,"error":["set",[]],
-              "mtu_request":["set",[]],"lacp_current":["set",[]]},
+              "mtu_request":["set",[]],"lacp_current":["set",[]],
+              "mac_in_use":"02:00:00:00:00:01","link_state":"up"},
              {"_uuid":["uuid","i2"],"name":"ovs_eth0","ofport":65534,"error":["set",[]],
               "mtu_request":9000,"lacp_current":["set",[]]},
              {"_uuid":["uuid","i3"],"name":"eth1","ofport":2,"error":["set",[]],
@@ -46,10 +48,21 @@ const SwitchPort kPrimary{"eth0", {"eth0"}, false, false};
 
 TEST(ParseSwitchReply, GivesBridgesWithTheirPortsSorted)
 {
-    const SwitchPort single{"eth0",       {"eth0"}, false, true, std::nullopt,       {"eth0"},
-                            std::nullopt, false,    {},    {},   {{"a", "b"}, kMark}};
-    const SwitchPort own{"ovs_eth0", {"ovs_eth0"}, false,           false, 10U, {"ovs_eth0"},
-                         9000U,      false,        {{"tag", "10"}}, {},    {}};
+    const SwitchPort single{"eth0",
+                            {"eth0"},
+                            false,
+                            true,
+                            std::nullopt,
+                            {"eth0"},
+                            std::nullopt,
+                            false,
+                            {{"trunks", "7"}},
+                            {},
+                            {{"a", "b"}, kMark},
+                            {7},
+                            {{"eth0", "02:00:00:00:00:01", true}}};
+    const SwitchPort own{"ovs_eth0", {"ovs_eth0"},    false, false, 10U, {"ovs_eth0"},  9000U,
+                         false,      {{"tag", "10"}}, {},    {},    {},  {{"ovs_eth0"}}};
     const SwitchPort bond{
         "bond0",
         {"eth1", "eth2"},
@@ -61,7 +74,9 @@ TEST(ParseSwitchReply, GivesBridgesWithTheirPortsSorted)
         true,
         {{"bond_mode", "balance-tcp"}, {"bond_updelay", "100"}, {"lacp", "active"}},
         {{"lacp-time", "fast"}},
-        {{"vornovs-network", "other"}}};
+        {{"vornovs-network", "other"}},
+        {8, 9},
+        {{"eth1", "", std::nullopt, true}, {"eth2", "", std::nullopt, false, "no such device"}}};
 
     const auto bridges = ParseSwitchReply(kReply);
 

@@ -58,6 +58,7 @@ private:
     void Accept();
     int Answer(sd_bus_message* message);
     int AnswerJob(sd_bus_message* message, const std::string& method);
+    int AnswerReset(sd_bus_message* message);
     int AnswerLoad(sd_bus_message* message) const;
     int AnswerProperty(sd_bus_message* message) const;
     std::string StateOf(const std::string& unit) const;
@@ -105,7 +106,11 @@ void FakeSystemd::Server::Accept()
 std::string FakeSystemd::Server::StateOf(const std::string& unit) const
 {
     const std::lock_guard<std::mutex> guard(m_owner.m_mutex);
-    const auto found = m_owner.m_units.find(unit);
+    auto found = m_owner.m_units.find(unit);
+    const auto at = unit.find('@');
+    if (found == m_owner.m_units.end() && at != std::string::npos) {
+        found = m_owner.m_units.find(unit.substr(0, at + 1) + unit.substr(unit.rfind('.')));
+    }
     return found == m_owner.m_units.end() ? "" : found->second;
 }
 
@@ -131,11 +136,32 @@ int FakeSystemd::Server::AnswerJob(sd_bus_message* message, const std::string& m
     }
     const std::uint32_t number = ++m_lastJob;
     const std::string path = std::string(kManagerPath) + "/job/" + std::to_string(number);
-    const std::string result = m_owner.m_worker ? m_owner.m_worker(method, unit) : "done";
+    // A unit that has failed too often is not started any more.
+    const std::string result = StateOf(unit) == "failed" ? "failed"
+                               : m_owner.m_worker        ? m_owner.m_worker(method, unit)
+                                                         : "done";
     if (!result.empty()) {
         m_endings.push_back({sd_bus_message_get_bus(message), number, unit, result});
     }
     return sd_bus_reply_method_return(message, "o", path.c_str());
+}
+
+int FakeSystemd::Server::AnswerReset(sd_bus_message* message)
+{
+    const char* unit = nullptr;
+    if (sd_bus_message_read(message, "s", &unit) < 0) {
+        return -EINVAL;
+    }
+    const std::lock_guard<std::mutex> guard(m_owner.m_mutex);
+    const auto found = m_owner.m_units.find(unit);
+    if (found == m_owner.m_units.end()) {
+        return sd_bus_reply_method_errorf(message, "org.freedesktop.systemd1.NoSuchUnit",
+                                          "Unit %s not loaded.", unit);
+    }
+    if (found->second == "failed") {
+        found->second = "inactive";
+    }
+    return sd_bus_reply_method_return(message, nullptr);
 }
 
 int FakeSystemd::Server::AnswerLoad(sd_bus_message* message) const
@@ -173,6 +199,9 @@ int FakeSystemd::Server::Answer(sd_bus_message* message)
     const char* const member = sd_bus_message_get_member(message);
     const std::string method = member == nullptr ? "" : member;
     if (sd_bus_message_is_method_call(message, kManager, nullptr) > 0) {
+        if (method == "ResetFailedUnit") {
+            return AnswerReset(message);
+        }
         return method == "LoadUnit" ? AnswerLoad(message) : AnswerJob(message, method);
     }
     const char* const path = sd_bus_message_get_path(message);

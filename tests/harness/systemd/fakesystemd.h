@@ -25,7 +25,10 @@ public:
     FakeSystemd& operator=(const FakeSystemd&) = delete;
     ~FakeSystemd();
 
-    /** Gives it a unit in that state, such as "active" or "inactive". It has no others. */
+    /**
+     * Gives it a unit in that state, such as "active", "inactive" or "failed"; "x@.service" stands
+     * for all of its instances. It has no others.
+     */
     void AddUnit(const std::string& unit, const std::string& state = "inactive");
     /** Breaks the next connections so many times, after the request and before the answer. */
     void BreakConnections(int times);

@@ -6,9 +6,10 @@
 
 #include "hostmodel.h"
 
+#include <support/switchdatabase.h>
+
 #include <optional>
 #include <string>
-#include <string_view>
 #include <vector>
 
 namespace vornovsctl {
@@ -19,8 +20,8 @@ struct SwitchAnswer {
     std::string fault; /**< why there are none, in words */
 };
 
-/** Takes the bridges from the reply of the switch's database. @return nothing: it is no such. */
-std::optional<std::vector<Bridge>> ParseSwitch(std::string_view reply);
+/** Turns what the database says into what is drawn, in the order in which it is drawn. */
+std::vector<Bridge> DrawnBridges(const std::vector<vornhost::SwitchBridge>& bridges);
 
 /** Asks the switch's database; starts nothing, and does not wait long. */
 SwitchAnswer AskSwitch();

@@ -1,0 +1,201 @@
+# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
+
+lab_product=(libvornovs1 libvornovs-dev vornovs-host vornovs-tools)
+lab_unit_link=/etc/systemd/system/multi-user.target.wants/vornovs-network.service
+
+# Everything on the disk, with mode, owner and size; without what logs, caches and clocks change.
+host_files()
+{
+    find / -xdev \( -path /lab -o -path /var/log -o -path /var/cache -o -path /var/lib/dpkg \
+        -o -path /var/lib/apt -o -path /var/lib/systemd -o -path /var/backups -o -path /root \
+        -o -path /tmp \) -prune -o -printf '%M %u:%g %y %p %l\n' |
+        grep -v -e ' /etc/ld.so.cache' -e ' /etc/apt/sources.list.d/vornovs.list' \
+            -e ' /etc/openvswitch' -e ' /var/lib/openvswitch' -e ' /etc/\.resolv' | sort
+}
+
+# Units that run or start with the machine, of whatever package.
+host_units()
+{
+    {
+        systemctl list-units --no-legend --no-pager --plain --state=active --type=service |
+            awk '{ print "active", $1 }'
+        systemctl list-unit-files --no-legend --no-pager | awk '{ print "file", $1, $2 }'
+    } | grep -v -e ' lab-' -e ' systemd-.*\.service$' -e ' ovs' -e ' openvswitch' | sort
+}
+
+# expect_same_units WHEN: none but ours have come, and none have gone.
+expect_same_units()
+{
+    host_units | grep -v ' vornovs' >"$lab_out/got-units"
+    expect_same_text "$1: the units" "$lab_out/units-before" "$lab_out/got-units"
+}
+
+expect_no_unit_of_ours()
+{
+    local units
+    units="$(systemctl list-units --all --no-legend --no-pager --plain 'vornovs*')"
+    expect_equal "units of ours that are loaded" "" "$units"
+    units="$(find /etc/systemd /etc/rc?.d -name '*vornovs*' ! -name 'K*')"
+    expect_equal "links that start something of ours" "" "$units"
+}
+
+# The same packages as a later version.
+make_later_version()
+{
+    local package folder
+    rm -rf /lab/packages/later
+    mkdir -p /lab/packages/later
+    for package in "$lab_packages"/*.deb; do
+        folder=/lab/packages/later/unpacked
+        dpkg-deb -R "$package" "$folder"
+        sed -i -E -e 's/^Version: (.*)/Version: \1+later1/' \
+            -e 's/(vornovs[a-z0-9-]*) \(= ([^)]*)\)/\1 (= \2+later1)/g' "$folder/DEBIAN/control"
+        echo "# of the later version" >>"$folder/usr/share/doc/$(dpkg-deb -f "$package" Package)/copyright"
+        dpkg-deb -Znone -b "$folder" "/lab/packages/later/$(basename "$package")" >/dev/null
+        rm -r "$folder"
+    done
+}
+
+# What must not end with an upgrade.
+daemons()
+{
+    for name in ovsdb-server ovs-vswitchd; do
+        echo "$name $(pidof "$name")"
+    done
+}
+
+phase_start()
+{
+    wait_until 90 host_answers
+    step "What the packages need of Debian's"
+    expect_success packages_apt update
+    expect_success packages_apt install openvswitch-switch dhcpcd-base openresolv uuid-runtime ethtool \
+        libnl-3-200 libnl-route-3-200 libsystemd0 kmod
+    host_files >"$lab_out/files-before"
+    host_units >"$lab_out/units-before"
+
+    step "Install"
+    snapshot_network before
+    packages_install "${lab_product[@]}"
+    snapshot_network installed
+    expect_unchanged before installed
+    expect_no_unit_of_ours
+    expect_same_units "after installing"
+    expect_equal "interfaces' files" "" "$(ls -A /etc/sysconfig/network-scripts)"
+    remember_managed
+
+    step "Adopt and register"
+    expect_success vornovsctl adopt
+    expect_success vornovsctl register alpha
+    expect_ports_on_switch
+    expect_same_host "on the switch"
+
+    upgrade_on_the_switch
+    remove_is_refused
+    remove_and_purge
+    install_by_hand
+    reboot_machine home
+}
+
+upgrade_on_the_switch()
+{
+    step "Upgrade on the switch"
+    make_later_version
+    snapshot switched
+    daemons >"$lab_out/daemons"
+    probes_start
+    expect_success packages_apt install /lab/packages/later/{libvornovs,vornovs-host,vornovs-tools}*.deb
+    lab_probe_after=3 probes_finish upgrade 100
+    expect_equal "the version" 1.0.0+later1 "$(dpkg-query -W -f '${Version}' vornovs-host)"
+    snapshot upgraded
+    expect_unchanged switched upgraded
+    daemons >"$lab_out/got-daemons"
+    expect_same_text "the daemons" "$lab_out/daemons" "$lab_out/got-daemons"
+    expect_registered alpha
+    expect_same_host "after the upgrade"
+    [ -L "$lab_unit_link" ] || fail "the network is not started with the machine any more"
+}
+
+# Nobody can leave the switch while the lock is held.
+remove_is_refused()
+{
+    local file holders=()
+    step "Remove, refused"
+    for file in $lab_lock_files; do
+        if [ -e "$file" ]; then
+            flock "$file" sleep 600 &
+            holders+=("$!")
+        fi
+    done
+    expect_failure packages_apt remove vornovs-host
+    kill "${holders[@]}"
+    wait "${holders[@]}" || true
+    wait_until 10 lock_is_free
+    grep -q "vornovs: not removed: the client 'alpha' could not be withdrawn" "$lab_out/apt.log" ||
+        fail "the reason is not told"
+    expect_equal "the library's package" "install ok installed" \
+        "$(dpkg-query -W -f '${Status}' libvornovs1)"
+    expect_equal "the host's package" "install ok installed" \
+        "$(dpkg-query -W -f '${Status}' vornovs-host)"
+    expect_registered alpha
+    expect_ports_on_switch
+    expect_same_host "after the refusal"
+}
+
+remove_and_purge()
+{
+    step "Remove on the switch"
+    probes_start
+    expect_success packages_apt remove vornovs-host
+    lab_probe_after=3 probes_finish remove 500
+    expect_no_switch_devices
+    expect_same_host "after the removal"
+    packages_units >"$lab_out/got-units"
+    expect_same_text "what starts with the machine" "$lab_out/managed-units" "$lab_out/got-units"
+
+    step "Purge"
+    snapshot_network removed
+    expect_success packages_apt purge libvornovs1 libvornovs-dev vornovs-host vornovs-tools
+    snapshot_network purged
+    expect_unchanged removed purged
+    expect_same_host "after the purge"
+    expect_equal "packages of ours" "" "$(packages_present)"
+    host_files >"$lab_out/files-purged"
+    expect_same_text "the host's files" "$lab_out/files-before" "$lab_out/files-purged"
+    expect_same_units "after the purge"
+    [ ! -e /run/vornovs ] || fail "/run/vornovs is left"
+}
+
+# A host whose network comes from files that somebody wrote here.
+install_by_hand()
+{
+    step "Install again, and write a file by hand"
+    snapshot_network again
+    packages_install vornovs-host vornovs-tools
+    snapshot_network reinstalled
+    expect_unchanged again reinstalled
+    expect_no_unit_of_ours
+    printf 'DEVICE=eth0\nIPADDR=10.10.0.2\nPREFIX=24\nGATEWAY=10.10.0.1\n' >"${lab_ifcfg}eth0"
+    expect_success systemctl -q enable vornovs-network.service
+
+    step "Remove, refused"
+    expect_failure packages_apt remove vornovs-host
+    grep -q "vornovs: not removed: this host has its network from the files" "$lab_out/apt.log" ||
+        fail "the reason is not told"
+    expect_same_host "after the second refusal"
+
+    step "Remove once somebody else rules"
+    expect_success systemctl -q disable vornovs-network.service vornovs-network-wait-online.service
+    expect_success packages_apt purge libvornovs1 vornovs-host vornovs-tools
+    expect_same_host "after the second purge"
+    host_files >"$lab_out/files-purged"
+    expect_same_text "the host's files" "$lab_out/files-before" "$lab_out/files-purged"
+}
+
+phase_home()
+{
+    expect_same_host "at home"
+    expect_no_switch_devices
+    host_files >"$lab_out/files-home"
+    expect_same_text "the host's files" "$lab_out/files-before" "$lab_out/files-home"
+}

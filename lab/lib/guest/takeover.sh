@@ -1,0 +1,250 @@
+# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
+# A host that its manager has brought up is taken over, goes on to the switch, reboots there, and is
+# given back; what must be the same all the while.
+
+# The interfaces whose addresses the case is about and how many addresses each has, one a line, as
+# the topology's file `expected` says.
+takeover_expected()
+{
+    grep -v '^#' /lab/topology/expected
+}
+
+takeover_interfaces()
+{
+    takeover_expected | cut -d ' ' -f 1
+}
+
+# bearer INTERFACE: the device that bears its addresses now.
+bearer()
+{
+    local port="${1%%.*}"
+    if [ -e "/sys/class/net/ovs_$port" ]; then
+        echo "ovs_$port"
+    else
+        echo "$1"
+    fi
+}
+
+# Addresses without what changes by itself, the time that they are good for.
+steady_addresses()
+{
+    ip -oneline address show dev "$1" scope global |
+        awk '{ for (i = 3; i <= NF; i++) if ($i == "inet" || $i == "inet6") print $i, $(i + 1) }' |
+        sort
+}
+
+# True when every interface has as many addresses as it should, none of them tentative, and all of
+# them answer the outside.
+host_answers()
+{
+    local interface count device address
+    while read -r interface count; do
+        device="$(bearer "$interface")"
+        [ "$(steady_addresses "$device" | wc -l)" -eq "$count" ] || return 1
+        [ -z "$(ip -6 -oneline address show dev "$device" tentative)" ] || return 1
+        while read -r _ address; do
+            in_outside fping -q -r 0 -t 200 "${address%/*}" || return 1
+        done < <(steady_addresses "$device")
+    done < <(takeover_expected)
+}
+
+host_has_routes()
+{
+    [ "$(default_routes | wc -l)" -ge "$(wc -l <"$lab_out/managed-routes")" ]
+}
+
+# The name servers and search domains of the host, whoever wrote them.
+resolver_settings()
+{
+    { grep -E '^(nameserver|search|domain) ' /etc/resolv.conf || true; } | sed 's/ *$//' | sort
+}
+
+# Remembers how the host looks under its own manager.
+remember_managed()
+{
+    local interface
+    wait_until 90 host_answers
+    for interface in $(takeover_interfaces); do
+        steady_addresses "$interface" >"$lab_out/managed-addresses-$interface"
+        show <"$lab_out/managed-addresses-$interface"
+    done
+    while read -r _ address; do
+        echo "$([[ $address == *:* ]] && echo 6 || echo 4) ${address%/*}"
+    done < <(cat "$lab_out"/managed-addresses-*) >"$lab_out/host-addresses"
+    default_routes >"$lab_out/managed-routes"
+    show <"$lab_out/managed-routes"
+    resolver_settings >"$lab_out/managed-resolver"
+    show <"$lab_out/managed-resolver"
+    servers_leases >"$lab_out/managed-leases"
+    for interface in $(ip -brief link show | sed 's/[@ ].*//'); do
+        cat "/sys/class/net/$interface/address" >"$lab_out/managed-mac-$interface"
+    done
+    snapshot managed
+    packages_units >"$lab_out/managed-units"
+}
+
+# What starts with the machine.
+packages_units()
+{
+    systemctl list-unit-files --no-legend --no-pager --state=enabled,masked,disabled |
+        awk '{ print $1, $2 }' | grep -v -e '^lab-' -e vornovs | sort
+}
+
+# expect_same_host WHEN: at whatever device its addresses are now, the host answers at the ones it
+# had, goes out by the same ways and asks the same name servers, and the servers see one client.
+expect_same_host()
+{
+    local interface device
+    wait_until 90 host_answers
+    wait_until 30 host_has_routes
+    cp "$lab_out/managed-routes" "$lab_out/wanted-routes"
+    for interface in $(takeover_interfaces); do
+        device="$(bearer "$interface")"
+        steady_addresses "$device" >"$lab_out/got-addresses"
+        expect_same_text "$1, the addresses of $interface, now on $device" \
+            "$lab_out/managed-addresses-$interface" "$lab_out/got-addresses"
+        sed -i "s/ dev $interface\\b/ dev $device/" "$lab_out/wanted-routes"
+        expect_equal "$1, the hardware address of $device" \
+            "$(cat "$lab_out/managed-mac-$interface")" "$(cat "/sys/class/net/$device/address")"
+    done
+    sort -o "$lab_out/wanted-routes" "$lab_out/wanted-routes"
+    default_routes >"$lab_out/got-routes"
+    expect_same_text "$1, the default routes" "$lab_out/wanted-routes" "$lab_out/got-routes"
+    resolver_settings >"$lab_out/got-resolver"
+    comm -23 "$lab_out/managed-resolver" "$lab_out/got-resolver" >"$lab_out/difference"
+    if [ -s "$lab_out/difference" ]; then
+        show <"$lab_out/difference"
+        fail "$1, the host does not ask these name servers any more"
+    fi
+    servers_leases >"$lab_out/got-leases"
+    expect_same_text "$1, the leases" "$lab_out/managed-leases" "$lab_out/got-leases"
+}
+
+# expect_no_new_client WHEN: nobody has asked for an address as one who has none does.
+expect_no_new_client()
+{
+    expect_equal "$1, clients that asked as new ones" "$(cat "$lab_out/managed-asked")" \
+        "$(servers_asked DHCPDISCOVER DHCPSOLICIT)"
+}
+
+# Every port is in its bridge, whichever devices bear addresses.
+expect_ports_on_switch()
+{
+    local interface
+    for interface in $(takeover_interfaces); do
+        expect_equal "the bridge of ${interface%%.*}" "ovs_${interface%%.*}" \
+            "$(ovs-vsctl --timeout=10 br-exists "ovs_${interface%%.*}" && echo "ovs_${interface%%.*}")"
+    done
+    [ -n "$(ovs-vsctl --timeout=10 list-br)" ] || fail "there is no bridge"
+    for interface in $(topology_ports); do
+        if ! ovs-vsctl --timeout=10 iface-to-br "$interface" >/dev/null 2>&1; then
+            fail "$interface is not in the switch"
+        fi
+    done
+}
+
+expect_no_switch_devices()
+{
+    local left
+    left="$(ip -brief link show | awk '$1 ~ /^ovs_/ { print $1 }')"
+    expect_equal "devices of the switch" "" "$left"
+}
+
+# The old manager's host: files, units and live network are what they were before.
+expect_given_back()
+{
+    wait_until 90 host_answers
+    snapshot "$1"
+    expect_unchanged managed "$1"
+    packages_units >"$lab_out/got-units"
+    expect_same_text "$1: what starts with the machine" "$lab_out/managed-units" \
+        "$lab_out/got-units"
+}
+
+# The way through: run.sh of a case that is this way and nothing else calls takeover_phases.
+takeover_phases()
+{
+    phase_start() { takeover_start; }
+    phase_switched() { takeover_switched; }
+    phase_home() { takeover_home; }
+}
+
+takeover_install()
+{
+    step "Install"
+    wait_until 90 host_answers
+    snapshot_network before
+    packages_install vornovs-host vornovs-tools
+    snapshot_network installed
+    expect_unchanged before installed
+    remember_managed
+    servers_asked DHCPDISCOVER DHCPSOLICIT >"$lab_out/managed-asked"
+}
+
+takeover_adopt()
+{
+    step "Adopt"
+    expect_success vornovsctl adopt --dry-run | show
+    expect_nothing_done
+    probes_start
+    timed adopt vornovsctl adopt
+    expect_same_host "after adopt"
+    lab_probe_after=3 probes_finish adopt "${takeover_limit:-100}"
+    expect_no_new_client "after adopt"
+}
+
+expect_nothing_done()
+{
+    snapshot dry
+    expect_unchanged managed dry
+}
+
+takeover_register()
+{
+    step "Register"
+    probes_start
+    timed register vornovsctl register alpha
+    expect_ports_on_switch
+    expect_same_host "on the switch"
+    lab_probe_after=3 probes_finish register "${takeover_limit:-100}"
+    expect_no_new_client "on the switch"
+}
+
+takeover_start()
+{
+    takeover_install
+    takeover_adopt
+    takeover_register
+    reboot_machine switched
+}
+
+takeover_switched()
+{
+    expect_same_host "after a reboot on the switch"
+    expect_ports_on_switch
+    expect_no_new_client "after a reboot on the switch"
+    expect_registered alpha
+
+    step "Unregister"
+    probes_start
+    timed unregister vornovsctl unregister alpha
+    expect_no_switch_devices
+    expect_same_host "plain again"
+    lab_probe_after=3 probes_finish unregister "${takeover_limit:-100}"
+    expect_no_new_client "plain again"
+
+    step "Release"
+    probes_start
+    timed release vornovsctl release
+    expect_same_host "after release"
+    lab_probe_after=3 probes_finish release "${takeover_limit:-100}"
+    expect_given_back released
+    reboot_machine home
+}
+
+takeover_home()
+{
+    expect_same_host "at home after a reboot"
+    expect_given_back home
+    expect_no_switch_devices
+}

@@ -1,0 +1,303 @@
+#include "adopt/handover.h"
+
+#include "answer.h"
+
+#include <algorithm>
+#include <arpa/inet.h>
+#include <array>
+#include <linux/if_addr.h>
+#include <linux/rtnetlink.h>
+#include <sstream>
+#include <sys/socket.h>
+
+namespace vornovsctl {
+
+namespace {
+
+constexpr char kStatePath[] = "/run/network/ifstate";
+constexpr unsigned kReadable = 0644;
+
+bool IsActive(const HostView& host, const char* unit)
+{
+    return host.run({"systemctl", "is-active", unit}).value_or("").starts_with("active");
+}
+
+bool Owns(const AdoptionRecord& record, const std::set<std::string>& names, Manager manager)
+{
+    return std::any_of(record.interfaces.begin(), record.interfaces.end(),
+                       [&](const AdoptedInterface& interface) {
+                           return interface.manager == manager && names.contains(interface.name);
+                       });
+}
+
+/**
+ * Ended without a word to it, the daemon leaves everything as it is: asked to stop, or to read its
+ * files again, it would give leases back and take addresses away.
+ */
+void StartAnew(const char* unit, Hands& hands)
+{
+    (void)hands.Run({"systemctl", "kill", "--kill-whom=main", "--signal=KILL", unit});
+    (void)hands.Run({"systemctl", "start", unit});
+}
+
+void RestartDaemons(const HostView& host, const AdoptionRecord& record,
+                    const std::set<std::string>& names, Hands& hands)
+{
+    if (IsActive(host, kNetworkdUnit)) {
+        if (Owns(record, names, Manager::kNetworkd)) {
+            StartAnew(kNetworkdUnit, hands);
+        } else {
+            (void)hands.Run({"networkctl", "reload"});
+        }
+    }
+    if (IsActive(host, kNetworkManagerUnit)) {
+        if (Owns(record, names, Manager::kNetworkManager)) {
+            StartAnew(kNetworkManagerUnit, hands);
+        } else {
+            (void)hands.Run({"nmcli", "general", "reload", "conf"});
+        }
+    }
+}
+
+std::vector<std::string> LinesOf(const std::string& text)
+{
+    std::istringstream stream(text);
+    std::vector<std::string> lines;
+    for (std::string line; std::getline(stream, line);) {
+        lines.push_back(line);
+    }
+    return lines;
+}
+
+/** Brings what ifupdown has written down to what it is to believe. */
+void SetStateLine(const AdoptedInterface& interface, bool up, Hands& hands)
+{
+    const auto file = hands.Read(kStatePath);
+    if (interface.stateLine.empty() || (!file && !up)) {
+        return;
+    }
+    std::string text;
+    for (const std::string& line : LinesOf(file ? file->text : "")) {
+        text += line == interface.stateLine ? "" : line + '\n';
+    }
+    text += up ? interface.stateLine + '\n' : "";
+    hands.Write(kStatePath, text, kReadable);
+    hands.Write(std::string(kStatePath) + '.' + interface.name, (up ? interface.name : "") + '\n',
+                kReadable);
+}
+
+/** Whether two addresses are the same up to a length. */
+bool SameNetwork(int family, const std::string& one, const std::string& other, unsigned length)
+{
+    std::array<unsigned char, sizeof(in6_addr)> left{};
+    std::array<unsigned char, sizeof(in6_addr)> right{};
+    if (inet_pton(family, one.c_str(), left.data()) != 1 ||
+        inet_pton(family, other.c_str(), right.data()) != 1) {
+        return false;
+    }
+    for (unsigned bit = 0; bit < length; ++bit) {
+        const unsigned mask = 0x80U >> (bit % 8);
+        if (((left.at(bit / 8) ^ right.at(bit / 8)) & mask) != 0) {
+            return false;
+        }
+    }
+    return true;
+}
+
+/** Whether a destination such as "192.0.2.64/26" is the network of an address of the interface. */
+bool IsOwnNetwork(const HostView& host, const vornhost::Link& link, const std::string& destination)
+{
+    const std::size_t slash = destination.find('/');
+    if (slash == std::string::npos) {
+        return false;
+    }
+    const std::string length = destination.substr(slash + 1);
+    const std::string network = destination.substr(0, slash);
+    return std::any_of(
+        host.live.addresses.begin(), host.live.addresses.end(),
+        [&](const vornhost::Address& address) {
+            return address.index == link.index && (address.flags & IFA_F_NOPREFIXROUTE) != 0 &&
+                   std::to_string(address.prefixLength) == length &&
+                   SameNetwork(address.family, address.local, network, address.prefixLength);
+        });
+}
+
+std::vector<std::string> ReplacementOf(const Json& route, const std::string& family,
+                                       const std::string& name, const char* protocol)
+{
+    std::vector<std::string> words{"ip",
+                                   family,
+                                   "route",
+                                   "replace",
+                                   route.value("dst", ""),
+                                   "dev",
+                                   name,
+                                   "proto",
+                                   protocol,
+                                   "metric",
+                                   std::to_string(route.value("metric", 0U))};
+    if (const std::string source = route.value("prefsrc", ""); !source.empty()) {
+        words.insert(words.end(), {"src", source});
+    }
+    if (family == "-4") {
+        words.insert(words.end(), {"scope", "link"});
+    }
+    return words;
+}
+
+/**
+ * NetworkManager makes the routes to an interface's own networks itself and marks them as the
+ * kernel's. While the interface is ours they are marked as somebody's, so that they go along when
+ * the addresses move.
+ */
+void MarkNetworkRoutes(const HostView& host, const std::string& name, const char* from,
+                       const char* to, Hands& hands)
+{
+    const vornhost::Link* const link = host.live.Find(name);
+    for (const std::string family : {"-4", "-6"}) {
+        const auto text =
+            host.run({"ip", "-j", family, "route", "show", "dev", name, "proto", from});
+        const Json routes = Json::parse(text.value_or("[]"), nullptr, false);
+        if (!routes.is_array() || link == nullptr) {
+            continue;
+        }
+        for (const Json& route : routes) {
+            if (!route.contains("gateway") && IsOwnNetwork(host, *link, route.value("dst", ""))) {
+                (void)hands.Run(ReplacementOf(route, family, name, to));
+            }
+        }
+    }
+}
+
+/** For the moment in which the daemon takes over it is to leave everything as it finds it. */
+std::string KeepPathOf(const AdoptedInterface& interface)
+{
+    return "/run/systemd/network/" + interface.origin.substr(interface.origin.rfind('/') + 1) +
+           ".d/zz-vornovs-keep.conf";
+}
+
+void GiveToNetworkd(const HostView& host, const AdoptionRecord& record,
+                    const std::set<std::string>& names, Hands& hands)
+{
+    if (!IsActive(host, kNetworkdUnit)) {
+        return;
+    }
+    if (!Owns(record, names, Manager::kNetworkd)) {
+        (void)hands.Run({"networkctl", "reload"});
+        return;
+    }
+    std::set<std::string> paths;
+    for (const AdoptedInterface& interface : record.interfaces) {
+        if (interface.manager == Manager::kNetworkd && names.contains(interface.name)) {
+            paths.insert(KeepPathOf(interface));
+        }
+    }
+    for (const std::string& path : paths) {
+        hands.Write(path, "[Network]\nKeepConfiguration=yes\n", kReadable);
+    }
+    StartAnew(kNetworkdUnit, hands);
+    for (const std::string& path : paths) {
+        hands.Remove(path);
+        hands.RemoveEmptyFolder(path.substr(0, path.rfind('/')));
+    }
+}
+
+/** Told which profile is active on a device, the daemon goes on with it instead of beginning. */
+void GiveToNetworkManager(const HostView& host, const AdoptionRecord& record,
+                          const std::set<std::string>& names, Hands& hands)
+{
+    if (!IsActive(host, kNetworkManagerUnit)) {
+        return;
+    }
+    if (!Owns(record, names, Manager::kNetworkManager)) {
+        (void)hands.Run({"nmcli", "general", "reload", "conf"});
+        return;
+    }
+    for (const AdoptedInterface& interface : record.interfaces) {
+        const vornhost::Link* const link = host.live.Find(interface.name);
+        if (interface.manager == Manager::kNetworkManager && names.contains(interface.name) &&
+            link != nullptr && !interface.profile.empty()) {
+            MarkNetworkRoutes(host, interface.name, "static", "kernel", hands);
+            const bool made = link->kind == "bond" || link->kind == "vlan";
+            hands.Write("/run/NetworkManager/devices/" + std::to_string(link->index),
+                        "[device]\nmanaged=true\nconnection-uuid=" + interface.profile +
+                            "\nnm-owned=" + (made ? "true" : "false") + '\n',
+                        kReadable);
+        }
+    }
+    StartAnew(kNetworkManagerUnit, hands);
+}
+
+} // namespace
+
+std::vector<EndedClient> ClientsOf(const HostView& host, const std::string& interface)
+{
+    std::vector<EndedClient> clients;
+    for (const char* prefix : {"/run/dhclient.", "/run/dhclient6."}) {
+        EndedClient client{prefix + interface + ".pid", {}};
+        const auto number = host.Text(client.pidFile);
+        if (!number) {
+            continue;
+        }
+        const std::string process = number->substr(0, number->find('\n'));
+        if (host.Text("/proc/" + process + "/comm") != "dhclient\n") {
+            continue;
+        }
+        std::istringstream words(host.Text("/proc/" + process + "/cmdline").value_or(""));
+        for (std::string word; std::getline(words, word, '\0');) {
+            client.words.push_back(word);
+        }
+        clients.push_back(client);
+    }
+    return clients;
+}
+
+std::string StateLineOf(const HostView& host, const std::string& interface)
+{
+    for (const std::string& line : LinesOf(host.Text(kStatePath).value_or(""))) {
+        if (line.starts_with(interface + '=')) {
+            return line;
+        }
+    }
+    return "";
+}
+
+void TakeFromManagers(const HostView& host, const AdoptionRecord& record,
+                      const std::set<std::string>& names, Hands& hands)
+{
+    for (const AdoptedInterface& interface : record.interfaces) {
+        if (!names.contains(interface.name)) {
+            continue;
+        }
+        for (const EndedClient& client : interface.clients) {
+            hands.EndProcess(client.pidFile, "dhclient");
+        }
+        SetStateLine(interface, false, hands);
+    }
+    RestartDaemons(host, record, names, hands);
+    for (const AdoptedInterface& interface : record.interfaces) {
+        if (names.contains(interface.name) && interface.manager == Manager::kNetworkManager) {
+            MarkNetworkRoutes(host, interface.name, "kernel", "static", hands);
+        }
+    }
+}
+
+void GiveToManagers(const HostView& host, const AdoptionRecord& record,
+                    const std::set<std::string>& names, Hands& hands)
+{
+    GiveToNetworkd(host, record, names, hands);
+    GiveToNetworkManager(host, record, names, hands);
+    for (const AdoptedInterface& interface : record.interfaces) {
+        if (!names.contains(interface.name)) {
+            continue;
+        }
+        SetStateLine(interface, true, hands);
+        for (const EndedClient& client : interface.clients) {
+            if (!client.words.empty()) {
+                (void)hands.Run(client.words);
+            }
+        }
+    }
+}
+
+} // namespace vornovsctl

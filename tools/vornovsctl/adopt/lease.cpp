@@ -1,0 +1,95 @@
+#include "adopt/lease.h"
+
+#include <arpa/inet.h>
+#include <array>
+#include <cstdio>
+
+namespace vornovsctl {
+
+namespace {
+
+constexpr std::size_t kHeaderSize = 236;
+constexpr std::size_t kHardwareAddressAt = 28;
+constexpr std::size_t kYourAddressAt = 16;
+constexpr char kMagic[] = "\x63\x82\x53\x63";
+constexpr unsigned kLongestOption = 255;
+constexpr std::size_t kAddressSize = 4;
+
+enum OptionCode : unsigned char {
+    kNetmask = 1,
+    kRouters = 3,
+    kDns = 6,
+    kDomain = 15,
+    kLeaseTime = 51,
+    kMessageType = 53,
+    kServer = 54,
+    kEnd = 255
+};
+constexpr char kAck = 5;
+
+std::string BytesOf(const std::string& address)
+{
+    in_addr bytes{};
+    if (inet_pton(AF_INET, address.c_str(), &bytes) != 1) {
+        return "";
+    }
+    return {reinterpret_cast<const char*>(&bytes), kAddressSize};
+}
+
+void AddOption(OptionCode code, const std::string& value, std::string& packet)
+{
+    if (!value.empty() && value.size() <= kLongestOption) {
+        packet += static_cast<char>(code);
+        packet += static_cast<char>(value.size());
+        packet += value;
+    }
+}
+
+std::string ListOf(const std::vector<std::string>& addresses)
+{
+    std::string bytes;
+    for (const std::string& address : addresses) {
+        bytes += BytesOf(address);
+    }
+    return bytes;
+}
+
+std::string Number(std::uint32_t value)
+{
+    const std::uint32_t ordered = htonl(value);
+    return {reinterpret_cast<const char*>(&ordered), sizeof ordered};
+}
+
+} // namespace
+
+std::optional<std::string> AnswerOf(const Lease& lease, const std::string& mac)
+{
+    std::array<unsigned, 6> hardware{};
+    const std::string address = BytesOf(lease.address);
+    const std::string server = BytesOf(lease.server);
+    if (address.empty() || server.empty() || BytesOf(lease.netmask).empty() || lease.seconds == 0 ||
+        std::sscanf(mac.c_str(), "%2x:%2x:%2x:%2x:%2x:%2x", &hardware[0], &hardware[1],
+                    &hardware[2], &hardware[3], &hardware[4], &hardware[5]) != 6) {
+        return std::nullopt;
+    }
+    std::string packet(kHeaderSize, '\0');
+    packet[0] = 2; // an answer, over Ethernet with addresses of six bytes
+    packet[1] = 1;
+    packet[2] = static_cast<char>(hardware.size());
+    packet.replace(kYourAddressAt, kAddressSize, address);
+    for (std::size_t index = 0; index < hardware.size(); ++index) {
+        packet[kHardwareAddressAt + index] = static_cast<char>(hardware[index]);
+    }
+    packet += kMagic;
+    AddOption(kMessageType, std::string(1, kAck), packet);
+    AddOption(kServer, server, packet);
+    AddOption(kLeaseTime, Number(lease.seconds), packet);
+    AddOption(kNetmask, BytesOf(lease.netmask), packet);
+    AddOption(kRouters, ListOf(lease.routers), packet);
+    AddOption(kDns, ListOf(lease.dns), packet);
+    AddOption(kDomain, lease.domain, packet);
+    packet += static_cast<char>(kEnd);
+    return packet;
+}
+
+} // namespace vornovsctl

@@ -45,8 +45,6 @@ InterfaceRecord Both(const InterfaceRecord& former, const InterfaceRecord& next)
     both.tag = next.tag ? next.tag : former.tag;
     both.ownSettings.insert(next.ownSettings.begin(), next.ownSettings.end());
     both.client = former.client || next.client;
-    both.resolver = next.resolver.empty() ? former.resolver : next.resolver;
-    both.linkCommands = former.linkCommands;
     return both;
 }
 

@@ -29,6 +29,17 @@ void WriteHandover(const Handover& handover)
     }
 }
 
+/** What cannot be read back is known to be so once it was done. */
+RunState WithWhatIsTold(const Plan& plan)
+{
+    RunState state = plan.recordBefore;
+    for (const auto& [name, record] : plan.recordAfter.interfaces) {
+        state.interfaces[name].linkCommands = record.linkCommands;
+        state.interfaces[name].resolver = record.resolver;
+    }
+    return state;
+}
+
 class Reconciler {
 public:
     explicit Reconciler(Request request) : m_request(std::move(request)) {}
@@ -167,7 +178,9 @@ bool Reconciler::Attempt()
     }
     Save(inputs->runState, plan.recordBefore);
     std::vector<Remark> remarks;
-    (void)ApplyPlan(plan, remarks);
+    if (ApplyPlan(plan, remarks)) {
+        Save(plan.recordBefore, WithWhatIsTold(plan));
+    }
     SayOnce(remarks);
     return false;
 }

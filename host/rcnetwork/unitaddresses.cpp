@@ -153,6 +153,32 @@ void UnitPlanner::RemoveAddresses()
     }
 }
 
+/** Whether an address that a file asks for is one of a server, and would go with its lease. */
+bool UnitPlanner::IsLent(const Address& address) const
+{
+    const InterfaceFile& file = *m_unit.file;
+    const bool served = address.family == AF_INET ? file.client.dhcp : ClientHasIpv6();
+    const bool ends = address.validSeconds != UINT32_MAX ||
+                      (m_former.client && (address.flags & IFA_F_NOPREFIXROUTE) != 0);
+    return !served && ends && m_unit.carrierLink != nullptr &&
+           address.index == m_unit.carrierLink->index;
+}
+
+/** IPv4 addresses are made anew, because whether they have a route for their prefix stays. */
+void UnitPlanner::KeepForGood(const Address& address)
+{
+    auto& lines = Build().addresses;
+    if (address.family == AF_INET6) {
+        lines.push_back("addr change " + AddressText(address) + " dev " + Carrier() +
+                        " valid_lft forever preferred_lft forever");
+    } else {
+        lines.push_back("addr del " + AddressText(address) + " dev " + Carrier());
+        lines.push_back("addr add " + AddressText(address) +
+                        (address.prefixLength <= 30 ? " brd +" : "") + " dev " + Carrier());
+    }
+    m_record.addresses.insert(AddressText(address));
+}
+
 void UnitPlanner::AddWantedAddress(const WantedAddress& wanted)
 {
     Address like;
@@ -164,6 +190,9 @@ void UnitPlanner::AddWantedAddress(const WantedAddress& wanted)
         present = present == nullptr ? FindOn(source.link, like) : present;
     }
     if (present != nullptr && present->prefixLength == wanted.prefixLength) {
+        if (IsLent(*present)) {
+            KeepForGood(*present);
+        }
         return;
     }
     if (present != nullptr && m_unit.carrierLink != nullptr &&

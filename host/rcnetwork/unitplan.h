@@ -168,6 +168,8 @@ private:
     void CarryAddress(const Address& address, const Source& source);
     void SettleAddresses();
     bool IsCarried(const Address& address) const;
+    bool IsLent(const Address& address) const;
+    void KeepForGood(const Address& address);
     void AddWantedAddress(const WantedAddress& wanted);
     void RemoveAddresses();
     void RemoveAddress(const Address& address, const std::string& interface);

@@ -144,8 +144,10 @@ void UnitPlanner::ReturnSettings()
     for (const Link* member : m_unit.members) {
         InterfaceRecord& record = m_steps.records[member->name];
         for (const auto& [setting, own] : record.ownSettings) {
+            // Changing this one makes the kernel add routes, which it takes away as it joins.
+            auto& stage = setting == kAddressMode ? m_steps.settingsBefore : m_steps.settingsAfter;
             if (Live(member->name, setting) != own) {
-                Set(m_steps.settingsAfter, member->name, setting, own);
+                Set(stage, member->name, setting, own);
             }
         }
         record.ownSettings.clear();

@@ -19,6 +19,9 @@ build_packages=(
 test_packages=(
     binutils
     clang
+    dhcpcd-base
+    dnsmasq-base
+    ethtool
     iproute2
     systemd
 )

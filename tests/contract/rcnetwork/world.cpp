@@ -43,6 +43,7 @@ Link ReadLink(const Json& json)
     link.master = json.value("master", 0);
     link.parent = json.value("parent", 0);
     link.vlanId = json.value("vlan", -1);
+    link.token = json.value("token", "");
     link.type = kEthernet;
     return link;
 }
@@ -93,6 +94,7 @@ Route ReadRoute(const Json& json, const LiveState& live)
         std::tie(route.destination, route.prefixLength) = Split(to);
         route.family = Family(route.destination);
     }
+    route.type = json.value("type", static_cast<unsigned>(RTN_UNICAST));
     route.table = json.value("table", static_cast<unsigned>(RT_TABLE_MAIN));
     route.protocol = json.value("proto", static_cast<unsigned>(RTPROT_BOOT));
     route.priority = json.value("metric", 0U);
@@ -105,10 +107,11 @@ Route ReadRoute(const Json& json, const LiveState& live)
         for (const Json& hop : json.at("hops")) {
             route.nextHops.push_back(ReadHop(hop, live, route.family));
         }
-    } else {
+    } else if (route.type == RTN_UNICAST) {
         route.nextHops.push_back(ReadHop(json, live, route.family));
     }
-    const bool direct = route.family == AF_INET && route.nextHops[0].gateway.empty();
+    const bool direct =
+        route.family == AF_INET && !route.nextHops.empty() && route.nextHops[0].gateway.empty();
     route.scope = direct ? RT_SCOPE_LINK : RT_SCOPE_UNIVERSE;
     return route;
 }
@@ -257,6 +260,11 @@ World ReadWorld(const std::string& folder)
         former.bond.slaves = bond.at("members").get<std::vector<std::string>>();
         former.bond.mac = bond.at("mac").get<std::string>();
         former.columns = bond.value("columns", SwitchValues());
+    }
+    const Json clients = json.value("clients", Json::object());
+    for (const auto& [name, client] : clients.items()) {
+        world.inputs.clients[name] = {client.value("running", true),
+                                      ParseClientText(client.at("options"))};
     }
     if (json.contains("handover")) {
         world.inputs.handover = ParseHandover(json.at("handover").dump(), 0);

@@ -35,9 +35,9 @@ void AddFamilies(const InterfaceFile& file, ClientOptions& options)
 {
     const bool six = file.ipv6 && (file.ClientHearsRouters() || file.client.dhcp6 == true);
     if (!six) {
-        options.emplace_back("ipv4only");
+        options.emplace_back(kOnlyIPv4);
     } else if (!file.client.dhcp) {
-        options.emplace_back("ipv6only");
+        options.emplace_back(kOnlyIPv6);
     }
     if (six && !file.ClientHearsRouters()) {
         options.emplace_back("noipv6rs"); // the kernel does, or nobody

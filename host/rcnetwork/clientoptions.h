@@ -14,6 +14,10 @@ namespace vornhost {
 /** Lines of the client's configuration, in their order. */
 using ClientOptions = std::vector<std::string>;
 
+/** The option of a client that leaves IPv6 alone. */
+constexpr char kOnlyIPv4[] = "ipv4only";
+constexpr char kOnlyIPv6[] = "ipv6only";
+
 /** A client as an earlier run left it. */
 struct LiveClient {
     bool running = false;

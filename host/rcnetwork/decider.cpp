@@ -112,9 +112,16 @@ bool Decider::BridgeIsLive() const
     return m_unit.bridgeLink != nullptr || m_anyBridge != nullptr;
 }
 
-/** So it is at boot: there is no reason to leave anything as it is. */
+/**
+ * So it is at boot, and then there is no reason to leave anything as it is: a bridge that the
+ * switch knows from before carries nothing yet.
+ */
 bool Decider::NothingIsLive() const
 {
+    const auto record = m_inputs.runState.interfaces.find(m_unit.name);
+    if (record != m_inputs.runState.interfaces.end() && !record->second.Empty()) {
+        return false;
+    }
     const auto& addresses = m_inputs.live.addresses;
     const std::string master =
         m_unit.port == nullptr ? "" : m_inputs.live.NameOf(m_unit.port->master);
@@ -157,7 +164,7 @@ void Decider::ChooseForStart()
     if (usable && !file->slave) {
         m_unit.target = Target::kSwitch;
         m_unit.file = file;
-    } else if (file == nullptr || usable || !BridgeIsLive()) {
+    } else if (file == nullptr || usable || !BridgeIsLive() || NothingIsLive()) {
         ChooseWithoutBridgeFile();
     }
     if (m_unit.target == Target::kSwitch && m_inputs.request.withoutSwitch.contains(m_unit.name)) {
@@ -234,7 +241,7 @@ void Decider::ChooseWithoutBridgeFile()
     if (file.bridge == m_unit.bridge && !file.slave && !m_inputs.files.contains(m_unit.bridge)) {
         Say(Severity::kWarning, "ifcfg-" + file.name + " names the bridge " + file.bridge +
                                     ", which has no usable file");
-        if (BridgeIsLive()) {
+        if (BridgeIsLive() && !NothingIsLive()) {
             return;
         }
     }

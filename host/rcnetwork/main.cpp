@@ -25,13 +25,18 @@ constexpr char kBondVerb[] = "set-ovs-bond";
 /** Of the hook program that is told of conversions: "begin" or "end". */
 constexpr char kHandoverVerb[] = "handover";
 
+/** Of the tool that gives interfaces back to another manager. */
+constexpr char kLeaveVerb[] = "leave";
+
 constexpr char kUsage[] =
     "Usage: rc.network [--dry-run] start|stop [interface...]\n"
     "       rc.network set-ovs-bond bond\n"
+    "       rc.network leave interface...\n"
     "       rc.network wait-online\n"
     "Brings the network to what the files in /etc/sysconfig/network-scripts ask for (start),\n"
     "or takes down what start made (stop); without interfaces, all of them. set-ovs-bond brings\n"
     "the options of a bond on the switch to what its file says, while it goes on to work.\n"
+    "leave ends what works for interfaces and changes nothing on them: somebody else takes over.\n"
     "wait-online waits until the addresses that the files ask for answer.\n"
     "  --boot      wait for interfaces that have not appeared yet, within a limit\n"
     "  --dry-run   print what would be done and change nothing\n"
@@ -47,10 +52,11 @@ struct VerbForm {
 };
 
 constexpr std::array kVerbs = {
-    VerbForm{"start", Words::kInterfaces, false}, VerbForm{"stop", Words::kInterfaces, false},
-    VerbForm{kOnlineVerb, Words::kNone, true},    VerbForm{kBondVerb, Words::kInterface, false},
-    VerbForm{kHandoverVerb, Words::kText, false}, VerbForm{kHolderVerb, Words::kText, true},
-    VerbForm{kRetryVerb, Words::kNone, true},     VerbForm{kAppearedVerb, Words::kInterface, true},
+    VerbForm{"start", Words::kInterfaces, false},     VerbForm{"stop", Words::kInterfaces, false},
+    VerbForm{kLeaveVerb, Words::kInterfaces, false},  VerbForm{kOnlineVerb, Words::kNone, true},
+    VerbForm{kBondVerb, Words::kInterface, false},    VerbForm{kHandoverVerb, Words::kText, false},
+    VerbForm{kHolderVerb, Words::kText, true},        VerbForm{kRetryVerb, Words::kNone, true},
+    VerbForm{kAppearedVerb, Words::kInterface, true},
 };
 
 const VerbForm* FindVerb(const std::string& name)
@@ -109,6 +115,7 @@ bool ParseCommandLine(int count, char** arguments, CommandLine& line)
     const bool isPlain = words == Words::kInterfaces;
     return line.word.empty() == (isPlain || words == Words::kNone) && (isPlain || !line.dryRun) &&
            (!line.boot || line.verb == "start") &&
+           (line.verb != kLeaveVerb || (!line.request.names.empty() && !line.dryRun)) &&
            (line.verb != kHandoverVerb || line.word == "begin" || line.word == "end");
 }
 
@@ -151,6 +158,9 @@ bool RunLocked(const CommandLine& line)
     const Descriptor lock = TakeNetworkLock();
     if (!lock) {
         return false;
+    }
+    if (line.verb == kLeaveVerb) {
+        return Leave(line.request);
     }
     if (line.verb == kBondVerb) {
         return SetSwitchBond(line.word);

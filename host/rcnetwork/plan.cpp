@@ -71,6 +71,8 @@ void AddStages(const Steps& steps, Plan& plan)
     }
     AddStage(plan, StageKind::kSwitch, "make bridges", steps.makeBridges);
     AddStage(plan, StageKind::kWait, "wait for bridges", steps.waitFor);
+    AddStage(plan, StageKind::kBatch, "create devices", steps.creation.Lines());
+    AddStage(plan, StageKind::kSettings, "settings of new devices", steps.creationSettings);
     AddStage(plan, StageKind::kBatch, "make devices", steps.devices.Lines());
     AddStage(plan, StageKind::kReady, "wait for links", steps.readyBefore);
     // A client would put back what is taken away.
@@ -80,6 +82,8 @@ void AddStages(const Steps& steps, Plan& plan)
     std::vector<std::string> joinAndLeave = Once(steps.leave);
     joinAndLeave.insert(joinAndLeave.end(), steps.join.begin(), steps.join.end());
     AddStage(plan, StageKind::kSwitch, "join and leave", joinAndLeave);
+    AddStage(plan, StageKind::kBatch, "replace devices", steps.replacement.Lines());
+    AddStage(plan, StageKind::kSettings, "settings of replaced devices", steps.replacementSettings);
     AddStage(plan, StageKind::kBatch, "move", steps.move.Lines());
     AddStage(plan, StageKind::kAnnounce, "announce", steps.announce);
     AddStage(plan, StageKind::kSwitch, "remove bridges", Once(steps.removeBridges));

@@ -145,6 +145,21 @@ bool RoutePlanner::IsRecorded(const Unit& unit, const Route& route) const
     return has(unit.name) || std::any_of(unit.absorbed.begin(), unit.absorbed.end(), has);
 }
 
+/** Where it does not, routes to routers are the kernel's or of somebody before us. */
+bool RoutePlanner::ClientHeardRouters(const Unit& unit) const
+{
+    for (const std::string& name : {unit.carrier, unit.name, unit.bridge}) {
+        const auto client = m_inputs.clients.find(name);
+        if (client != m_inputs.clients.end()) {
+            const ClientOptions& options = client->second.options;
+            return std::none_of(options.begin(), options.end(), [](const std::string& option) {
+                return option == kOnlyIPv4 || option == "noipv6rs";
+            });
+        }
+    }
+    return true;
+}
+
 /** Whether a client of this unit made the route that is not to run any more. */
 bool RoutePlanner::IsLeftByClient(const Unit& unit, const Route& route) const
 {
@@ -156,8 +171,9 @@ bool RoutePlanner::IsLeftByClient(const Unit& unit, const Route& route) const
         return false;
     }
     const bool served = route.protocol == RTPROT_DHCP && route.family == AF_INET;
-    const bool heard =
-        route.family == AF_INET6 && (route.protocol == RTPROT_RA || route.protocol == RTPROT_DHCP);
+    const bool heard = route.family == AF_INET6 &&
+                       (route.protocol == RTPROT_RA || route.protocol == RTPROT_DHCP) &&
+                       ClientHeardRouters(unit);
     const bool serves = !unit.takeDown && unit.file != nullptr && unit.file->client.dhcp;
     const bool hears = !unit.takeDown && unit.file != nullptr && unit.file->ClientHearsRouters();
     return (served && !serves) || (heard && !hears);

@@ -26,6 +26,7 @@ private:
     bool IsOnLink(const Unit& unit, int family, const std::string& gateway) const;
     const Unit* UnitOf(int index) const;
     const Unit* SourceUnitOf(const Route& route) const;
+    bool ClientHeardRouters(const Unit& unit) const;
     bool IsLeftByClient(const Unit& unit, const Route& route) const;
     bool IsRecorded(const Unit& unit, const Route& route) const;
     bool IsUnwanted(const Unit& unit, const Route& route) const;

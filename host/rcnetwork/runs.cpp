@@ -1,21 +1,46 @@
 #include "runs.h"
 
+#include "clientcontrol.h"
 #include "handover.h"
 #include "hold.h"
 #include "reconcile.h"
 #include "report.h"
+#include "runstate.h"
 
+#include "support/atomicfile.h"
 #include "support/runlock.h"
 #include "support/servicemanager.h"
 
 #include <cerrno>
 #include <cstring>
+#include <fstream>
+#include <sstream>
 
 namespace vornhost {
 namespace {
 
 constexpr char kLockName[] = "network.lock";
 constexpr int kLockSeconds = 90;
+constexpr mode_t kPrivate = 0600;
+
+bool ForgetRecords(const std::set<std::string>& names)
+{
+    std::ifstream file(kRunStatePath);
+    std::ostringstream text;
+    if (!file || !(text << file.rdbuf())) {
+        return true; // nothing was made in this boot
+    }
+    RunState state = ParseRunState(text.str());
+    for (const std::string& name : names) {
+        state.interfaces.erase(name);
+    }
+    if (!ReplaceFile(kRunStatePath, RunStateText(state), kPrivate)) {
+        Say({Severity::kError,
+             std::string("cannot write ") + kRunStatePath + ": " + std::strerror(errno)});
+        return false;
+    }
+    return true;
+}
 
 } // namespace
 
@@ -56,6 +81,20 @@ bool Stop(const Request& request)
     }
     EndHold(ConcernedBy(request));
     return Reconcile(request);
+}
+
+bool Leave(const Request& request)
+{
+    bool done = ForgetRecords(request.names);
+    const auto clients = ReadClients();
+    for (const std::string& name : request.names) {
+        std::string error;
+        if (clients.contains(name) && !DropClient(name, error)) {
+            Say({Severity::kError, "the client of " + name + ": " + error});
+            done = false;
+        }
+    }
+    return done;
 }
 
 } // namespace vornhost

@@ -26,6 +26,12 @@ bool Start(const Request& request);
 /** Takes down what the request names, or only holds it when the library asks. As Start(). */
 bool Stop(const Request& request);
 
+/**
+ * Lets go of interfaces that somebody else is about to manage: their clients end and what was made
+ * for them is forgotten, but all of it stays as it is. As Start().
+ */
+bool Leave(const Request& request);
+
 } // namespace vornhost
 
 #endif

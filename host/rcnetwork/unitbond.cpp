@@ -57,7 +57,7 @@ bool UnitPlanner::IsGathered(const Link& link) const
 void UnitPlanner::MakeBond()
 {
     const BondOptions options = BondOptionsOf(m_inputs.files.at(m_unit.name));
-    auto& lines = m_steps.devices.links;
+    auto& lines = Quiet(m_unit.name) ? m_steps.creation.links : m_steps.devices.links;
     std::string line = "link add dev " + m_unit.name;
     if (!WantedMac().empty()) {
         line += " address " + WantedMac();
@@ -74,7 +74,7 @@ void UnitPlanner::MakeBond()
     if (Carrier() == m_unit.name && BringsLinkLocal()) {
         lines.push_back("link set dev " + m_unit.name + " addrgenmode none");
     }
-    lines.push_back("link set dev " + m_unit.name + " up");
+    m_steps.devices.links.push_back("link set dev " + m_unit.name + " up");
     m_record.made = true;
     m_record.broughtUp = true;
 }

@@ -34,6 +34,19 @@ std::vector<std::string> UnitPlanner::ClientNames() const
     return names;
 }
 
+/** Clients of interfaces that are gone: of a plan that was cut short, if it was the same client. */
+std::vector<std::string> UnitPlanner::LostClients(const ClientOptions& wanted) const
+{
+    std::vector<std::string> names;
+    for (const auto& [name, client] : m_inputs.clients) {
+        if (m_inputs.live.FindLink(name) == nullptr && name != Carrier() && !wanted.empty() &&
+            WithInterface(client.options, Carrier()) == wanted) {
+            names.push_back(name);
+        }
+    }
+    return names;
+}
+
 /** Clients of what the carrier takes over from, which have no follower. */
 std::vector<std::string> UnitPlanner::OtherClients() const
 {
@@ -114,11 +127,35 @@ ClientOptions UnitPlanner::WantedClient() const
     return {};
 }
 
+/** Whether the client gives the carrier its link-local address, and turns the kernel's way off. */
+bool UnitPlanner::ClientHasIpv6() const
+{
+    const ClientOptions options = WantedClient();
+    return !options.empty() &&
+           std::find(options.begin(), options.end(), kOnlyIPv4) == options.end();
+}
+
+/** What a client of the other family only finds on the interface is somebody else's. */
+bool UnitPlanner::HadClientFor(int family) const
+{
+    const char* const other = family == AF_INET ? kOnlyIPv6 : kOnlyIPv4;
+    std::vector<std::string> names = ClientNames();
+    names.insert(names.begin(), Carrier());
+    for (const std::string& name : names) {
+        const auto client = m_inputs.clients.find(name);
+        if (client != m_inputs.clients.end()) {
+            const ClientOptions& options = client->second.options;
+            return std::find(options.begin(), options.end(), other) == options.end();
+        }
+    }
+    return true;
+}
+
 /** Its addresses are told by that the kernel makes no route for their prefix. */
 bool UnitPlanner::IsLeftByClient(const Address& address) const
 {
     if (!m_former.client || (address.flags & IFA_F_NOPREFIXROUTE) == 0 ||
-        address.scope != RT_SCOPE_UNIVERSE) {
+        address.scope != RT_SCOPE_UNIVERSE || !HadClientFor(address.family)) {
         return false;
     }
     if (m_unit.takeDown || m_unit.file == nullptr) {
@@ -152,7 +189,12 @@ void UnitPlanner::EndClient(const std::string& name, const char* verb)
 void UnitPlanner::PlanClient()
 {
     const ClientOptions wanted = WantedClient();
-    const std::vector<std::string> formers = ClientNames();
+    std::vector<std::string> formers = ClientNames();
+    for (const std::string& name : LostClients(wanted)) {
+        if (std::find(formers.begin(), formers.end(), name) == formers.end()) {
+            formers.push_back(name);
+        }
+    }
     const auto own = m_inputs.clients.find(Carrier());
     const bool stays = !wanted.empty() && own != m_inputs.clients.end() && own->second.running &&
                        own->second.options == wanted && m_unit.carrierLink != nullptr;
@@ -172,6 +214,12 @@ void UnitPlanner::PlanClient()
     }
     if (m_unit.file != nullptr) {
         CheckMetrics();
+    }
+    // The client had turned off that the kernel makes the link-local address.
+    const std::string mode = Live(kNewInterface, kAddressMode);
+    if (m_former.client && wanted.empty() && m_unit.removeUnwanted && !mode.empty() &&
+        Live(Carrier(), kAddressMode) == kAddressModeNone && mode != kAddressModeNone) {
+        Set(m_steps.settingsAfter, Carrier(), kAddressMode, mode);
     }
     m_record.client = !wanted.empty();
 }

@@ -13,6 +13,10 @@
 
 namespace vornhost {
 
+constexpr char kAddressMode[] = "ipv6.conf.addr_gen_mode";
+constexpr char kAddressModeNone[] = "1";
+constexpr char kAcceptRouters[] = "ipv6.conf.accept_ra";
+
 /** One "ip -batch", in the order in which its parts run. */
 struct BatchParts {
     std::vector<std::string> links;
@@ -30,6 +34,8 @@ struct BatchParts {
 
 /** What every interface contributes to the stages of the host's plan. */
 struct Steps {
+    BatchParts creation; ///< Devices that have settings before they are up.
+    std::vector<std::string> creationSettings;
     bool needsSwitch = false;
     std::vector<std::string> makeBridges;
     std::vector<std::string> waitFor;
@@ -37,7 +43,9 @@ struct Steps {
     std::vector<std::string> readyBefore;
     std::vector<std::string> endClients;
     std::vector<std::string> settingsBefore;
-    BatchParts beside; ///< Made while traffic still takes its former way.
+    BatchParts beside;      ///< Made while traffic still takes its former way.
+    BatchParts replacement; ///< Devices that have settings and can be made late only.
+    std::vector<std::string> replacementSettings;
     std::vector<std::string> leave;
     std::vector<std::string> join;
     BatchParts move; ///< Follows the ports.
@@ -92,6 +100,8 @@ private:
     // unitdevices.cpp: VLANs of the kernel
     void PlanDevices();
     bool BringsLinkLocal() const;
+    bool IsReplaced() const;
+    bool Quiet(const std::string& device);
     void MakeVlan(const std::string& device, const std::string& parent, unsigned id);
     void RemoveOldVlans();
 
@@ -154,10 +164,13 @@ private:
     void PlanClient();
     void EndClient(const std::string& name, const char* verb);
     std::vector<std::string> ClientNames() const;
+    std::vector<std::string> LostClients(const ClientOptions& wanted) const;
     std::vector<std::string> OtherClients() const;
     ClientOptions WantedClient() const;
     ClientPlace PlaceOfClient() const;
     const Link* CardOf(const std::string& name) const;
+    bool ClientHasIpv6() const;
+    bool HadClientFor(int family) const;
     bool IsLeftByClient(const Address& address) const;
     void CheckMetrics() const;
 
@@ -169,6 +182,7 @@ private:
     InterfaceRecord m_former;
     InterfaceRecord m_record;
     std::set<std::string> m_carried; ///< Addresses that are on their way to the carrier.
+    bool m_quiet = false;            ///< The carrier hears routers only in the end.
     bool m_moves = false;            ///< What the source carries goes to the target.
 };
 

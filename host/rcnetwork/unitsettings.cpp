@@ -11,8 +11,6 @@ namespace vornhost {
 namespace {
 
 constexpr char kDisableIpv6[] = "ipv6.conf.disable_ipv6";
-constexpr char kAddressMode[] = "ipv6.conf.addr_gen_mode";
-constexpr char kAddressModeNone[] = "1";
 
 // Moved with the IPv6 stack, following the MTU, or not for writing.
 constexpr std::array<std::string_view, 6> kSettingsOfTheirOwn{kDisableIpv6,
@@ -123,6 +121,9 @@ std::vector<std::string>& UnitPlanner::Settings() const
 {
     const bool madeLate =
         m_unit.late && m_unit.carrierLink == nullptr && (!m_unit.IsGroup() || m_unit.tag);
+    if (IsReplaced()) {
+        return m_steps.replacementSettings;
+    }
     return madeLate ? m_steps.settingsAfter : m_steps.settingsBefore;
 }
 
@@ -135,7 +136,11 @@ void UnitPlanner::CarrySettings()
     }
     const std::string former = m_unit.carrierLink == nullptr ? kNewInterface : Carrier();
     for (const auto& [setting, value] : settings->second) {
-        if (!HasOwnWay(setting) && Live(former, setting) != value) {
+        if (m_quiet && setting == kAcceptRouters) {
+            if (value != "0") {
+                Set(m_steps.settingsAfter, Carrier(), setting, value);
+            }
+        } else if (!HasOwnWay(setting) && Live(former, setting) != value) {
             Set(Settings(), Carrier(), setting, value);
         }
     }
@@ -155,7 +160,7 @@ void UnitPlanner::MoveIpv6Stack()
     if (m_unit.MainSource() == nullptr || off.empty()) {
         return;
     }
-    const bool madeLate = &Settings() == &m_steps.settingsAfter;
+    const bool madeLate = &Settings() != &m_steps.settingsBefore;
     const std::string former = m_unit.carrierLink == nullptr ? kNewInterface : Carrier();
     if (off == "0" && Live(former, kAddressMode) != kAddressModeNone && !madeLate) {
         Set(m_steps.settingsBefore, Carrier(), kAddressMode, kAddressModeNone);
@@ -163,7 +168,7 @@ void UnitPlanner::MoveIpv6Stack()
     if (Live(former, kDisableIpv6) != off) {
         Set(Settings(), Carrier(), kDisableIpv6, off);
     }
-    if (mode != kAddressModeNone || off != "0") {
+    if ((mode != kAddressModeNone || off != "0") && !ClientHasIpv6()) {
         Set(m_steps.settingsAfter, Carrier(), kAddressMode, mode);
     }
     if (Carrier() == m_unit.name) {
@@ -218,7 +223,7 @@ void UnitPlanner::SilencePort(const Link& port)
         Set(m_steps.settingsAfter, port.name, kDisableIpv6, "1");
     }
     const auto mode = record.formerSettings.find(kAddressMode);
-    if (!moves && mode != record.formerSettings.end() &&
+    if (!moves && mode != record.formerSettings.end() && !ClientHasIpv6() &&
         Live(m_unit.bridge, kAddressMode) == kAddressModeNone && mode->second != kAddressModeNone &&
         port.name == m_unit.port->name) {
         Set(m_steps.settingsAfter, m_unit.bridge, kAddressMode, mode->second);
@@ -259,7 +264,7 @@ void UnitPlanner::PlanAutoconf()
     // Either the kernel hears routers or the client does.
     const bool kernel = *m_unit.file->autoconf && !m_unit.file->ClientHearsRouters();
     const std::string wanted = kernel ? "1" : "0";
-    for (const char* setting : {"ipv6.conf.accept_ra", "ipv6.conf.autoconf"}) {
+    for (const char* setting : {kAcceptRouters, "ipv6.conf.autoconf"}) {
         // While the interface moves, the target is about to have what the source has.
         const bool follows = m_moves && m_unit.MainSource() != nullptr;
         const std::string live = Live(follows ? MainSource() : Carrier(), setting);

@@ -16,6 +16,8 @@
 . /lab/phases.sh
 # shellcheck source=packages.sh
 . /lab/packages.sh
+# shellcheck source=booting.sh
+. /lab/booting.sh
 # shellcheck source=takeover.sh
 . /lab/takeover.sh
 # shellcheck source=snapshot.sh

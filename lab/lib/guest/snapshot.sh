@@ -50,6 +50,7 @@ snapshot_links()
 
 snapshot_addresses()
 {
+    # How long addresses of servers and routers are good changes by itself.
     ip -oneline address show |
         sed -E -e 's/^[0-9]+: //' -e 's/\\//g' -e 's/_lft [0-9]+sec/_lft SECONDS/g' -e 's/  +/ /g' |
         sort

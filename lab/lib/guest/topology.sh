@@ -49,7 +49,8 @@ topology_build()
         esac
     done </lab/topology/topology
 
-    if [ -d /lab/topology/host ]; then
+    # A machine that has a disk got them once, with its manager.
+    if [ -d /lab/topology/host ] && ! machine_has_systemd; then
         cp -a /lab/topology/host/. /
     fi
 }
@@ -143,14 +144,15 @@ in_outside()
     ip netns exec outside "$@"
 }
 
-# The appliance's addresses as its files give them, one a line: FAMILY ADDRESS; on a host with a
-# manager of its own, those that it had at first.
+# The appliance's addresses as its files and the outside's servers give them, one a line: FAMILY
+# ADDRESS; on a host with a manager of its own, those that it had at first.
 topology_addresses()
 {
     if [ -e "$lab_out/host-addresses" ]; then
         cat "$lab_out/host-addresses"
         return
     fi
+    servers_gave
     cat /lab/topology/host/etc/sysconfig/network-scripts/ifcfg-* | tr -d '"' |
         awk -F = '
             $1 ~ /^IPADDR[0-9]*$/ && $2 != "" { print 4, $2 }
@@ -182,6 +184,7 @@ topology_far_address()
 topology_ready()
 {
     local family address
+    servers_ready
     topology_addresses >"$lab_out/addresses"
     while read -r family address; do
         wait_until 30 in_outside fping "-$family" -q -r 0 -t 200 "$address"

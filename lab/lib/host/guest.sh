@@ -14,7 +14,7 @@ lab_qemu_arguments()
             -drive "file=$2,format=qcow2,if=none,id=disk,cache=unsafe" \
             -device virtio-blk-pci,drive=disk
     else
-        printf '%s\n' -m 512
+        printf '%s\n' -m 768
     fi
 }
 

@@ -10,7 +10,7 @@
 # What the guest runs of Debian's, besides busybox.
 lab_programs=(
     bin/bash bin/dash bin/cp bin/ip sbin/bridge sbin/tc bin/ss usr/bin/chrt usr/bin/flock usr/bin/fping
-    usr/bin/uuidgen sbin/ldconfig usr/bin/getconf
+    usr/bin/uuidgen sbin/ldconfig usr/bin/getconf sbin/ethtool usr/sbin/dhcpcd usr/sbin/dnsmasq
     usr/bin/ovs-vsctl usr/bin/ovs-appctl usr/bin/ovs-ofctl usr/bin/ovs-dpctl
     usr/bin/ovsdb-tool usr/bin/ovsdb-client usr/sbin/ovsdb-server
     usr/lib/openvswitch-switch/ovs-vswitchd
@@ -134,8 +134,13 @@ lab_make_system()
     cp "$lab_debian/etc/default/openvswitch-switch" "$root/etc/default/"
     find "$lab_debian/etc/iproute2" -maxdepth 1 -type f -exec cp -t "$root/etc/iproute2" {} +
 
+    cp -r "$lab_debian/usr/lib/dhcpcd" "$root/usr/lib/"
+    cp "$lab_debian/etc/dhcpcd.conf" "$root/etc/"
+    mkdir -p "$root/var/lib/dhcpcd"
+
     printf 'root:x:0:0:root:/root:/bin/sh\n' >"$root/etc/passwd"
-    printf 'root:x:0:\n' >"$root/etc/group"
+    printf 'dhcpcd:x:102:65534::/usr/lib/dhcpcd:/bin/false\n' >>"$root/etc/passwd"
+    printf 'root:x:0:\nnogroup:x:65534:\n' >"$root/etc/group"
     printf '127.0.0.1 localhost appliance\n::1 localhost\n' >"$root/etc/hosts"
     printf 'passwd: files\ngroup: files\nhosts: files\n' >"$root/etc/nsswitch.conf"
     printf 'icmp 1 ICMP\nudp 17 UDP\ntcp 6 TCP\nipv6-icmp 58 IPv6-ICMP\n' >"$root/etc/protocols"
@@ -153,7 +158,7 @@ lab_make_product()
     if lab_is_installed; then
         lab_copy_installed "$root"
     else
-        DESTDIR=$root cmake --install "$lab_release" --prefix /usr >"$lab_build/install.log" ||
+        DESTDIR=$root cmake --install "$lab_release" --strip --prefix /usr >"$lab_build/install.log" ||
             die "cmake --install failed: see $lab_build/install.log"
         lab_build_clients "$root"
     fi

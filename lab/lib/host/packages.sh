@@ -5,7 +5,8 @@
 # Programs of the appliance.
 lab_packages=(
     linux-image-cloud-amd64
-    bash busybox-static coreutils dash fping iproute2 libc-bin util-linux uuid-runtime
+    bash busybox-static coreutils dash dhcpcd-base dnsmasq-base ethtool fping iproute2 libc-bin
+    util-linux uuid-runtime
     openvswitch-common openvswitch-switch
 )
 
@@ -16,11 +17,12 @@ lab_product_packages=(vornovs-host libvornovs1 vornovs-tools)
 # when the image is made.
 lab_packages+=(
     libacl1 libattr1 libbpf1 libbsd0 libc6 libcap-ng0 libcap2 libcom-err2 libdb5.3 libelf1
-    libevent-2.1-7 libgcc-s1 libgcrypt20 libgmp10 libgpg-error0 libgssapi-krb5-2
-    libhogweed6 libk5crypto3 libkeyutils1 libkrb5-3 libkrb5support0 liblz4-1 liblzma5
-    libmd0 libmnl0 libnettle8 libnghttp2-14 libnl-3-200 libnl-route-3-200 libnuma1
-    libpcre2-8-0 libselinux1 libssl3 libstdc++6 libsystemd0 libtinfo6 libtirpc3 libunbound8
-    libuuid1 libxdp1 libxtables12 libzstd1 zlib1g
+    libdbus-1-3 libevent-2.1-7 libgcc-s1 libgcrypt20 libgmp10 libgpg-error0 libidn2-0 libjansson4
+    liblz4-1 liblzma5 libnetfilter-conntrack3 libnfnetlink0 libnftables1 libnftnl11 libsystemd0
+    libudev1 libunistring2 libzstd1 libgssapi-krb5-2 libhogweed6 libk5crypto3 libkeyutils1
+    libkrb5-3 libkrb5support0 libmd0 libmnl0 libnettle8 libnghttp2-14 libnl-3-200
+    libnl-route-3-200 libnuma1 libpcre2-8-0 libselinux1 libssl3 libstdc++6 libtinfo6
+    libtirpc3 libunbound8 libuuid1 libxdp1 libxtables12 zlib1g
 )
 
 # Prints package=version of everything the appliance is made of, as apt offers it now.

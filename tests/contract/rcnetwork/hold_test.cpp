@@ -173,6 +173,32 @@ TEST_F(Hold, TheHolderIsNobodysChildWhereSystemdDoesNotStartIt)
     EXPECT_EQ(RcNetworkOfLibrary({"start"}), (Outcome{0, "", ""}));
 }
 
+TEST_F(Hold, AStartOfTheLibraryIsOneItselfWhereItsWholeServiceCanBeEnded)
+{
+    harness::FakeSystemd systemd;
+    systemd.AddUnit("vornovs-hold@.service");
+    File("eth0", kAfter);
+
+    EXPECT_EQ(RcNetworkOfLibrary({"start", "eth0"}), (Outcome{0, "", ""}));
+    EXPECT_EQ(RcNetwork({"start"}), (Outcome{0, "", ""})) << "an administrator's is none";
+
+    EXPECT_THAT(systemd.Jobs(),
+                testing::ElementsAre(testing::StartsWith("StartUnit vornovs-hold@")));
+    EXPECT_EQ(Network(), kAfterNetwork);
+    EXPECT_EQ(ReadFile(kHoldPath), "(none)");
+}
+
+TEST_F(Hold, AStartOfTheLibraryThatFailsLeavesNoneOfItsOwn)
+{
+    harness::FakeSystemd systemd;
+    systemd.AddUnit("vornovs-hold@.service");
+
+    EXPECT_EQ(RcNetworkOfLibrary({"start", "eth7"}).exitCode, 1);
+
+    EXPECT_THAT(systemd.Jobs(), testing::SizeIs(1));
+    EXPECT_EQ(ReadFile(kHoldPath), "(none)");
+}
+
 TEST_F(Hold, ATokenLeftByAnEarlierBootIsHarmless)
 {
     WriteFile(kHoldPath, "{\"token\": \"1-2-3\", \"names\": []}\n");

@@ -81,14 +81,14 @@ std::optional<std::string> LeaseTextOf(const HostView& host, const Wish& wish)
 }
 
 AdoptedInterface InterfaceOf(const HostView& host, const Hands& hands, const Wish& wish,
-                             const std::map<std::string, std::string>& profiles)
+                             const std::map<std::string, NetworkManagerDevice>& profiles)
 {
     AdoptedInterface interface;
     interface.name = wish.name;
     interface.manager = wish.manager;
     interface.origin = wish.origin;
     if (const auto profile = profiles.find(wish.name); profile != profiles.end()) {
-        interface.profile = profile->second;
+        interface.profile = profile->second.profile;
     }
     const std::string path = FilePathOf(wish.name);
     interface.files.push_back({path, FileTextOf(wish), kReadable, hands.Read(path)});
@@ -128,9 +128,9 @@ void SetUnit(const std::string& unit, bool enabled, Hands& hands)
     }
 }
 
-bool StartNetworkOf(const std::set<std::string>& names, Hands& hands)
+bool RunNetwork(const char* verb, const std::set<std::string>& names, Hands& hands)
 {
-    std::vector<std::string> words{kNetworkProgram, "start"};
+    std::vector<std::string> words{kNetworkProgram, verb};
     words.insert(words.end(), names.begin(), names.end());
     return hands.Run(words);
 }
@@ -178,7 +178,7 @@ void PerformAdoption(const HostView& host, const std::set<std::string>& names,
     }
     SettleSilencers(record, record.NamesIn({Phase::kAdopting, Phase::kAdopted}), hands);
     TakeFromManagers(host, record, names, hands);
-    if (!StartNetworkOf(names, hands)) {
+    if (!RunNetwork("start", names, hands)) {
         throw std::runtime_error("'/etc/rc.network start' failed: see the system log");
     }
 }
@@ -200,8 +200,7 @@ void PerformRelease(const HostView& host, const std::set<std::string>& names,
             RestoreFiles(interface, hands);
         }
     }
-    // Without a file of theirs it lets go of them, and its clients with it.
-    (void)StartNetworkOf(names, hands);
+    (void)RunNetwork("leave", names, hands);
     GiveToManagers(host, record, names, hands);
     std::erase_if(record.interfaces, [&](const AdoptedInterface& interface) {
         return names.contains(interface.name);

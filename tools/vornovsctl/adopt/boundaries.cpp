@@ -20,8 +20,8 @@ constexpr char kSwitchDevice[] = "openvswitch";
 /** Everything that managers say, asked once. */
 struct Managers {
     InterfacesConfig ifupdown;
-    std::map<std::string, std::string> networkd;
-    std::map<std::string, std::string> networkManager;
+    std::map<std::string, NetworkdLink> networkd;
+    std::map<std::string, NetworkManagerDevice> networkManager;
 
     explicit Managers(const HostView& host)
         : ifupdown(ReadInterfaces(host)), networkd(ReadNetworkdLinks(host)),
@@ -62,16 +62,25 @@ Wish WishOf(const HostView& host, const Managers& managers, const std::string& n
                        (profile != managers.networkManager.end() ? 1 : 0);
     Wish wish;
     if (profile != managers.networkManager.end()) {
-        wish = ReadNetworkManager(host, name, profile->second);
+        wish = ReadNetworkManager(host, name, profile->second.profile);
     } else if (network != managers.networkd.end()) {
-        wish = ReadNetworkd(host, name, network->second);
-        if (const std::string obstacle = NetworkFileObstacle(network->second); !obstacle.empty()) {
+        wish = ReadNetworkd(host, name, network->second.file);
+        if (const std::string obstacle = NetworkFileObstacle(network->second.file);
+            !obstacle.empty()) {
             wish.obstacles.push_back(obstacle);
         }
     } else if (byIfupdown) {
         wish = ReadIfupdown(host, managers.ifupdown, name);
     } else {
         wish = ReadUnmanaged(host, name);
+    }
+    const vornhost::Link* const link = host.live.Find(name);
+    const bool settled = (profile == managers.networkManager.end() || profile->second.settled) &&
+                         (network == managers.networkd.end() || network->second.settled);
+    // Without a cable it is never done.
+    if (!settled && link != nullptr && link->carrier) {
+        wish.obstacles.push_back(std::string(NameOf(wish.manager)) +
+                                 " is still bringing it up: try again in a moment");
     }
     if (claims > 1) {
         wish.obstacles.emplace_back("several managers have it in their files: decide on one first");

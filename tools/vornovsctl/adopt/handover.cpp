@@ -3,8 +3,10 @@
 #include "answer.h"
 
 #include <algorithm>
+#include <arpa/inet.h>
 #include <array>
 #include <linux/if_addr.h>
+#include <linux/rtnetlink.h>
 #include <sstream>
 #include <sys/socket.h>
 
@@ -84,37 +86,85 @@ void SetStateLine(const AdoptedInterface& interface, bool up, Hands& hands)
                 kReadable);
 }
 
+/** Whether two addresses are the same up to a length. */
+bool SameNetwork(int family, const std::string& one, const std::string& other, unsigned length)
+{
+    std::array<unsigned char, sizeof(in6_addr)> left{};
+    std::array<unsigned char, sizeof(in6_addr)> right{};
+    if (inet_pton(family, one.c_str(), left.data()) != 1 ||
+        inet_pton(family, other.c_str(), right.data()) != 1) {
+        return false;
+    }
+    for (unsigned bit = 0; bit < length; ++bit) {
+        const unsigned mask = 0x80U >> (bit % 8);
+        if (((left.at(bit / 8) ^ right.at(bit / 8)) & mask) != 0) {
+            return false;
+        }
+    }
+    return true;
+}
+
+/** Whether a destination such as "192.0.2.64/26" is the network of an address of the interface. */
+bool IsOwnNetwork(const HostView& host, const vornhost::Link& link, const std::string& destination)
+{
+    const std::size_t slash = destination.find('/');
+    if (slash == std::string::npos) {
+        return false;
+    }
+    const std::string length = destination.substr(slash + 1);
+    const std::string network = destination.substr(0, slash);
+    return std::any_of(
+        host.live.addresses.begin(), host.live.addresses.end(),
+        [&](const vornhost::Address& address) {
+            return address.index == link.index && (address.flags & IFA_F_NOPREFIXROUTE) != 0 &&
+                   std::to_string(address.prefixLength) == length &&
+                   SameNetwork(address.family, address.local, network, address.prefixLength);
+        });
+}
+
+std::vector<std::string> ReplacementOf(const Json& route, const std::string& family,
+                                       const std::string& name, const char* protocol)
+{
+    std::vector<std::string> words{"ip",
+                                   family,
+                                   "route",
+                                   "replace",
+                                   route.value("dst", ""),
+                                   "dev",
+                                   name,
+                                   "proto",
+                                   protocol,
+                                   "metric",
+                                   std::to_string(route.value("metric", 0U))};
+    if (const std::string source = route.value("prefsrc", ""); !source.empty()) {
+        words.insert(words.end(), {"src", source});
+    }
+    if (family == "-4") {
+        words.insert(words.end(), {"scope", "link"});
+    }
+    return words;
+}
+
 /**
  * NetworkManager makes the routes to an interface's own networks itself and marks them as the
- * kernel's. They are marked as ours, so that they go along when the addresses move.
+ * kernel's. While the interface is ours they are marked as somebody's, so that they go along when
+ * the addresses move.
  */
-void OwnNetworkRoutes(const HostView& host, const std::string& name, Hands& hands)
+void MarkNetworkRoutes(const HostView& host, const std::string& name, const char* from,
+                       const char* to, Hands& hands)
 {
-    for (const char* family : {"-4", "-6"}) {
+    const vornhost::Link* const link = host.live.Find(name);
+    for (const std::string family : {"-4", "-6"}) {
         const auto text =
-            host.run({"ip", "-j", family, "route", "show", "dev", name, "proto", "kernel"});
+            host.run({"ip", "-j", family, "route", "show", "dev", name, "proto", from});
         const Json routes = Json::parse(text.value_or("[]"), nullptr, false);
-        if (!routes.is_array()) {
+        if (!routes.is_array() || link == nullptr) {
             continue;
         }
         for (const Json& route : routes) {
-            const std::string destination = route.value("dst", "");
-            const unsigned metric = route.value("metric", 0U);
-            // The kernel's own have its own metrics.
-            const bool ofKernel = metric == 0 || metric == 256 || destination.starts_with("fe80:");
-            if (destination.empty() || ofKernel) {
-                continue;
+            if (!route.contains("gateway") && IsOwnNetwork(host, *link, route.value("dst", ""))) {
+                (void)hands.Run(ReplacementOf(route, family, name, to));
             }
-            std::vector<std::string> words{
-                "ip", family,  "route",  "replace", destination,           "dev",
-                name, "proto", "static", "metric",  std::to_string(metric)};
-            if (const std::string source = route.value("prefsrc", ""); !source.empty()) {
-                words.insert(words.end(), {"src", source});
-            }
-            if (family[1] == '4') {
-                words.insert(words.end(), {"scope", "link"});
-            }
-            (void)hands.Run(words);
         }
     }
 }
@@ -167,6 +217,7 @@ void GiveToNetworkManager(const HostView& host, const AdoptionRecord& record,
         const vornhost::Link* const link = host.live.Find(interface.name);
         if (interface.manager == Manager::kNetworkManager && names.contains(interface.name) &&
             link != nullptr && !interface.profile.empty()) {
+            MarkNetworkRoutes(host, interface.name, "static", "kernel", hands);
             const bool made = link->kind == "bond" || link->kind == "vlan";
             hands.Write("/run/NetworkManager/devices/" + std::to_string(link->index),
                         "[device]\nmanaged=true\nconnection-uuid=" + interface.profile +
@@ -226,7 +277,7 @@ void TakeFromManagers(const HostView& host, const AdoptionRecord& record,
     RestartDaemons(host, record, names, hands);
     for (const AdoptedInterface& interface : record.interfaces) {
         if (names.contains(interface.name) && interface.manager == Manager::kNetworkManager) {
-            OwnNetworkRoutes(host, interface.name, hands);
+            MarkNetworkRoutes(host, interface.name, "kernel", "static", hands);
         }
     }
 }

@@ -61,6 +61,17 @@ bool IsFromRouter(const vornhost::Address& address)
            (address.flags & IFA_F_TEMPORARY) == 0;
 }
 
+bool HasAddressOfServer(const HostView& host, const vornhost::Link& link)
+{
+    return std::any_of(host.live.addresses.begin(), host.live.addresses.end(),
+                       [&](const vornhost::Address& address) {
+                           return address.index == link.index && address.family == AF_INET6 &&
+                                  address.scope == RT_SCOPE_UNIVERSE &&
+                                  address.prefixLength == 128 &&
+                                  (address.flags & IFA_F_PERMANENT) == 0;
+                       });
+}
+
 void ReadIdentifiers(const HostView& host, const vornhost::Link& link, Wish& wish)
 {
     const auto ofMac = IdentifierOfMac(link.mac);
@@ -75,6 +86,11 @@ void ReadIdentifiers(const HostView& host, const vornhost::Link& link, Wish& wis
         } else if (IsFromRouter(address)) {
             wish.token = TextOf(*identifier);
         }
+    }
+    // The client makes identifiers of the MAC only, so the kernel has to hear the routers, and the
+    // client has to be told that there is a server.
+    if (!wish.token.empty() && wish.autoconf == true && HasAddressOfServer(host, link)) {
+        wish.dhcp6 = wish.dhcp6.value_or(true);
     }
 }
 

@@ -120,9 +120,9 @@ void ReadState(const HostView& host, Wish& wish)
 
 } // namespace
 
-std::map<std::string, std::string> ReadNetworkdLinks(const HostView& host)
+std::map<std::string, NetworkdLink> ReadNetworkdLinks(const HostView& host)
 {
-    std::map<std::string, std::string> managed;
+    std::map<std::string, NetworkdLink> managed;
     const auto text = host.run({"networkctl", "--json=short", "list"});
     if (!text) {
         return managed;
@@ -135,7 +135,7 @@ std::map<std::string, std::string> ReadNetworkdLinks(const HostView& host)
         const std::string state = link.value("AdministrativeState", "");
         const std::string file = link.value("NetworkFile", "");
         if (state != "unmanaged" && !file.empty()) {
-            managed[link.value("Name", "")] = file;
+            managed[link.value("Name", "")] = {file, state != "configuring" && state != "pending"};
         }
     }
     return managed;

@@ -13,8 +13,14 @@
 
 namespace vornovsctl {
 
-/** The interfaces that it manages, with the file that says how. */
-std::map<std::string, std::string> ReadNetworkdLinks(const HostView& host);
+/** How far it is with an interface, and the file that says what to do. */
+struct NetworkdLink {
+    std::string file;
+    bool settled = false;
+};
+
+/** The interfaces that it manages. */
+std::map<std::string, NetworkdLink> ReadNetworkdLinks(const HostView& host);
 
 /** @return the file and what is dropped in beside it, in the order in which they count. */
 std::vector<std::string> FilesOfNetwork(const HostView& host, const std::string& networkFile);

@@ -318,20 +318,21 @@ void ReadOptions(const HostView& host, Wish& wish)
 
 } // namespace
 
-std::map<std::string, std::string> ReadNetworkManagerDevices(const HostView& host)
+std::map<std::string, NetworkManagerDevice> ReadNetworkManagerDevices(const HostView& host)
 {
-    std::map<std::string, std::string> devices;
+    std::map<std::string, NetworkManagerDevice> devices;
     const auto text =
         host.run({"nmcli", "-t", "-e", "yes", "-f", "DEVICE,STATE,CON-UUID", "device"});
     std::istringstream stream(text.value_or(""));
     for (std::string line; std::getline(stream, line);) {
         const std::vector<std::string> fields = FieldsOf(line);
-        const bool active =
-            fields.size() == 3 &&
-            (fields[1] == "connected" || fields[1].starts_with("connecting (") ||
-             fields[1] == "connected (site only)" || fields[1] == "connected (local only)");
-        if (active && fields[1].find("externally") == std::string::npos && !fields[2].empty()) {
-            devices[fields[0]] = fields[2];
+        if (fields.size() != 3 || fields[2].empty() ||
+            fields[1].find("externally") != std::string::npos) {
+            continue;
+        }
+        const bool settled = fields[1].starts_with("connected");
+        if (settled || fields[1].starts_with("connecting")) {
+            devices[fields[0]] = {fields[2], settled};
         }
     }
     return devices;

@@ -12,8 +12,14 @@
 
 namespace vornovsctl {
 
-/** The interfaces that it manages, with the UUID of the profile that says how. */
-std::map<std::string, std::string> ReadNetworkManagerDevices(const HostView& host);
+/** How far it is with an interface, and the UUID of the profile that says what to do. */
+struct NetworkManagerDevice {
+    std::string profile;
+    bool settled = false;
+};
+
+/** The interfaces that it manages. */
+std::map<std::string, NetworkManagerDevice> ReadNetworkManagerDevices(const HostView& host);
 
 /** @return the wish for one interface, with obstacles where it cannot be carried over. */
 Wish ReadNetworkManager(const HostView& host, const std::string& name, const std::string& uuid);

@@ -1,0 +1,57 @@
+# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
+# A host with systemd whose network has been ours since it was installed.
+
+# Installs the packages and has the network start with the machine, for the files that are there.
+boots_install()
+{
+    step "Install"
+    packages_install vornovs-host vornovs-tools
+    expect_success systemctl enable --now vornovs-network.service
+    expect_answers
+}
+
+# The addresses of the topology's files, without their lengths.
+boots_addresses()
+{
+    sed -n -E 's/^(IPADDR[0-9]*|IPV6ADDR|IPV6ADDR_SECONDARIES)="?([^"]*)"?$/\2/p' \
+        /lab/topology/host"$lab_ifcfg"* | tr ' ' '\n' | sed 's,/.*,,'
+}
+
+address_answers()
+{
+    in_outside fping -q -r 0 -t 200 "$1"
+}
+
+# Every address of the topology's files answers the outside, wherever it is now.
+expect_answers()
+{
+    local address
+    for address in $(boots_addresses); do
+        wait_until 100 address_answers "$address"
+    done
+}
+
+expect_active()
+{
+    local unit
+    for unit in "$@"; do
+        expect_equal "$unit" active "$(systemctl is-active "$unit" || true)"
+    done
+}
+
+unit_is()
+{
+    [ "$(systemctl is-active "$1")" = "$2" ]
+}
+
+# unit_of PROCESS-NAME: the unit whose process it is.
+unit_of()
+{
+    basename "$(cut -d: -f3 "/proc/$(processes_named "$1" | head -n 1)/cgroup")"
+}
+
+# logged WORDS: whether the network program has said so since this boot.
+logged()
+{
+    journalctl -b -q --no-pager -t rc.network | grep -q -- "$1"
+}

@@ -23,6 +23,7 @@ namespace vornhost {
 namespace {
 
 constexpr char kIpTool[] = "/bin/ip";
+constexpr char kCardTool[] = "/sbin/ethtool";
 constexpr char kModuleTool[] = "/sbin/modprobe";
 constexpr char kBondingLoaded[] = "/sys/class/net/bonding_masters";
 constexpr std::chrono::seconds kToolDeadline{15};
@@ -89,6 +90,8 @@ private:
     bool WaitForBridges(const Stage& stage);
     bool WriteSettings(const Stage& stage);
     void AnnounceAll(const Stage& stage);
+    void SetCards(const Stage& stage);
+    void TellResolver(const Stage& stage);
     bool ManageClients(const Stage& stage);
     bool ManageClient(const std::string& line);
     void WaitForAll(const Stage& stage);
@@ -229,6 +232,34 @@ void Applier::AnnounceAll(const Stage& stage)
     }
 }
 
+/** What a card refuses is said and passed over: the host is reachable without it. */
+void Applier::SetCards(const Stage& stage)
+{
+    for (const std::string& line : stage.lines) {
+        const auto words = Words(line);
+        std::vector<std::string> command{kCardTool, words.at(1), words.at(0)};
+        command.insert(command.end(), words.begin() + 2, words.end());
+        ProcessResult result;
+        if (!Program(command, kToolDeadline, "", result)) {
+            (void)Fail("ethtool failed for " + line + ": " + OneLine(result.errors));
+        }
+    }
+}
+
+void Applier::TellResolver(const Stage& stage)
+{
+    for (const std::string& line : stage.lines) {
+        const auto words = Words(line);
+        NameServers told;
+        for (size_t i = 2; i + 1 < words.size(); i += 2) {
+            (words[i] == "server" ? told.servers : told.domains).push_back(words[i + 1]);
+        }
+        if (!TellNameServers(words.at(1), told)) {
+            (void)Fail("cannot change who resolves names: " + line);
+        }
+    }
+}
+
 bool Applier::ManageClient(const std::string& line)
 {
     const auto words = Words(line.substr(0, line.find(": ")));
@@ -300,6 +331,12 @@ bool Applier::Run(const Stage& stage)
         return RunBatch(stage);
     case StageKind::kAnnounce:
         AnnounceAll(stage);
+        return true;
+    case StageKind::kCards:
+        SetCards(stage);
+        return true;
+    case StageKind::kResolver:
+        TellResolver(stage);
         return true;
     case StageKind::kClients:
         return ManageClients(stage);

@@ -263,6 +263,24 @@ void ForgetFiles(const std::string& interface)
     }
 }
 
+std::string Joined(const std::vector<std::string>& words)
+{
+    std::string text;
+    for (const std::string& word : words) {
+        text += (text.empty() ? "" : " ") + word;
+    }
+    return text;
+}
+
+bool RunEvent(const std::vector<std::string>& event)
+{
+    ProcessOptions options;
+    options.deadline = kUnitDeadline;
+    options.environment = ToolEnvironment();
+    options.environment.insert(options.environment.end(), event.begin(), event.end());
+    return RunProcess({kEventProgram}, options).Succeeded();
+}
+
 } // namespace
 
 std::map<std::string, LiveClient> ReadClients()
@@ -316,16 +334,25 @@ bool EndClient(const std::string& interface, std::string& error)
     return EndProcesses(leader) || (error = "it does not end", false);
 }
 
+bool TellNameServers(const std::string& interface, const NameServers& told)
+{
+    if (told.servers.empty() && told.domains.empty()) {
+        return RunEvent({"interface=" + interface, "reason=FORGET", "protocols=conf"});
+    }
+    // The metric puts them before those of servers and routers.
+    return RunEvent({"interface=" + interface, "reason=STATIC", "protocol=conf", "ifmetric=0",
+                     "if_configured=true", "if_up=true", "if_down=false",
+                     "new_domain_name_servers=" + Joined(told.servers),
+                     "new_domain_search=" + Joined(told.domains)});
+}
+
 bool DropClient(const std::string& interface, std::string& error)
 {
     if (!EndClient(interface, error)) {
         return false;
     }
-    ProcessOptions options;
-    options.environment = ToolEnvironment();
-    options.environment.push_back("interface=" + interface);
-    options.environment.emplace_back("reason=FORGET");
-    (void)RunProcess({kEventProgram}, options); // name servers too many do no harm
+    // Name servers too many do no harm.
+    (void)RunEvent({"interface=" + interface, "reason=FORGET", "protocols=dhcp dhcp6 ra"});
     ForgetFiles(interface);
     return true;
 }

@@ -31,6 +31,15 @@ bool EndClient(const std::string& interface, std::string& error);
 /** Ends a client that has no follower: name servers that it told of are forgotten. */
 bool DropClient(const std::string& interface, std::string& error);
 
+/** Who resolves names, and in which domains they are looked for. */
+struct NameServers {
+    std::vector<std::string> servers;
+    std::vector<std::string> domains;
+};
+
+/** Tells what a file says of an interface the way clients tell it; nothing at all is forgotten. */
+bool TellNameServers(const std::string& interface, const NameServers& told);
+
 } // namespace vornhost
 
 #endif

@@ -43,7 +43,10 @@ InterfaceRecord Both(const InterfaceRecord& former, const InterfaceRecord& next)
     both.broughtUp = former.broughtUp || next.broughtUp;
     both.formerMtu = former.formerMtu ? former.formerMtu : next.formerMtu;
     both.tag = next.tag ? next.tag : former.tag;
+    both.ownSettings.insert(next.ownSettings.begin(), next.ownSettings.end());
     both.client = former.client || next.client;
+    both.resolver = next.resolver.empty() ? former.resolver : next.resolver;
+    both.linkCommands = former.linkCommands;
     return both;
 }
 
@@ -78,6 +81,7 @@ void AddStages(const Steps& steps, Plan& plan)
     // A client would put back what is taken away.
     AddStage(plan, StageKind::kClients, "end clients", steps.endClients);
     AddStage(plan, StageKind::kSettings, "settings before", steps.settingsBefore);
+    AddStage(plan, StageKind::kCards, "cards", steps.cards);
     AddStage(plan, StageKind::kBatch, "build beside", steps.beside.Lines());
     std::vector<std::string> joinAndLeave = Once(steps.leave);
     joinAndLeave.insert(joinAndLeave.end(), steps.join.begin(), steps.join.end());
@@ -91,6 +95,8 @@ void AddStages(const Steps& steps, Plan& plan)
     AddStage(plan, StageKind::kReady, "wait for members", steps.readyAfter);
     AddStage(plan, StageKind::kBatch, "put in order", steps.order.Lines());
     AddStage(plan, StageKind::kSettings, "settings after", steps.settingsAfter);
+    AddStage(plan, StageKind::kBatch, "finish", steps.finish.Lines());
+    AddStage(plan, StageKind::kResolver, "resolver", steps.resolver);
     AddStage(plan, StageKind::kReady, "wait for partners", steps.negotiate);
     AddStage(plan, StageKind::kClients, "start clients", steps.startClients);
     AddStage(plan, StageKind::kGateways, "forget gateways", steps.forgetGateways);

@@ -70,6 +70,8 @@ enum class StageKind {
     kSettings, ///< "INTERFACE SETTING VALUE"
     kBatch,    ///< Lines of one "ip -batch".
     kAnnounce, ///< "INTERFACE" whose place the network outside is told.
+    kCards,    ///< "INTERFACE OPTION SETTING...", of ethtool.
+    kResolver, ///< "tell NAME server ADDRESS... domain DOMAIN..." or "forget NAME".
     kClients,  ///< "end NAME", "drop NAME" or "start NAME of NAME,NAME: OPTION; OPTION".
     kReady,    ///< "KIND NAME..." that is waited for as long as that makes sense.
     kGateways  ///< "INTERFACE" whose gateway records are dropped.

@@ -105,12 +105,40 @@ void RoutePlanner::AddWantedDefault(const Unit& unit, int family, std::vector<Ro
     routes.push_back(std::move(route));
 }
 
+/** Whether the unit has the address, now or as its file asks. */
+bool RoutePlanner::HasAddress(const Unit& unit, const std::string& local) const
+{
+    const auto& wanted = unit.file->addresses;
+    const auto& live = m_inputs.live.addresses;
+    return std::any_of(wanted.begin(), wanted.end(),
+                       [&](const WantedAddress& each) { return each.local == local; }) ||
+           std::any_of(live.begin(), live.end(), [&](const Address& each) {
+               return UnitOf(each.index) == &unit && each.local == local;
+           });
+}
+
+/** A route from an address that is not there yet has to wait for it. */
+void RoutePlanner::AddStaticRoutes(const Unit& unit, std::vector<Route>& routes) const
+{
+    for (Route route : unit.file->routes) {
+        if (!route.source.empty() && !HasAddress(unit, route.source)) {
+            continue;
+        }
+        for (NextHop& hop : route.nextHops) {
+            hop.onLink = hop.onLink ||
+                         (!hop.gateway.empty() && !IsOnLink(unit, hop.gatewayFamily, hop.gateway));
+        }
+        routes.push_back(route);
+    }
+}
+
 std::vector<Route> RoutePlanner::WantedRoutes(const Unit& unit) const
 {
     std::vector<Route> routes;
     if (unit.file != nullptr) {
         AddWantedDefault(unit, AF_INET, routes);
         AddWantedDefault(unit, AF_INET6, routes);
+        AddStaticRoutes(unit, routes);
     }
     return routes;
 }
@@ -280,6 +308,13 @@ void RoutePlanner::PlanLiveRoute(const Route& route)
     if (unit == nullptr && route.nextHops.size() == 1) {
         unit = UnitOf(route.nextHops[0].index);
     }
+    if (route.nextHops.empty()) {
+        if (std::any_of(m_units.begin(), m_units.end(),
+                        [&](const Unit& each) { return IsUnwanted(each, route); })) {
+            RemoveRoute(route);
+        }
+        return;
+    }
     if (unit == nullptr) {
         RestoreRoute(route);
         return;
@@ -325,7 +360,8 @@ void RoutePlanner::MakeWantedRoute(const Unit& unit, const Route& wanted)
     const auto& all = m_inputs.live.routes;
     bool slotIsElsewhere = false;
     for (const Route& live : all) {
-        const bool here = HasHopOn(live, unit.carrierLink) || HasHopOnSource(live, unit);
+        const bool here = HasHopOn(live, unit.carrierLink) || HasHopOnSource(live, unit) ||
+                          (live.nextHops.empty() && wanted.nextHops.empty());
         if (here && RouteKeyText(live) == RouteKeyText(wanted)) {
             return;
         }

@@ -23,6 +23,8 @@ public:
 private:
     std::vector<Route> WantedRoutes(const Unit& unit) const;
     void AddWantedDefault(const Unit& unit, int family, std::vector<Route>& routes) const;
+    void AddStaticRoutes(const Unit& unit, std::vector<Route>& routes) const;
+    bool HasAddress(const Unit& unit, const std::string& local) const;
     bool IsOnLink(const Unit& unit, int family, const std::string& gateway) const;
     const Unit* UnitOf(int index) const;
     const Unit* SourceUnitOf(const Route& route) const;

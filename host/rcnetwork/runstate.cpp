@@ -23,6 +23,9 @@ InterfaceRecord ReadRecord(const Json& object)
     record.broughtUp = object.at("broughtUp").get<bool>();
     record.made = object.value("made", false);
     record.client = object.value("client", false);
+    record.ownSettings = object.value("ownSettings", record.ownSettings);
+    record.resolver = object.value("resolver", "");
+    record.linkCommands = object.value("linkCommands", "");
     record.ownMac = object.value("ownMac", "");
     record.formerMtu = ReadNumber(object, "formerMtu");
     record.tag = ReadNumber(object, "tag");
@@ -43,6 +46,15 @@ Json WriteRecord(const InterfaceRecord& record)
     if (record.client) {
         object["client"] = true;
     }
+    if (!record.ownSettings.empty()) {
+        object["ownSettings"] = record.ownSettings;
+    }
+    if (!record.resolver.empty()) {
+        object["resolver"] = record.resolver;
+    }
+    if (!record.linkCommands.empty()) {
+        object["linkCommands"] = record.linkCommands;
+    }
     if (!record.ownMac.empty()) {
         object["ownMac"] = record.ownMac;
     }
@@ -60,7 +72,8 @@ Json WriteRecord(const InterfaceRecord& record)
 bool InterfaceRecord::Empty() const
 {
     return addresses.empty() && routes.empty() && unchecked.empty() && !broughtUp && !made &&
-           !client && ownMac.empty() && !formerMtu && !tag && formerSettings.empty();
+           !client && resolver.empty() && linkCommands.empty() && ownMac.empty() && !formerMtu &&
+           !tag && formerSettings.empty() && ownSettings.empty();
 }
 
 RunState ParseRunState(const std::string& text)

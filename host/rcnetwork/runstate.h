@@ -24,10 +24,15 @@ struct InterfaceRecord {
     bool made = false;      ///< The link itself: a bond, a VLAN.
     bool client = false;    ///< A DHCP client, and so what that put there.
     std::optional<unsigned> formerMtu;
+    std::string resolver;        ///< The interface under whose name servers were told of, and they.
+    std::string linkCommands;    ///< What was set on the card.
     std::string ownMac;          ///< Of an interface that has its bond's address.
     std::optional<unsigned> tag; ///< The VLAN tag that was set on the bridge's port.
     /** Settings of the plain interface as they were, by name, such as "ipv6.conf.accept_ra". */
     std::map<std::string, std::string> formerSettings;
+
+    /** Settings of an interface that carries something for a bond, as they were before that. */
+    std::map<std::string, std::string> ownSettings;
 
     bool operator==(const InterfaceRecord&) const = default;
     /** Whether nothing was made. */

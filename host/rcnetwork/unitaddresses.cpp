@@ -48,10 +48,7 @@ const Address* UnitPlanner::FindOn(const Link* link, const Address& like) const
 
 bool UnitPlanner::IsWanted(const Address& address) const
 {
-    if (m_unit.file == nullptr) {
-        return false;
-    }
-    const auto& wanted = m_unit.file->addresses;
+    const auto wanted = WantedAddresses();
     return std::any_of(wanted.begin(), wanted.end(), [&](const WantedAddress& each) {
         return each.family == address.family && WantedText(each) == AddressText(address);
     });
@@ -211,7 +208,7 @@ void UnitPlanner::PlanAddresses()
 {
     CarryAddresses();
     if (m_unit.removeUnwanted && m_unit.file != nullptr) {
-        const auto& wanted = m_unit.file->addresses;
+        const auto wanted = WantedAddresses();
         std::erase_if(m_record.addresses, [&](const std::string& text) {
             return std::none_of(wanted.begin(), wanted.end(), [&](const WantedAddress& each) {
                 return WantedText(each) == text;
@@ -219,7 +216,7 @@ void UnitPlanner::PlanAddresses()
         });
     }
     if (m_unit.addWanted && m_unit.file != nullptr) {
-        for (const WantedAddress& wanted : m_unit.file->addresses) {
+        for (const WantedAddress& wanted : WantedAddresses()) {
             AddWantedAddress(wanted);
         }
     }

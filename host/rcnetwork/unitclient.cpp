@@ -215,10 +215,14 @@ void UnitPlanner::PlanClient()
     if (m_unit.file != nullptr) {
         CheckMetrics();
     }
-    // The client had turned off that the kernel makes the link-local address.
+    // Who made the link-local address had turned off that the kernel does.
     const std::string mode = Live(kNewInterface, kAddressMode);
-    if (m_former.client && wanted.empty() && m_unit.removeUnwanted && !mode.empty() &&
-        Live(Carrier(), kAddressMode) == kAddressModeNone && mode != kAddressModeNone) {
+    const bool hadOwn =
+        std::any_of(m_former.addresses.begin(), m_former.addresses.end(),
+                    [](const std::string& address) { return address.rfind("fe80:", 0) == 0; });
+    if ((m_former.client || hadOwn) && !HasOwnLinkLocal() && m_unit.removeUnwanted &&
+        !mode.empty() && Live(Carrier(), kAddressMode) == kAddressModeNone &&
+        mode != kAddressModeNone) {
         Set(m_steps.settingsAfter, Carrier(), kAddressMode, mode);
     }
     m_record.client = !wanted.empty();

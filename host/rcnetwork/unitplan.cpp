@@ -52,6 +52,7 @@ void UnitPlanner::AbsorbRecords()
         m_former.routes.insert(other.routes.begin(), other.routes.end());
         m_former.unchecked.insert(other.unchecked.begin(), other.unchecked.end());
         m_former.client = m_former.client || other.client;
+        m_former.resolver = m_former.resolver.empty() ? other.resolver : m_former.resolver;
     }
 }
 
@@ -65,6 +66,7 @@ void UnitPlanner::KeepRecordsOfOthers()
         record.routes.clear();
         record.unchecked.clear();
         record.client = false;
+        record.resolver.clear();
         const bool gone = std::find(members.begin(), members.end(), name) == members.end();
         m_steps.records[name] = gone ? InterfaceRecord() : record;
     }
@@ -115,8 +117,11 @@ void UnitPlanner::Run()
         MoveIpv6Stack();
     }
     SilencePorts();
+    ReturnSettings();
     PlanAutoconf();
     PlanAddresses();
+    PlanCards();
+    PlanResolver();
     PlanClient();
     if (m_moves) {
         CarryNeighbours();

@@ -43,6 +43,7 @@ struct Steps {
     std::vector<std::string> readyBefore;
     std::vector<std::string> endClients;
     std::vector<std::string> settingsBefore;
+    std::vector<std::string> cards;
     BatchParts beside;      ///< Made while traffic still takes its former way.
     BatchParts replacement; ///< Devices that have settings and can be made late only.
     std::vector<std::string> replacementSettings;
@@ -55,6 +56,8 @@ struct Steps {
     std::vector<std::string> readyAfter;
     BatchParts order; ///< Members that join anew, because of their order.
     std::vector<std::string> settingsAfter;
+    BatchParts finish; ///< What needs those settings.
+    std::vector<std::string> resolver;
     std::vector<std::string> negotiate;
     std::vector<std::string> startClients;
     std::vector<std::string> forgetGateways;
@@ -135,14 +138,27 @@ private:
     bool IsReleased(const Link& link) const;
     std::vector<std::string>& Settings() const;
     void CarrySettings();
+    void KeepOwnSetting(const std::string& setting);
+    void ReturnSettings();
     void MoveIpv6Stack();
     void SilencePorts();
     void SilencePort(const Link& port);
     void SilenceMember(const Link& member);
     void RestorePort(const std::string& name);
-    void PlanAutoconf();
     void Set(std::vector<std::string>& stage, const std::string& interface,
              const std::string& setting, const std::string& value) const;
+
+    // unitidentity.cpp: how addresses are made of what routers say
+    void PlanAutoconf();
+    void PlanLinkLocal();
+    void WantSetting(const std::string& setting, const std::string& wanted);
+    std::vector<WantedAddress> WantedAddresses() const;
+    bool HasOwnLinkLocal() const;
+
+    // unitcard.cpp, unitresolver.cpp: what stays with a card, and who resolves names
+    void PlanCards();
+    void PlanCard(const Link& link);
+    void PlanResolver();
 
     // unitaddresses.cpp: addresses and neighbours
     void PlanAddresses();

@@ -127,6 +127,31 @@ std::vector<std::string>& UnitPlanner::Settings() const
     return madeLate ? m_steps.settingsAfter : m_steps.settingsBefore;
 }
 
+/** A member that carries the addressing for its bond is to be a mere member again. */
+void UnitPlanner::KeepOwnSetting(const std::string& setting)
+{
+    const std::string own = Live(Carrier(), setting);
+    const bool client = setting == kAddressMode && HasOwnLinkLocal();
+    if (!ToSwitch() && Carrier() == m_unit.name && m_unit.carrierLink != nullptr &&
+        !m_unit.IsGroup() && !own.empty() && (client || !HasOwnWay(setting)) &&
+        own != Live(MainSource(), setting)) {
+        m_record.ownSettings.emplace(setting, own);
+    }
+}
+
+void UnitPlanner::ReturnSettings()
+{
+    for (const Link* member : m_unit.members) {
+        InterfaceRecord& record = m_steps.records[member->name];
+        for (const auto& [setting, own] : record.ownSettings) {
+            if (Live(member->name, setting) != own) {
+                Set(m_steps.settingsAfter, member->name, setting, own);
+            }
+        }
+        record.ownSettings.clear();
+    }
+}
+
 /** Whatever an administrator set on the one goes to the other: forwarding, filters, timers. */
 void UnitPlanner::CarrySettings()
 {
@@ -136,6 +161,7 @@ void UnitPlanner::CarrySettings()
     }
     const std::string former = m_unit.carrierLink == nullptr ? kNewInterface : Carrier();
     for (const auto& [setting, value] : settings->second) {
+        KeepOwnSetting(setting);
         if (m_quiet && setting == kAcceptRouters) {
             if (value != "0") {
                 Set(m_steps.settingsAfter, Carrier(), setting, value);
@@ -168,7 +194,7 @@ void UnitPlanner::MoveIpv6Stack()
     if (Live(former, kDisableIpv6) != off) {
         Set(Settings(), Carrier(), kDisableIpv6, off);
     }
-    if ((mode != kAddressModeNone || off != "0") && !ClientHasIpv6()) {
+    if ((mode != kAddressModeNone || off != "0") && !HasOwnLinkLocal()) {
         Set(m_steps.settingsAfter, Carrier(), kAddressMode, mode);
     }
     if (Carrier() == m_unit.name) {
@@ -223,7 +249,7 @@ void UnitPlanner::SilencePort(const Link& port)
         Set(m_steps.settingsAfter, port.name, kDisableIpv6, "1");
     }
     const auto mode = record.formerSettings.find(kAddressMode);
-    if (!moves && mode != record.formerSettings.end() && !ClientHasIpv6() &&
+    if (!moves && mode != record.formerSettings.end() && !HasOwnLinkLocal() &&
         Live(m_unit.bridge, kAddressMode) == kAddressModeNone && mode->second != kAddressModeNone &&
         port.name == m_unit.port->name) {
         Set(m_steps.settingsAfter, m_unit.bridge, kAddressMode, mode->second);
@@ -253,26 +279,6 @@ void UnitPlanner::RestorePort(const std::string& name)
             }
             record.formerSettings.erase(former);
         }
-    }
-}
-
-void UnitPlanner::PlanAutoconf()
-{
-    if (!m_unit.addWanted || !m_unit.file->autoconf) {
-        return;
-    }
-    // Either the kernel hears routers or the client does.
-    const bool kernel = *m_unit.file->autoconf && !m_unit.file->ClientHearsRouters();
-    const std::string wanted = kernel ? "1" : "0";
-    for (const char* setting : {kAcceptRouters, "ipv6.conf.autoconf"}) {
-        // While the interface moves, the target is about to have what the source has.
-        const bool follows = m_moves && m_unit.MainSource() != nullptr;
-        const std::string live = Live(follows ? MainSource() : Carrier(), setting);
-        if (live.empty() || live == wanted || (wanted == "1" && live == "2")) {
-            continue;
-        }
-        Set(m_steps.settingsAfter, Carrier(), setting, wanted);
-        m_record.formerSettings.emplace(setting, live);
     }
 }
 

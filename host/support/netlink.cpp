@@ -13,6 +13,7 @@
 #include <netlink/msg.h>
 #include <netlink/netlink.h>
 #include <netlink/route/link.h>
+#include <netlink/route/link/inet6.h>
 #include <netlink/route/link/vlan.h>
 #include <netlink/socket.h>
 
@@ -330,6 +331,12 @@ Link ReadLink(rtnl_link* object)
     link.kind = kind == nullptr ? "" : kind;
     link.master = rtnl_link_get_master(object);
     link.parent = rtnl_link_get_link(object);
+    nl_addr* token = nullptr;
+    if (rtnl_link_inet6_get_token(object, &token) == 0 && token != nullptr) {
+        const std::string text = IpText(AF_INET6, nl_addr_get_binary_addr(token));
+        link.token = text == "::" ? std::string() : text;
+        nl_addr_put(token);
+    }
     if (rtnl_link_is_vlan(object) != 0) {
         link.vlanId = rtnl_link_vlan_get_id(object);
         link.vlanProtocol = ntohs(static_cast<std::uint16_t>(rtnl_link_vlan_get_protocol(object)));

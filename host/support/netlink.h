@@ -26,6 +26,7 @@ struct Link {
     int master = 0;    ///< Index of the bridge, bond or switch that it is a port of.
     int parent = 0;    ///< Index of the interface that it stands on (VLANs), or its peer (veth).
     int vlanId = -1;   ///< The tag, for the kind "vlan" only.
+    std::string token; ///< The lower half of IPv6 addresses, where it was set.
     unsigned vlanProtocol = 0; ///< What its tags are of, ETH_P_8021Q or another.
 };
 

@@ -58,4 +58,4 @@ wait_until 30 served_as_asked eth0
 pause 15
 topology_ready
 expect_plain started
-expect_one_client
+expect_equal "requests for a new lease" 1 "$(grep -c DHCPDISCOVER "$lab_servers_log")"

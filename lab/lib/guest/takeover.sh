@@ -76,7 +76,7 @@ remember_managed()
     resolver_settings >"$lab_out/managed-resolver"
     show <"$lab_out/managed-resolver"
     servers_leases >"$lab_out/managed-leases"
-    for interface in $(ls /sys/class/net); do
+    for interface in $(ip -brief link show | sed 's/[@ ].*//'); do
         cat "/sys/class/net/$interface/address" >"$lab_out/managed-mac-$interface"
     done
     snapshot managed

@@ -12,17 +12,14 @@ lab_case_machine()
     fi
 }
 
-# True when one of the cases is for the machine: MACHINE CASE...
-lab_any_case_for()
+# The disk that a case begins with: fresh or ready; empty for a machine without.
+lab_case_disk()
 {
-    local machine=$1 name
-    shift
-    for name in "$@"; do
-        if [[ $(lab_case_machine "$name") == "$machine" ]]; then
-            return 0
-        fi
-    done
-    return 1
+    if [[ -e $lab_source/cases/$1/fresh ]]; then
+        echo fresh
+    elif [[ $(lab_case_machine "$1") == systemd ]]; then
+        echo ready
+    fi
 }
 
 # lab_case_names MACHINE DAILY: the cases for a machine (empty: all). With DAILY "daily" a case for
@@ -85,9 +82,10 @@ lab_run_guest()
     local name=$1 machine=$2 topology=$3 results=$lab_results/$1 lines deadline left boots=0
     # The deadline is of this machine's time: it ends a guest whose own clock may stand still.
     deadline=$(($(date +%s) + $(lab_case_deadline "$name")))
-    lab_make_guest_image "$results/guest.cpio" "$machine" "$topology" "$lab_source/cases/$name"
+    lab_make_guest_image "$results/guest.cpio" "$machine" "$topology" \
+        "$lab_source/cases/$name" ''
     if [[ $machine == systemd ]]; then
-        lab_make_guest_disk "$results/disk"
+        lab_make_guest_disk "$results/disk" "$(lab_case_disk "$name")"
     fi
     mapfile -t lines < <(lab_line "$results/console"; lab_line "$results/report";
         lab_line "$results/results.tar")

@@ -1,7 +1,9 @@
 # shellcheck shell=bash disable=SC2154,SC2034 # variables that the lab's files share
 # The disk of the machine with systemd: Debian from its packages, as an installation leaves it.
 #   base.tar     what mmdebstrap makes of the packages below
-#   base.ext4    the same as a file system, with the lab's settings; no guest ever writes to it
+#   fresh.ext4   the same as a file system, with the lab's settings; no guest ever writes to it
+#   ready.ext4   that with what this repository's packages need of Debian's, which would take the
+#                guest longer to install than the rest of a case
 
 # What a host has before this repository's packages come: every network manager, none in charge.
 lab_disk_packages=(
@@ -10,34 +12,35 @@ lab_disk_packages=(
     iproute2 iputils-ping ethtool fping dnsmasq-base tcpdump
 )
 
-# What the repository's packages need besides, offered to the guest's apt as a folder of packages.
-lab_offered_packages=(
-    openvswitch-switch dhcpcd-base openresolv systemd-resolved uuid-runtime
-    libnl-3-200 libnl-route-3-200 libsystemd0 libstdc++6
+# What the repository's packages need besides.
+lab_needed_packages=(
+    openvswitch-switch dhcpcd-base openresolv libnl-3-200 libnl-route-3-200 libsystemd0 libstdc++6
 )
 
-# Sets $lab_disk; makes the disk unless it was made of the same things.
-lab_make_disk()
+# What the guest's apt is offered as a folder of packages.
+lab_offered_packages=("${lab_needed_packages[@]}" systemd-resolved)
+
+# lab_make_disks KIND...: sets $lab_disk_fresh and $lab_disk_ready, and makes the named ones of them
+# unless they were made of the same things.
+lab_make_disks()
 {
-    local folder=$lab_build/disk here=${BASH_SOURCE[0]} turn
-    local base=$folder/base-$(lab_disk_packages_print).tar
-    lab_disk=$folder/base-$(printf '%s\n' "$here" "$lab_debian/.packages" | fingerprint).ext4
-    if [[ -f $lab_disk ]]; then
-        return
-    fi
-    ensure_host_packages mmdebstrap e2fsprogs dpkg-dev
+    local folder=$lab_build/disk here=${BASH_SOURCE[0]} base print kind image turn
+    base=$folder/base-$(lab_disk_packages_print).tar
+    print=$(printf '%s\n' "$here" "${here%/*}/write-disk" "$lab_debian/.packages" | fingerprint)
+    lab_disk_fresh=$folder/fresh-$print.ext4
+    lab_disk_ready=$folder/ready-$print.ext4
     mkdir -p "$folder"
     exec {turn}>"$folder/.turn"
     flock "$turn"
-    if [[ ! -f $base ]]; then
-        say_note "making Debian for the lab's machine with systemd"
-        rm -f "$folder"/base-*.tar
-        lab_bootstrap "$base"
-    fi
-    if [[ ! -f $lab_disk ]]; then
-        rm -f "$folder"/base-*.ext4
-        lab_write_disk "$base" "$lab_disk"
-    fi
+    for kind in "$@"; do
+        image=$folder/$kind-$print.ext4
+        if [[ ! -f $image ]]; then
+            ensure_host_packages mmdebstrap e2fsprogs dpkg-dev
+            rm -f "$folder/$kind"-*.ext4
+            [[ -f $base ]] || lab_bootstrap "$base"
+            lab_write_disk "$base" "$kind" "$image"
+        fi
+    done
     exec {turn}>&-
 }
 
@@ -50,6 +53,8 @@ lab_disk_packages_print()
 lab_bootstrap()
 {
     local archive=$1 suite
+    say_note "making Debian for the lab's machine with systemd"
+    rm -f "${archive%/*}"/base-*.tar
     suite=$(. /etc/os-release && echo "$VERSION_CODENAME")
     # One after the other, for some of those offered exclude each other.
     # shellcheck disable=SC2016 # $1 is the hook's
@@ -78,13 +83,16 @@ lab_package_sources()
     fi
 }
 
-# lab_write_disk ARCHIVE IMAGE: only root may make the files of a whole system.
+# lab_write_disk ARCHIVE KIND IMAGE: only root may make the files of a whole system.
 lab_write_disk()
 {
-    local archive=$1 image=$2 modules
-    say_note "writing the disk of the lab's machine with systemd"
+    local archive=$1 kind=$2 image=$3 modules packages=()
+    say_note "writing the $kind disk of the lab's machine with systemd"
+    if [[ $kind == ready ]]; then
+        packages=("${lab_needed_packages[@]}")
+    fi
     modules=$(echo "$lab_debian"/lib/modules/*)
-    as_root "$lab_source/lib/host/write-disk" "$archive" "$modules" "$image.new" \
+    as_root "$lab_source/lib/host/write-disk" "$archive" "$modules" "$image.new" "${packages[@]}" \
         >"$lab_build/disk.log" 2>&1 || die "the disk cannot be written: see $lab_build/disk.log"
     as_root chown "$(id -u):$(id -g)" "$image.new"
     mv "$image.new" "$image"

@@ -18,7 +18,7 @@ lab_programs=(
 
 # What the kernel needs for the lab, in any order: what they need in turn is found below.
 lab_modules=(openvswitch bonding 8021q bridge dummy veth virtio_net virtio_pci)
-lab_loader_modules=(virtio_pci virtio_blk ext4)
+lab_loader_modules=(nfit nd_pmem ext4)
 
 lab_busybox()
 {
@@ -276,7 +276,7 @@ lab_product_files()
 # or empty, $5 network manager, empty for the case's.
 lab_make_guest_image()
 {
-    local archive=$1 machine=$2 topology=$3 case_folder=$4 root base=$lab_image
+    local archive=$1 machine=$2 topology=$3 case_folder=$4 manager=$5 root base=$lab_image
     root=$(mktemp -d "$lab_build/guest.XXXXXX")
     mkdir -p "$root/lab/topology" "$root/lab/case"
     cp "$lab_source"/lib/guest/* "$root/lab/"
@@ -284,8 +284,8 @@ lab_make_guest_image()
     if [[ -n $case_folder ]]; then
         cp -r "$case_folder/." "$root/lab/case/"
     fi
-    if [[ -n ${5:-} ]]; then
-        echo "$5" >"$root/lab/case/manager"
+    if [[ -n $manager ]]; then
+        echo "$manager" >"$root/lab/case/manager"
     fi
     if [[ $machine == systemd ]]; then
         base=$lab_loader

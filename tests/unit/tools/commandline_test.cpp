@@ -59,6 +59,8 @@ const std::vector<std::vector<std::string>> kForRoot{
     {"register", "lab"},
     {"unregister", "lab"},
     {"status"},
+    {"adopt"},
+    {"release"},
     {"reset", "--yes"},
     {"interface", "list"},
     {"interface", "add", "eth0"},
@@ -86,7 +88,8 @@ const std::vector<std::vector<std::string>> kForAnyone{
 
 std::string WordsOf(const std::vector<std::string>& commandLine)
 {
-    constexpr std::array kSingle{"register", "unregister", "status", "reset", "show"};
+    constexpr std::array kSingle{"register", "unregister", "status", "reset",
+                                 "show",     "adopt",      "release"};
     const bool single =
         std::find(kSingle.begin(), kSingle.end(), commandLine.front()) != kSingle.end();
     return single ? commandLine.front() : commandLine[0] + ' ' + commandLine[1];

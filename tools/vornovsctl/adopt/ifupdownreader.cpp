@@ -116,7 +116,7 @@ private:
         } else if (name == "metric") {
             (m_ipv6 ? m_wish.metric6 : m_wish.metric4) = vornhost::ToNumber(value, 0, UINT32_MAX);
         } else if (name == "privext") {
-            m_wish.privacy = value == "2" ? "rfc3041" : value == "1" ? "yes" : "no";
+            m_wish.privacy = value == "2" ? "rfc3041" : value == "1" ? "1" : "no";
         } else if (name == "dhcp" && m_ipv6) {
             m_wish.dhcp6 = value == "1" ? m_wish.dhcp6 : std::optional(false);
         } else if (name == "hostname") {

@@ -144,7 +144,7 @@ void ReadKernelAutoconf(const HostView& host, Wish& wish)
 {
     const std::string folder = "/proc/sys/net/ipv6/conf/" + wish.name + '/';
     const auto value = [&](const char* name) {
-        return host.Text(folder + name).value_or("1").substr(0, 1);
+        return host.Text(folder + name).value_or("").substr(0, 1);
     };
     if (value("accept_ra") == "0" || value("autoconf") == "0") {
         wish.autoconf = false;
@@ -152,8 +152,8 @@ void ReadKernelAutoconf(const HostView& host, Wish& wish)
     if (value("disable_ipv6") == "1" && wish.master.empty()) {
         wish.ipv6 = false;
     }
-    if (wish.privacy.empty() && value("use_tempaddr") != "0" && host.Exists(folder)) {
-        wish.privacy = value("use_tempaddr") == "1" ? "yes" : "rfc3041";
+    if (wish.privacy.empty() && value("use_tempaddr") > "0") {
+        wish.privacy = value("use_tempaddr") == "1" ? "1" : "rfc3041";
     }
 }
 

@@ -129,7 +129,7 @@ bool TakeDomains(const std::string& value, Wish& wish)
 
 bool TakePrivacy(const std::string& value, Wish& wish)
 {
-    wish.privacy = value == "prefer-public" ? "yes" : YesOrNo(value) == true ? "rfc3041" : "no";
+    wish.privacy = value == "prefer-public" ? "1" : YesOrNo(value) == true ? "rfc3041" : "no";
     return true;
 }
 

@@ -191,7 +191,7 @@ private:
         if (ipv6) {
             const std::string privacy = Get("ipv6.ip6-privacy").substr(0, 1);
             m_wish.privacy = privacy == "2"   ? "rfc3041"
-                             : privacy == "1" ? "yes"
+                             : privacy == "1" ? "1"
                              : privacy == "0" ? "no"
                                               : "";
         }

@@ -56,7 +56,7 @@ struct Wish {
     std::optional<unsigned> metric6;
     std::string token;     /**< interface identifier, "::1:2:3:4" */
     std::string linkLocal; /**< link-local address, where it is not the MAC's */
-    std::string privacy;   /**< "yes", "no", "rfc3041" or nothing */
+    std::string privacy;   /**< "rfc3041" (preferred), "1" (made), "no" or nothing */
 
     DhcpIdentity identity;
     std::optional<bool> peerDns;

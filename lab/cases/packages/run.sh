@@ -130,7 +130,7 @@ remove_is_refused()
     step "Remove, refused"
     for file in $lab_lock_files; do
         if [ -e "$file" ]; then
-            flock "$file" sleep 600 &
+            flock -o "$file" sleep 60 &
             holders+=("$!")
         fi
     done

@@ -7,6 +7,16 @@ machine_has_systemd()
     [ -d /lab/machine ]
 }
 
+# sampled EVERY ALL: prints the first unless everything is asked for, which is the second.
+sampled()
+{
+    if grep -qw lab.daily /proc/cmdline; then
+        echo "$1"
+    else
+        echo "$2"
+    fi
+}
+
 # On the disk where there is one: what a case left before a reboot is there after it.
 lab_out=/run/lab
 if machine_has_systemd; then

@@ -46,7 +46,8 @@ lab_qemu_cards()
 lab_kernel_line()
 {
     echo "console=ttyS0 quiet panic=-1 mitigations=off nokaslr random.trust_cpu=on" \
-        "tsc=reliable nolapic_timer no_timer_check net.ifnames=0 audit=0 $*"
+        "tsc=reliable nolapic_timer no_timer_check net.ifnames=0 audit=0" \
+        "modprobe.blacklist=ata_piix,ata_generic,loop,dm_mod,floppy,psmouse $*"
 }
 
 # lab_start_guest SECONDS MACHINE TOPOLOGY IMAGE DISK WORDS QEMU-ARGUMENT...: replaces the calling

@@ -1,0 +1,3 @@
+# shellcheck shell=bash
+
+takeover_phases

@@ -5,6 +5,7 @@
 #include "hold.h"
 #include "reconcile.h"
 #include "report.h"
+#include "retry.h"
 #include "runstate.h"
 
 #include "support/atomicfile.h"
@@ -86,6 +87,8 @@ bool Stop(const Request& request)
 bool Leave(const Request& request)
 {
     bool done = ForgetRecords(request.names);
+    // Nor does anybody bring them to the switch later.
+    MindRetry(request.names, {});
     const auto clients = ReadClients();
     for (const std::string& name : request.names) {
         std::string error;

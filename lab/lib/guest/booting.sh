@@ -55,3 +55,27 @@ logged()
 {
     journalctl -b -q --no-pager -t rc.network | grep -q -- "$1"
 }
+
+# The host of the topology one-port is on the switch.
+is_on_switch()
+{
+    [ -n "$(addresses_of ovs_eth0)" ] && [ -z "$(addresses_of eth0)" ]
+}
+
+# It is not, although its files want it, and is reachable all the same.
+expect_without_switch()
+{
+    expect_answers
+    expect_equal "the addresses of eth0" "$(printf '10.10.0.2/24\nfd10:0:0:a0::2/64')" \
+        "$(addresses_of eth0)"
+    expect_success logged 'eth0 stay on the plain interface'
+    expect_active network-online.target vornovs-network-retry.service
+}
+
+# expect_comes_to_switch SECONDS: by itself, within that time.
+expect_comes_to_switch()
+{
+    wait_until "$1" is_on_switch
+    expect_answers
+    wait_until 30 unit_is vornovs-network-retry.service inactive
+}

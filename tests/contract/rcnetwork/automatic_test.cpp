@@ -113,6 +113,18 @@ TEST_F(Automatic, AnAdministratorsStopEndsTheTrying)
     EXPECT_EQ(Network(), "");
 }
 
+TEST_F(Automatic, AnInterfaceThatIsLeftToSomebodyElseIsNotBroughtToTheSwitch)
+{
+    OnSwitch();
+    EXPECT_EQ(RcNetwork({"start"}).exitCode, 1);
+    ASSERT_TRUE(WaitUntil([] { return Retriers() == 1; }));
+
+    EXPECT_EQ(RcNetwork({"leave", "eth0"}), kSilentSuccess);
+
+    EXPECT_EQ(ReadFile(kWaitingPath), "(none)");
+    EXPECT_EQ(Network(), "eth0 192.0.2.5/24\n");
+}
+
 TEST_F(Automatic, DaemonsThatWereStartedAreTriedAtOnce)
 {
     OnSwitch();

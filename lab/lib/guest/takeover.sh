@@ -48,11 +48,13 @@ host_answers()
     done < <(takeover_expected)
 }
 
-# The default routes, without what makes no difference: that a gateway was said to be on the link,
-# where it is, and an MTU and a hop limit that are the interface's own.
+# The default routes, without what makes no difference or changes by itself: that a gateway was said
+# to be on the link, where it is; the link's MTU and hop limit, which some managers write to a
+# router's routes; how long these are good for.
 ways_out()
 {
-    default_routes | sed -E -e 's/ onlink//' -e 's/ mtu 1500//' -e 's/ hoplimit 64//'
+    default_routes |
+        sed -E -e 's/ onlink//' -e 's/ (mtu|hoplimit) [0-9]+//g' -e 's/ expires [0-9]+sec//'
 }
 
 host_has_routes()

@@ -8,6 +8,7 @@
 #include <linux/if_addr.h>
 #include <linux/rtnetlink.h>
 #include <sstream>
+#include <support/keyvaluefile.h>
 #include <sys/socket.h>
 
 namespace vornovsctl {
@@ -116,7 +117,8 @@ bool IsOwnNetwork(const HostView& host, const vornhost::Link& link, const std::s
     return std::any_of(
         host.live.addresses.begin(), host.live.addresses.end(),
         [&](const vornhost::Address& address) {
-            return address.index == link.index && (address.flags & IFA_F_NOPREFIXROUTE) != 0 &&
+            return address.index == link.index && address.scope == RT_SCOPE_UNIVERSE &&
+                   (address.flags & IFA_F_NOPREFIXROUTE) != 0 &&
                    std::to_string(address.prefixLength) == length &&
                    SameNetwork(address.family, address.local, network, address.prefixLength);
         });
@@ -228,6 +230,24 @@ void GiveToNetworkManager(const HostView& host, const AdoptionRecord& record,
     StartAnew(kNetworkManagerUnit, hands);
 }
 
+/** As its hook would have done when it brought the interface up. */
+void TellNameServers(const AdoptedInterface& interface, Hands& hands)
+{
+    const auto file = vornhost::KeyValueFile::Parse(
+        interface.files.empty() ? std::string() : interface.files.front().text);
+    std::string text;
+    for (unsigned number = 1; const auto server = file.Get("DNS" + std::to_string(number));
+         ++number) {
+        text += "nameserver " + *server + '\n';
+    }
+    if (const auto search = file.Get("DOMAIN")) {
+        text += "search " + *search + '\n';
+    }
+    if (!text.empty()) {
+        (void)hands.Feed({"resolvconf", "-a", interface.name + ".inet"}, text);
+    }
+}
+
 } // namespace
 
 std::vector<EndedClient> ClientsOf(const HostView& host, const std::string& interface)
@@ -262,6 +282,20 @@ std::string StateLineOf(const HostView& host, const std::string& interface)
     return "";
 }
 
+void ForgetNameServers(const AdoptionRecord& record, const std::set<std::string>& names,
+                       Hands& hands)
+{
+    constexpr std::array kProtocols{".inet", ".inet6", ".dhclient"};
+    for (const AdoptedInterface& interface : record.interfaces) {
+        if (interface.manager != Manager::kIfupdown || !names.contains(interface.name)) {
+            continue;
+        }
+        for (const char* const protocol : kProtocols) {
+            (void)hands.Run({"resolvconf", "-d", interface.name + protocol, "-f"});
+        }
+    }
+}
+
 void TakeFromManagers(const HostView& host, const AdoptionRecord& record,
                       const std::set<std::string>& names, Hands& hands)
 {
@@ -292,6 +326,9 @@ void GiveToManagers(const HostView& host, const AdoptionRecord& record,
             continue;
         }
         SetStateLine(interface, true, hands);
+        if (interface.manager == Manager::kIfupdown) {
+            TellNameServers(interface, hands);
+        }
         for (const EndedClient& client : interface.clients) {
             if (!client.words.empty()) {
                 (void)hands.Run(client.words);

@@ -203,8 +203,8 @@ void PerformAdoption(const HostView& host, const std::set<std::string>& names,
     ForgetNameServers(record, names, hands);
 }
 
-void PerformRelease(const HostView& host, const std::set<std::string>& names,
-                    AdoptionRecord& record, Hands& hands)
+std::set<std::string> PerformRelease(const HostView& host, const std::set<std::string>& names,
+                                     AdoptionRecord& record, Hands& hands)
 {
     SetPhase(names, Phase::kReleasing, record);
     record.Save(hands);
@@ -221,7 +221,7 @@ void PerformRelease(const HostView& host, const std::set<std::string>& names,
         }
     }
     (void)RunNetwork("leave", names, hands);
-    GiveToManagers(host, record, names, hands);
+    std::set<std::string> unchecked = GiveToManagers(host, record, names, hands);
     std::erase_if(record.interfaces, [&](const AdoptedInterface& interface) {
         return names.contains(interface.name);
     });
@@ -230,6 +230,7 @@ void PerformRelease(const HostView& host, const std::set<std::string>& names,
     } else {
         record.Save(hands);
     }
+    return unchecked;
 }
 
 } // namespace vornovsctl

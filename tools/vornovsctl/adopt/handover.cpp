@@ -204,22 +204,38 @@ void GiveToNetworkd(const HostView& host, const AdoptionRecord& record,
     }
 }
 
-/** Told which profile is active on a device, the daemon goes on with it instead of beginning. */
-void GiveToNetworkManager(const HostView& host, const AdoptionRecord& record,
-                          const std::set<std::string>& names, Hands& hands)
+/**
+ * NetworkManager makes addresses of IPv6 anew that it finds on an interface. The host has them
+ * already, and they are not to be silent while it is asked whether another host has.
+ */
+void CheckForDuplicates(const std::string& name, bool check, Hands& hands)
 {
+    (void)hands.Run(
+        {"sysctl", "-q", "-w", "net/ipv6/conf/" + name + "/accept_dad=" + (check ? "1" : "0")});
+}
+
+/** Told which profile is active on a device, the daemon goes on with it instead of beginning. */
+std::set<std::string> GiveToNetworkManager(const HostView& host, const AdoptionRecord& record,
+                                           const std::set<std::string>& names, Hands& hands)
+{
+    std::set<std::string> unchecked;
     if (!IsActive(host, kNetworkManagerUnit)) {
-        return;
+        return unchecked;
     }
     if (!Owns(record, names, Manager::kNetworkManager)) {
         (void)hands.Run({"nmcli", "general", "reload", "conf"});
-        return;
+        return unchecked;
     }
     for (const AdoptedInterface& interface : record.interfaces) {
         const vornhost::Link* const link = host.live.Find(interface.name);
         if (interface.manager == Manager::kNetworkManager && names.contains(interface.name) &&
             link != nullptr && !interface.profile.empty()) {
             MarkNetworkRoutes(host, interface.name, "static", "kernel", hands);
+            MarkNetworkRoutes(host, interface.name, "dhcp", "kernel", hands);
+            if (host.Text("/proc/sys/net/ipv6/conf/" + interface.name + "/accept_dad") == "1\n") {
+                CheckForDuplicates(interface.name, false, hands);
+                unchecked.insert(interface.name);
+            }
             const bool made = link->kind == "bond" || link->kind == "vlan";
             hands.Write("/run/NetworkManager/devices/" + std::to_string(link->index),
                         "[device]\nmanaged=true\nconnection-uuid=" + interface.profile +
@@ -228,6 +244,7 @@ void GiveToNetworkManager(const HostView& host, const AdoptionRecord& record,
         }
     }
     StartAnew(kNetworkManagerUnit, hands);
+    return unchecked;
 }
 
 /** As its hook would have done when it brought the interface up. */
@@ -316,11 +333,18 @@ void TakeFromManagers(const HostView& host, const AdoptionRecord& record,
     }
 }
 
-void GiveToManagers(const HostView& host, const AdoptionRecord& record,
-                    const std::set<std::string>& names, Hands& hands)
+void CheckForDuplicatesAgain(const std::set<std::string>& names, Hands& hands)
+{
+    for (const std::string& name : names) {
+        CheckForDuplicates(name, true, hands);
+    }
+}
+
+std::set<std::string> GiveToManagers(const HostView& host, const AdoptionRecord& record,
+                                     const std::set<std::string>& names, Hands& hands)
 {
     GiveToNetworkd(host, record, names, hands);
-    GiveToNetworkManager(host, record, names, hands);
+    std::set<std::string> unchecked = GiveToNetworkManager(host, record, names, hands);
     for (const AdoptedInterface& interface : record.interfaces) {
         if (!names.contains(interface.name)) {
             continue;
@@ -335,6 +359,7 @@ void GiveToManagers(const HostView& host, const AdoptionRecord& record,
             }
         }
     }
+    return unchecked;
 }
 
 } // namespace vornovsctl

@@ -30,9 +30,15 @@ void ForgetNameServers(const AdoptionRecord& record, const std::set<std::string>
 void TakeFromManagers(const HostView& host, const AdoptionRecord& record,
                       const std::set<std::string>& names, Hands& hands);
 
-/** Has them go on with interfaces that they may manage again. */
-void GiveToManagers(const HostView& host, const AdoptionRecord& record,
-                    const std::set<std::string>& names, Hands& hands);
+/**
+ * Has them go on with interfaces that they may manage again.
+ * @return  the interfaces whose addresses are not checked for duplicates meanwhile.
+ */
+std::set<std::string> GiveToManagers(const HostView& host, const AdoptionRecord& record,
+                                     const std::set<std::string>& names, Hands& hands);
+
+/** Has addresses checked for duplicates again. */
+void CheckForDuplicatesAgain(const std::set<std::string>& names, Hands& hands);
 
 } // namespace vornovsctl
 

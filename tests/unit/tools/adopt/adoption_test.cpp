@@ -139,7 +139,7 @@ protected:
         if (names.empty()) {
             names = record->NamesIn({Phase::kAdopting, Phase::kAdopted, Phase::kReleasing});
         }
-        vornovsctl::PerformRelease(host.view, names, *record, hands);
+        (void)vornovsctl::PerformRelease(host.view, names, *record, hands);
     }
 
     /** Whether somebody brings the interface up if the host is restarted now. */
@@ -455,7 +455,7 @@ TEST(Networkd, IsEndedWithoutAWordAndKeptFromMakingTheBond)
               "[Match]\nKernelCommandLine=vornovs.release\n");
 
     hands.runs.clear();
-    vornovsctl::PerformRelease(host.view, {"bond0", "eth0"}, record, hands);
+    (void)vornovsctl::PerformRelease(host.view, {"bond0", "eth0"}, record, hands);
 
     EXPECT_THAT(hands.runs, ElementsAre("/etc/rc.network leave bond0 eth0",
                                         "systemctl kill --kill-whom=main --signal=KILL "
@@ -480,8 +480,13 @@ TEST(NetworkManager, IsToldWhichProfileIsActiveWhenItGetsAnInterfaceBack)
     vornovsctl::AddToRecord(host.view, hands, vornovsctl::ReadWishes(host.view, {}), record);
     vornovsctl::PerformAdoption(host.view, {"eth0"}, record, hands);
 
-    vornovsctl::PerformRelease(host.view, {"eth0"}, record, hands);
+    host.Write("/proc/sys/net/ipv6/conf/eth0/accept_dad", "1\n");
+    hands.runs.clear();
 
+    EXPECT_THAT(vornovsctl::PerformRelease(host.view, {"eth0"}, record, hands),
+                ElementsAre("eth0"));
+
+    EXPECT_THAT(hands.runs, Contains("sysctl -q -w net/ipv6/conf/eth0/accept_dad=0"));
     EXPECT_EQ(host.Read("/run/NetworkManager/devices/2"),
               "[device]\nmanaged=true\nconnection-uuid=one\nnm-owned=false\n");
     EXPECT_EQ(hands.runs.back(), "systemctl start NetworkManager.service");

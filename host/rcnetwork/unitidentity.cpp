@@ -9,6 +9,7 @@ namespace vornhost {
 namespace {
 
 constexpr char kAutoconf[] = "ipv6.conf.autoconf";
+constexpr char kRouterMetric[] = "ipv6.conf.ra_defrtr_metric";
 constexpr char kTemporary[] = "ipv6.conf.use_tempaddr";
 constexpr unsigned kLinkLocalLength = 64;
 
@@ -80,6 +81,9 @@ void UnitPlanner::PlanAutoconf()
         const bool kernel = *file.autoconf && !file.ClientHearsRouters();
         WantSetting(kAcceptRouters, kernel ? "1" : "0");
         WantSetting(kAutoconf, kernel ? "1" : "0");
+    }
+    if (file.metric6 && file.autoconf != false && !file.ClientHearsRouters()) {
+        WantSetting(kRouterMetric, std::to_string(*file.metric6));
     }
     // The kernel takes one only for an interface that hears routers.
     if (!file.token.empty() && file.autoconf != false &&

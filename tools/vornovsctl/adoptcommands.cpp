@@ -1,6 +1,9 @@
 #include "adopt/adoption.h"
 #include "adopt/boundaries.h"
+#include "adopt/handover.h"
 #include "adopt/livecheck.h"
+#include "adopt/networkdreader.h"
+#include "adopt/networkmanagerreader.h"
 #include "adopt/report.h"
 #include "commands.h"
 #include "hoststate.h"
@@ -39,6 +42,38 @@ Belongings WaitFor(const Belongings& before, const std::set<std::string>& names)
         std::this_thread::sleep_for(kGlance);
     }
     return missing;
+}
+
+/** Whether managers are done with interfaces that they got back; without a cable they never are. */
+bool AreSettled(const AdoptionRecord& record, const std::set<std::string>& names)
+{
+    const HostView host = HostView::Now();
+    const auto devices = ReadNetworkManagerDevices(host);
+    const auto links = ReadNetworkdLinks(host);
+    return std::all_of(
+        record.interfaces.begin(), record.interfaces.end(), [&](const AdoptedInterface& interface) {
+            const vornhost::Link* const link = host.live.Find(interface.name);
+            if (!names.contains(interface.name) || link == nullptr || !link->carrier) {
+                return true;
+            }
+            const auto device = devices.find(interface.name);
+            const auto network = links.find(interface.name);
+            return (interface.manager != Manager::kNetworkManager ||
+                    (device != devices.end() && device->second.settled)) &&
+                   (interface.manager != Manager::kNetworkd ||
+                    (network != links.end() && network->second.settled));
+        });
+}
+
+/** The same for interfaces that managers have got back. */
+Belongings WaitForManagers(const AdoptionRecord& record, const Belongings& before,
+                           const std::set<std::string>& names)
+{
+    for (auto waited = std::chrono::milliseconds(0);
+         waited <= kPatience && !AreSettled(record, names); waited += kGlance) {
+        std::this_thread::sleep_for(kGlance);
+    }
+    return WaitFor(before, names);
 }
 
 Answer FailedFor(const std::string& reason, Json fields)
@@ -161,15 +196,18 @@ private:
     Answer Undo(const std::string& failure, const Belongings& before)
     {
         const std::string text = failure + ".\n";
+        const AdoptionRecord whole = m_record;
+        std::set<std::string> unchecked;
         try {
-            PerformRelease(HostView::Now(), m_names, m_record, m_hands);
+            unchecked = PerformRelease(HostView::Now(), m_names, m_record, m_hands);
         } catch (const std::exception& error) {
             return Failed(kOutOfStep,
                           text + "It could not be undone: " + error.what() +
                               ".\nRun 'vornovsctl release' when that is mended.",
                           Fields(false));
         }
-        const Belongings missing = WaitFor(before, m_names);
+        const Belongings missing = WaitForManagers(whole, before, m_names);
+        CheckForDuplicatesAgain(unchecked, m_hands);
         return FailedFor(
             text + "It was undone" +
                 (missing.empty() ? "." : ", but still missing: " + List(missing) + '.'),
@@ -216,15 +254,18 @@ Answer ReleaseAll(const Context& context, Hands& hands)
     }
     context.tell(ReleaseText(*record, names));
     const Belongings before = BelongingsOf(host, names);
+    const AdoptionRecord whole = *record;
+    std::set<std::string> unchecked;
     try {
-        PerformRelease(host, names, *record, hands);
+        unchecked = PerformRelease(host, names, *record, hands);
     } catch (const std::exception& error) {
         return Failed(kOutOfStep,
                       error.what() + std::string(".\nRun 'vornovsctl release' again when that is "
                                                  "mended."),
                       ReleaseFields(*record, names, false));
     }
-    const Belongings missing = WaitFor(before, names);
+    const Belongings missing = WaitForManagers(whole, before, names);
+    CheckForDuplicatesAgain(unchecked, hands);
     if (!missing.empty()) {
         return FailedFor(
             "released, but missing since: " + List(missing) + ".\nSee the manager's log.", plan);

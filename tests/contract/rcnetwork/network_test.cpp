@@ -62,6 +62,19 @@ TEST_F(Host, DryRunChangesNothing)
     EXPECT_EQ(ReadFile("/run/vornovs/network.json"), "(none)");
 }
 
+TEST_F(Host, LeaveTakesNothingDownAndForgetsWhatStartMade)
+{
+    File("eth0", kStatic);
+    ASSERT_EQ(RcNetwork({"start"}), (Outcome{0, "", ""}));
+
+    EXPECT_EQ(RcNetwork({"leave", "eth0"}), (Outcome{0, "", ""}));
+
+    EXPECT_EQ(Network(), kStaticNetwork);
+    EXPECT_EQ(RcNetwork({"stop"}), (Outcome{0, "", ""}));
+    EXPECT_EQ(Network(), kStaticNetwork);
+    EXPECT_EQ(RcNetwork({"leave"}).exitCode, 2);
+}
+
 TEST_F(Host, StopTakesDownExactlyWhatStartMade)
 {
     Ip("link set dev eth0 up");

@@ -1,6 +1,7 @@
 #include "adopt/adoption.h"
 
 #include "adopt/handover.h"
+#include "adopt/livedetails.h"
 #include "adopt/networkdreader.h"
 #include "adopt/networkmanagerreader.h"
 #include "adopt/silencers.h"
@@ -80,6 +81,21 @@ std::optional<std::string> LeaseTextOf(const HostView& host, const Wish& wish)
     return AnswerOf(lease, link->mac);
 }
 
+/** The same for the address that a server of IPv6 gave. */
+std::optional<std::string> Lease6TextOf(const HostView& host, const Wish& wish)
+{
+    const vornhost::Link* const link = host.live.Find(wish.name);
+    const bool asks = wish.ipv6 && wish.dhcp6.value_or(wish.autoconf.value_or(false));
+    for (const vornhost::Address& address : host.live.addresses) {
+        if (asks && link != nullptr && address.index == link->index && IsOfServer(address)) {
+            return AnswerOf6({address.local, wish.identity.duid.value_or(""),
+                              wish.identity.iaid.value_or(""), address.preferredSeconds,
+                              address.validSeconds});
+        }
+    }
+    return std::nullopt;
+}
+
 AdoptedInterface InterfaceOf(const HostView& host, const Hands& hands, const Wish& wish,
                              const std::map<std::string, NetworkManagerDevice>& profiles)
 {
@@ -92,9 +108,12 @@ AdoptedInterface InterfaceOf(const HostView& host, const Hands& hands, const Wis
     }
     const std::string path = FilePathOf(wish.name);
     interface.files.push_back({path, FileTextOf(wish), kReadable, hands.Read(path)});
+    const std::string leasePath = kLeaseFolder + wish.name + ".lease";
     if (const auto lease = LeaseTextOf(host, wish)) {
-        const std::string leasePath = kLeaseFolder + wish.name + ".lease";
         interface.files.push_back({leasePath, *lease, kPrivate, hands.Read(leasePath)});
+    }
+    if (const auto lease = Lease6TextOf(host, wish)) {
+        interface.files.push_back({leasePath + '6', *lease, kPrivate, hands.Read(leasePath + '6')});
     }
     interface.clients = ClientsOf(host, wish.name);
     interface.stateLine = StateLineOf(host, wish.name);
@@ -181,10 +200,11 @@ void PerformAdoption(const HostView& host, const std::set<std::string>& names,
     if (!RunNetwork("start", names, hands)) {
         throw std::runtime_error("'/etc/rc.network start' failed: see the system log");
     }
+    ForgetNameServers(record, names, hands);
 }
 
-void PerformRelease(const HostView& host, const std::set<std::string>& names,
-                    AdoptionRecord& record, Hands& hands)
+std::set<std::string> PerformRelease(const HostView& host, const std::set<std::string>& names,
+                                     AdoptionRecord& record, Hands& hands)
 {
     SetPhase(names, Phase::kReleasing, record);
     record.Save(hands);
@@ -201,7 +221,7 @@ void PerformRelease(const HostView& host, const std::set<std::string>& names,
         }
     }
     (void)RunNetwork("leave", names, hands);
-    GiveToManagers(host, record, names, hands);
+    std::set<std::string> unchecked = GiveToManagers(host, record, names, hands);
     std::erase_if(record.interfaces, [&](const AdoptedInterface& interface) {
         return names.contains(interface.name);
     });
@@ -210,6 +230,7 @@ void PerformRelease(const HostView& host, const std::set<std::string>& names,
     } else {
         record.Save(hands);
     }
+    return unchecked;
 }
 
 } // namespace vornovsctl

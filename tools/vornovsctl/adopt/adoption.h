@@ -23,9 +23,12 @@ void AddToRecord(const HostView& host, const Hands& hands, const Wishes& wishes,
 void PerformAdoption(const HostView& host, const std::set<std::string>& names,
                      AdoptionRecord& record, Hands& hands);
 
-/** Gives these interfaces back. @throws std::runtime_error when it cannot. */
-void PerformRelease(const HostView& host, const std::set<std::string>& names,
-                    AdoptionRecord& record, Hands& hands);
+/**
+ * Gives these interfaces back. @throws std::runtime_error when it cannot.
+ * @return  as GiveToManagers().
+ */
+std::set<std::string> PerformRelease(const HostView& host, const std::set<std::string>& names,
+                                     AdoptionRecord& record, Hands& hands);
 
 } // namespace vornovsctl
 

@@ -15,7 +15,7 @@ constexpr int kVersion = 1;
 constexpr unsigned kPrivate = 0600; // files of managers may hold secrets
 
 constexpr std::array kPhases{"adopting", "adopted", "releasing"};
-constexpr std::array kSilencers{"interfaces", "network", "netdev", "keyfile"};
+constexpr std::array kSilencers{"interfaces", "network", "netdev", "keyfile", "cloud"};
 constexpr std::array kManagers{Manager::kNobody, Manager::kIfupdown, Manager::kNetworkd,
                                Manager::kNetworkManager};
 

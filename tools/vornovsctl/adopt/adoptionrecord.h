@@ -52,7 +52,7 @@ struct AdoptedInterface {
 };
 
 /** How a file keeps a manager away from interfaces. */
-enum class Silencer { kInterfaces, kNetwork, kNetdev, kKeyfile };
+enum class Silencer { kInterfaces, kNetwork, kNetdev, kKeyfile, kCloud };
 
 struct SilencingFile {
     Silencer kind = Silencer::kInterfaces;

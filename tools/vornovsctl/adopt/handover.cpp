@@ -8,6 +8,7 @@
 #include <linux/if_addr.h>
 #include <linux/rtnetlink.h>
 #include <sstream>
+#include <support/keyvaluefile.h>
 #include <sys/socket.h>
 
 namespace vornovsctl {
@@ -116,7 +117,8 @@ bool IsOwnNetwork(const HostView& host, const vornhost::Link& link, const std::s
     return std::any_of(
         host.live.addresses.begin(), host.live.addresses.end(),
         [&](const vornhost::Address& address) {
-            return address.index == link.index && (address.flags & IFA_F_NOPREFIXROUTE) != 0 &&
+            return address.index == link.index && address.scope == RT_SCOPE_UNIVERSE &&
+                   (address.flags & IFA_F_NOPREFIXROUTE) != 0 &&
                    std::to_string(address.prefixLength) == length &&
                    SameNetwork(address.family, address.local, network, address.prefixLength);
         });
@@ -202,22 +204,38 @@ void GiveToNetworkd(const HostView& host, const AdoptionRecord& record,
     }
 }
 
-/** Told which profile is active on a device, the daemon goes on with it instead of beginning. */
-void GiveToNetworkManager(const HostView& host, const AdoptionRecord& record,
-                          const std::set<std::string>& names, Hands& hands)
+/**
+ * NetworkManager makes addresses of IPv6 anew that it finds on an interface. The host has them
+ * already, and they are not to be silent while it is asked whether another host has.
+ */
+void CheckForDuplicates(const std::string& name, bool check, Hands& hands)
 {
+    (void)hands.Run(
+        {"sysctl", "-q", "-w", "net/ipv6/conf/" + name + "/accept_dad=" + (check ? "1" : "0")});
+}
+
+/** Told which profile is active on a device, the daemon goes on with it instead of beginning. */
+std::set<std::string> GiveToNetworkManager(const HostView& host, const AdoptionRecord& record,
+                                           const std::set<std::string>& names, Hands& hands)
+{
+    std::set<std::string> unchecked;
     if (!IsActive(host, kNetworkManagerUnit)) {
-        return;
+        return unchecked;
     }
     if (!Owns(record, names, Manager::kNetworkManager)) {
         (void)hands.Run({"nmcli", "general", "reload", "conf"});
-        return;
+        return unchecked;
     }
     for (const AdoptedInterface& interface : record.interfaces) {
         const vornhost::Link* const link = host.live.Find(interface.name);
         if (interface.manager == Manager::kNetworkManager && names.contains(interface.name) &&
             link != nullptr && !interface.profile.empty()) {
             MarkNetworkRoutes(host, interface.name, "static", "kernel", hands);
+            MarkNetworkRoutes(host, interface.name, "dhcp", "kernel", hands);
+            if (host.Text("/proc/sys/net/ipv6/conf/" + interface.name + "/accept_dad") == "1\n") {
+                CheckForDuplicates(interface.name, false, hands);
+                unchecked.insert(interface.name);
+            }
             const bool made = link->kind == "bond" || link->kind == "vlan";
             hands.Write("/run/NetworkManager/devices/" + std::to_string(link->index),
                         "[device]\nmanaged=true\nconnection-uuid=" + interface.profile +
@@ -226,6 +244,25 @@ void GiveToNetworkManager(const HostView& host, const AdoptionRecord& record,
         }
     }
     StartAnew(kNetworkManagerUnit, hands);
+    return unchecked;
+}
+
+/** As its hook would have done when it brought the interface up. */
+void TellNameServers(const AdoptedInterface& interface, Hands& hands)
+{
+    const auto file = vornhost::KeyValueFile::Parse(
+        interface.files.empty() ? std::string() : interface.files.front().text);
+    std::string text;
+    for (unsigned number = 1; const auto server = file.Get("DNS" + std::to_string(number));
+         ++number) {
+        text += "nameserver " + *server + '\n';
+    }
+    if (const auto search = file.Get("DOMAIN")) {
+        text += "search " + *search + '\n';
+    }
+    if (!text.empty()) {
+        (void)hands.Feed({"resolvconf", "-a", interface.name + ".inet"}, text);
+    }
 }
 
 } // namespace
@@ -262,6 +299,20 @@ std::string StateLineOf(const HostView& host, const std::string& interface)
     return "";
 }
 
+void ForgetNameServers(const AdoptionRecord& record, const std::set<std::string>& names,
+                       Hands& hands)
+{
+    constexpr std::array kProtocols{".inet", ".inet6", ".dhclient"};
+    for (const AdoptedInterface& interface : record.interfaces) {
+        if (interface.manager != Manager::kIfupdown || !names.contains(interface.name)) {
+            continue;
+        }
+        for (const char* const protocol : kProtocols) {
+            (void)hands.Run({"resolvconf", "-d", interface.name + protocol, "-f"});
+        }
+    }
+}
+
 void TakeFromManagers(const HostView& host, const AdoptionRecord& record,
                       const std::set<std::string>& names, Hands& hands)
 {
@@ -282,22 +333,33 @@ void TakeFromManagers(const HostView& host, const AdoptionRecord& record,
     }
 }
 
-void GiveToManagers(const HostView& host, const AdoptionRecord& record,
-                    const std::set<std::string>& names, Hands& hands)
+void CheckForDuplicatesAgain(const std::set<std::string>& names, Hands& hands)
+{
+    for (const std::string& name : names) {
+        CheckForDuplicates(name, true, hands);
+    }
+}
+
+std::set<std::string> GiveToManagers(const HostView& host, const AdoptionRecord& record,
+                                     const std::set<std::string>& names, Hands& hands)
 {
     GiveToNetworkd(host, record, names, hands);
-    GiveToNetworkManager(host, record, names, hands);
+    std::set<std::string> unchecked = GiveToNetworkManager(host, record, names, hands);
     for (const AdoptedInterface& interface : record.interfaces) {
         if (!names.contains(interface.name)) {
             continue;
         }
         SetStateLine(interface, true, hands);
+        if (interface.manager == Manager::kIfupdown) {
+            TellNameServers(interface, hands);
+        }
         for (const EndedClient& client : interface.clients) {
             if (!client.words.empty()) {
                 (void)hands.Run(client.words);
             }
         }
     }
+    return unchecked;
 }
 
 } // namespace vornovsctl

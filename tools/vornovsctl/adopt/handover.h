@@ -22,13 +22,23 @@ std::vector<EndedClient> ClientsOf(const HostView& host, const std::string& inte
 /** The line that ifupdown has written down for an interface that is up; empty: there is none. */
 std::string StateLineOf(const HostView& host, const std::string& interface);
 
+/** What ifupdown's hooks told the resolver of an interface, which ours have told it as well. */
+void ForgetNameServers(const AdoptionRecord& record, const std::set<std::string>& names,
+                       Hands& hands);
+
 /** Has them let go of the interfaces; their files keep them away from then on. */
 void TakeFromManagers(const HostView& host, const AdoptionRecord& record,
                       const std::set<std::string>& names, Hands& hands);
 
-/** Has them go on with interfaces that they may manage again. */
-void GiveToManagers(const HostView& host, const AdoptionRecord& record,
-                    const std::set<std::string>& names, Hands& hands);
+/**
+ * Has them go on with interfaces that they may manage again.
+ * @return  the interfaces whose addresses are not checked for duplicates meanwhile.
+ */
+std::set<std::string> GiveToManagers(const HostView& host, const AdoptionRecord& record,
+                                     const std::set<std::string>& names, Hands& hands);
+
+/** Has addresses checked for duplicates again. */
+void CheckForDuplicatesAgain(const std::set<std::string>& names, Hands& hands);
 
 } // namespace vornovsctl
 

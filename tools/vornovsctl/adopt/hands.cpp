@@ -98,7 +98,7 @@ void Hands::RemoveEmptyFolder(const std::string& path)
     (void)rmdir((m_root + path).c_str());
 }
 
-bool Hands::Run(const std::vector<std::string>& argv)
+bool Hands::Feed(const std::vector<std::string>& argv, const std::string& input)
 {
     constexpr std::array kFolders{"/usr/bin/", "/usr/sbin/", "/bin/", "/sbin/", ""};
     for (const char* folder : kFolders) {
@@ -107,6 +107,7 @@ bool Hands::Run(const std::vector<std::string>& argv)
         if (access(words[0].c_str(), X_OK) == 0) {
             vornhost::ProcessOptions options;
             options.deadline = kLongestRun;
+            options.input = input;
             return vornhost::RunProcess(words, options).Succeeded();
         }
     }

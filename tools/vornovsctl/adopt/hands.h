@@ -41,7 +41,9 @@ public:
     /** Removes a folder if nothing is in it. */
     virtual void RemoveEmptyFolder(const std::string& path);
     /** Runs a program. @return whether it succeeded. */
-    virtual bool Run(const std::vector<std::string>& argv);
+    bool Run(const std::vector<std::string>& argv) { return Feed(argv, ""); }
+    /** Runs a program that reads a text. @return whether it succeeded. */
+    virtual bool Feed(const std::vector<std::string>& argv, const std::string& input);
     /** Ends the process that a file names if it is of that program, without letting it say so. */
     virtual void EndProcess(const std::string& pidFile, const std::string& program);
 

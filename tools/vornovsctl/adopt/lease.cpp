@@ -60,7 +60,49 @@ std::string Number(std::uint32_t value)
     return {reinterpret_cast<const char*>(&ordered), sizeof ordered};
 }
 
+enum Option6 : std::uint16_t { kClientId6 = 1, kServerId6 = 2, kAssociation = 3, kAddress6 = 5 };
+constexpr char kReply6 = 7;
+constexpr std::uint32_t kSoon = 5;
+constexpr std::uint32_t kSoonAfter = 8;
+constexpr char kNoServer[] = "00:03:00:01:00:00:00:00:00:00";
+
+std::string Short(std::size_t value)
+{
+    return {static_cast<char>(value >> 8U), static_cast<char>(value & 0xffU)};
+}
+
+std::string FromHex(const std::string& text)
+{
+    std::string bytes;
+    std::string digits = text;
+    std::erase(digits, ':');
+    for (std::size_t index = 0; index + 1 < digits.size(); index += 2) {
+        bytes += static_cast<char>(std::stoi(digits.substr(index, 2), nullptr, 16));
+    }
+    return bytes;
+}
+
+std::string OptionOf6(Option6 code, const std::string& value)
+{
+    return Short(code) + Short(value.size()) + value;
+}
+
 } // namespace
+
+std::optional<std::string> AnswerOf6(const Lease6& lease)
+{
+    in6_addr address{};
+    if (inet_pton(AF_INET6, lease.address.c_str(), &address) != 1 || lease.duid.empty() ||
+        lease.iaid.size() != 8 || lease.validSeconds == 0) {
+        return std::nullopt;
+    }
+    const std::string bytes(reinterpret_cast<const char*>(&address), sizeof address);
+    const std::string given = bytes + Number(lease.preferredSeconds) + Number(lease.validSeconds);
+    const std::string association =
+        FromHex(lease.iaid) + Number(kSoon) + Number(kSoonAfter) + OptionOf6(kAddress6, given);
+    return kReply6 + std::string(3, '\0') + OptionOf6(kClientId6, FromHex(lease.duid)) +
+           OptionOf6(kServerId6, FromHex(kNoServer)) + OptionOf6(kAssociation, association);
+}
 
 std::optional<std::string> AnswerOf(const Lease& lease, const std::string& mac)
 {

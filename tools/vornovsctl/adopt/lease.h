@@ -31,6 +31,23 @@ struct Lease {
  */
 std::optional<std::string> AnswerOf(const Lease& lease, const std::string& mac);
 
+/** A lease of an IPv6 address. */
+struct Lease6 {
+    std::string address;
+    std::string duid; /**< the client's, hex with colons */
+    std::string iaid; /**< eight hex digits */
+    std::uint32_t preferredSeconds = 0;
+    std::uint32_t validSeconds = 0;
+
+    bool operator==(const Lease6&) const = default;
+};
+
+/**
+ * The same for IPv6. Managers do not tell which server it was, so the client is to ask all of them
+ * soon, as it does when its server does not answer.
+ */
+std::optional<std::string> AnswerOf6(const Lease6& lease);
+
 } // namespace vornovsctl
 
 #endif

@@ -65,10 +65,7 @@ bool HasAddressOfServer(const HostView& host, const vornhost::Link& link)
 {
     return std::any_of(host.live.addresses.begin(), host.live.addresses.end(),
                        [&](const vornhost::Address& address) {
-                           return address.index == link.index && address.family == AF_INET6 &&
-                                  address.scope == RT_SCOPE_UNIVERSE &&
-                                  address.prefixLength == 128 &&
-                                  (address.flags & IFA_F_PERMANENT) == 0;
+                           return address.index == link.index && IsOfServer(address);
                        });
 }
 
@@ -158,6 +155,12 @@ void ReadKernelAutoconf(const HostView& host, Wish& wish)
 }
 
 } // namespace
+
+bool IsOfServer(const vornhost::Address& address)
+{
+    return address.family == AF_INET6 && address.scope == RT_SCOPE_UNIVERSE &&
+           address.prefixLength == 128 && (address.flags & IFA_F_PERMANENT) == 0;
+}
 
 void CompleteFromKernel(const HostView& host, Wish& wish)
 {

@@ -9,6 +9,9 @@
 
 namespace vornovsctl {
 
+/** Whether it is one that a server of IPv6 gave to the host alone. */
+bool IsOfServer(const vornhost::Address& address);
+
 /**
  * Completes a wish: what kind of interface it is and what it is made of, metrics that were chosen
  * for it, and the interface identifiers of its IPv6 addresses where they are not the MAC's.

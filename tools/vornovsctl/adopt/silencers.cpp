@@ -18,6 +18,11 @@ constexpr char kNetdevDropIn[] = "/etc/systemd/network/%.d/00-vornovs.conf";
 constexpr char kKeyfilePath[] = "/etc/NetworkManager/conf.d/zz-vornovs.conf";
 constexpr unsigned kReadable = 0644;
 
+// Otherwise it may write what was commented out anew.
+constexpr char kCloudPath[] = "/etc/cloud/cloud.cfg.d/99-vornovs-network.cfg";
+constexpr char kCloudFolder[] = "/etc/cloud/cloud.cfg.d";
+constexpr char kCloudText[] = "network: {config: disabled}\n";
+
 /** What the switch and its network program make. */
 constexpr std::array kSwitchDevices{"ovs_*", "ovs-system", "tag*.*"};
 
@@ -64,11 +69,16 @@ std::string NetdevText()
 void AddInterfacesFiles(const HostView& host, const std::set<std::string>& names,
                         std::vector<SilencingFile>& files)
 {
+    bool byCloud = false;
     for (const std::string& path : ReadInterfaces(host).paths) {
         const auto text = host.Text(path);
         if (text && WithoutInterfaces(*text, names) != *text) {
             files.push_back({Silencer::kInterfaces, path, "", std::nullopt});
+            byCloud = byCloud || path.find("cloud-init") != std::string::npos;
         }
+    }
+    if (byCloud && host.Exists(kCloudFolder)) {
+        files.push_back({Silencer::kCloud, kCloudPath, "", std::nullopt});
     }
 }
 
@@ -150,6 +160,8 @@ std::optional<std::string> SilencingText(const SilencingFile& file,
         return names.contains(file.device) ? std::optional(NetdevText()) : std::nullopt;
     case Silencer::kKeyfile:
         return names.empty() ? std::nullopt : std::optional(KeyfileText(names));
+    case Silencer::kCloud:
+        return names.empty() ? std::nullopt : std::optional(std::string(kHeader) + kCloudText);
     }
     return std::nullopt;
 }

@@ -54,14 +54,14 @@ public:
         Live();
         Hands::Remove(path);
     }
-    bool Run(const std::vector<std::string>& argv) override
+    bool Feed(const std::vector<std::string>& argv, const std::string& input) override
     {
         Live();
         std::string line;
         for (const std::string& word : argv) {
             line += (line.empty() ? "" : " ") + word;
         }
-        runs.push_back(line);
+        runs.push_back(line + (input.empty() ? "" : " < " + input));
         if (argv[0] == "systemctl" && argv[1] == "enable") {
             m_enabled.insert(argv[2]);
         } else if (argv[0] == "systemctl" && argv[1] == "disable") {
@@ -139,7 +139,7 @@ protected:
         if (names.empty()) {
             names = record->NamesIn({Phase::kAdopting, Phase::kAdopted, Phase::kReleasing});
         }
-        vornovsctl::PerformRelease(host.view, names, *record, hands);
+        (void)vornovsctl::PerformRelease(host.view, names, *record, hands);
     }
 
     /** Whether somebody brings the interface up if the host is restarted now. */
@@ -186,9 +186,13 @@ TEST_F(OnIfupdown, AdoptionWritesOurFilesSilencesTheManagersAndStartsOurs)
               "[keyfile]\nunmanaged-devices+=interface-name:eth0;interface-name:eth1;"
               "interface-name:ovs_*;interface-name:ovs-system;interface-name:tag*.*\n");
     EXPECT_EQ(host.Read("/run/network/ifstate"), "lo=lo\n");
-    EXPECT_THAT(hands.runs, ElementsAre("systemctl enable vornovs-network.service",
-                                        "end dhclient of /run/dhclient.eth1.pid",
-                                        "/etc/rc.network start eth0 eth1"));
+    EXPECT_THAT(hands.runs,
+                ElementsAre("systemctl enable vornovs-network.service",
+                            "end dhclient of /run/dhclient.eth1.pid",
+                            "/etc/rc.network start eth0 eth1", "resolvconf -d eth0.inet -f",
+                            "resolvconf -d eth0.inet6 -f", "resolvconf -d eth0.dhclient -f",
+                            "resolvconf -d eth1.inet -f", "resolvconf -d eth1.inet6 -f",
+                            "resolvconf -d eth1.dhclient -f"));
 }
 
 TEST_F(OnIfupdown, ReleaseMakesEverythingWhatItWas)
@@ -201,6 +205,36 @@ TEST_F(OnIfupdown, ReleaseMakesEverythingWhatItWas)
 
     EXPECT_THAT(hands.runs, ElementsAre("systemctl disable vornovs-network.service",
                                         "/etc/rc.network leave eth0 eth1", "dhclient -4 eth1"));
+    ExpectAsBefore();
+}
+
+TEST_F(OnIfupdown, ReleaseTellsTheResolverWhatIfupdownWould)
+{
+    host.Write(kInterfaces, "iface eth0 inet static\n    address 192.0.2.10/24\n"
+                            "    dns-nameservers 192.0.2.1 192.0.2.2\n    dns-search a.example\n");
+    MortalHands hands(host, enabled);
+    Adopt(hands, {"eth0"});
+
+    Release(hands);
+
+    EXPECT_EQ(hands.runs.back(), "resolvconf -a eth0.inet < nameserver 192.0.2.1\n"
+                                 "nameserver 192.0.2.2\nsearch a.example\n");
+}
+
+TEST_F(OnIfupdown, CloudInitIsKeptFromWritingItsFileAnew)
+{
+    host.Write(kInterfaces, "source /etc/network/interfaces.d/*\n");
+    host.Write("/etc/network/interfaces.d/50-cloud-init", kInterfacesText);
+    host.Write("/etc/cloud/cloud.cfg.d/05_logging.cfg", "");
+    before = host.Files();
+    MortalHands hands(host, enabled);
+
+    Adopt(hands);
+
+    EXPECT_EQ(host.Read("/etc/cloud/cloud.cfg.d/99-vornovs-network.cfg"),
+              "# Written by 'vornovsctl adopt', removed by 'vornovsctl release'.\n"
+              "network: {config: disabled}\n");
+    Release(hands);
     ExpectAsBefore();
 }
 
@@ -421,7 +455,7 @@ TEST(Networkd, IsEndedWithoutAWordAndKeptFromMakingTheBond)
               "[Match]\nKernelCommandLine=vornovs.release\n");
 
     hands.runs.clear();
-    vornovsctl::PerformRelease(host.view, {"bond0", "eth0"}, record, hands);
+    (void)vornovsctl::PerformRelease(host.view, {"bond0", "eth0"}, record, hands);
 
     EXPECT_THAT(hands.runs, ElementsAre("/etc/rc.network leave bond0 eth0",
                                         "systemctl kill --kill-whom=main --signal=KILL "
@@ -446,8 +480,13 @@ TEST(NetworkManager, IsToldWhichProfileIsActiveWhenItGetsAnInterfaceBack)
     vornovsctl::AddToRecord(host.view, hands, vornovsctl::ReadWishes(host.view, {}), record);
     vornovsctl::PerformAdoption(host.view, {"eth0"}, record, hands);
 
-    vornovsctl::PerformRelease(host.view, {"eth0"}, record, hands);
+    host.Write("/proc/sys/net/ipv6/conf/eth0/accept_dad", "1\n");
+    hands.runs.clear();
 
+    EXPECT_THAT(vornovsctl::PerformRelease(host.view, {"eth0"}, record, hands),
+                ElementsAre("eth0"));
+
+    EXPECT_THAT(hands.runs, Contains("sysctl -q -w net/ipv6/conf/eth0/accept_dad=0"));
     EXPECT_EQ(host.Read("/run/NetworkManager/devices/2"),
               "[device]\nmanaged=true\nconnection-uuid=one\nnm-owned=false\n");
     EXPECT_EQ(hands.runs.back(), "systemctl start NetworkManager.service");
@@ -501,6 +540,24 @@ TEST(AnswerOf, IsWhatTheServerSent)
     EXPECT_EQ(*answer, expected);
     EXPECT_FALSE(AnswerOf(lease, "no address"));
     EXPECT_FALSE(AnswerOf(vornovsctl::Lease(), "52:54:00:00:00:07"));
+}
+
+TEST(AnswerOf6, IsAReplyThatMakesTheClientAskAllServers)
+{
+    const vornovsctl::Lease6 lease{"2001:db8::180", "00:03:00:01:52:54", "2b506735", 300, 600};
+
+    const auto answer = AnswerOf6(lease);
+
+    ASSERT_TRUE(answer);
+    EXPECT_EQ(*answer, std::string("\x07\0\0\0", 4) +
+                           std::string("\0\x01\0\x06\0\x03\0\x01\x52\x54", 10) +
+                           std::string("\0\x02\0\x0a\0\x03\0\x01\0\0\0\0\0\0", 14) +
+                           std::string("\0\x03\0\x28\x2b\x50\x67\x35\0\0\0\x05\0\0\0\x08", 16) +
+                           std::string("\0\x05\0\x18", 4) +
+                           std::string("\x20\x01\x0d\xb8\0\0\0\0\0\0\0\0\0\0\x01\x80", 16) +
+                           std::string("\0\0\x01\x2c\0\0\x02\x58", 8));
+    EXPECT_FALSE(vornovsctl::AnswerOf6({"2001:db8::180", "", "2b506735", 300, 600}));
+    EXPECT_FALSE(vornovsctl::AnswerOf6({"192.0.2.1", "00:03", "2b506735", 300, 600}));
 }
 
 } // namespace

@@ -96,7 +96,7 @@ std::string WithoutQuotes(const std::string& text)
 std::int64_t MomentOf(const std::string& text)
 {
     if (text.starts_with("epoch ")) {
-        return std::atoll(text.c_str() + 6);
+        return std::strtoll(text.c_str() + 6, nullptr, 10);
     }
     std::tm time{};
     const std::size_t space = text.find(' ');

@@ -25,7 +25,7 @@ std::vector<IniSection> ParseIni(const std::string& text)
         if (line.empty() || line.front() == '#' || line.front() == ';') {
             continue;
         }
-        line = pending + line;
+        line.insert(0, pending);
         pending.clear();
         if (line.ends_with('\\')) {
             pending = line.substr(0, line.size() - 1) + ' ';

@@ -1,8 +1,7 @@
 #include "adopt/lease.h"
 
+#include <algorithm>
 #include <arpa/inet.h>
-#include <array>
-#include <cstdio>
 
 namespace vornovsctl {
 
@@ -104,23 +103,38 @@ std::optional<std::string> AnswerOf6(const Lease6& lease)
            OptionOf6(kServerId6, FromHex(kNoServer)) + OptionOf6(kAssociation, association);
 }
 
+std::optional<std::array<unsigned char, 6>> MacBytes(const std::string& mac)
+{
+    constexpr std::size_t kWidth = 3; // two digits and a colon
+    std::array<unsigned char, 6> bytes{};
+    const bool digits = mac.find_first_not_of("0123456789abcdefABCDEF:") == std::string::npos;
+    if (!digits || mac.size() != bytes.size() * kWidth - 1) {
+        return std::nullopt;
+    }
+    const std::string packed = FromHex(mac);
+    if (packed.size() != bytes.size()) {
+        return std::nullopt;
+    }
+    std::copy(packed.begin(), packed.end(), bytes.begin());
+    return bytes;
+}
+
 std::optional<std::string> AnswerOf(const Lease& lease, const std::string& mac)
 {
-    std::array<unsigned, 6> hardware{};
+    const auto hardware = MacBytes(mac);
     const std::string address = BytesOf(lease.address);
     const std::string server = BytesOf(lease.server);
     if (address.empty() || server.empty() || BytesOf(lease.netmask).empty() || lease.seconds == 0 ||
-        std::sscanf(mac.c_str(), "%2x:%2x:%2x:%2x:%2x:%2x", &hardware[0], &hardware[1],
-                    &hardware[2], &hardware[3], &hardware[4], &hardware[5]) != 6) {
+        !hardware) {
         return std::nullopt;
     }
     std::string packet(kHeaderSize, '\0');
     packet[0] = 2; // an answer, over Ethernet with addresses of six bytes
     packet[1] = 1;
-    packet[2] = static_cast<char>(hardware.size());
+    packet[2] = static_cast<char>(hardware->size());
     packet.replace(kYourAddressAt, kAddressSize, address);
-    for (std::size_t index = 0; index < hardware.size(); ++index) {
-        packet[kHardwareAddressAt + index] = static_cast<char>(hardware[index]);
+    for (std::size_t index = 0; index < hardware->size(); ++index) {
+        packet[kHardwareAddressAt + index] = static_cast<char>((*hardware)[index]);
     }
     packet += kMagic;
     AddOption(kMessageType, std::string(1, kAck), packet);

@@ -4,6 +4,7 @@
 #ifndef VORNOVSCTL_ADOPT_LEASE_H
 #define VORNOVSCTL_ADOPT_LEASE_H
 
+#include <array>
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -30,6 +31,9 @@ struct Lease {
  * @return  nothing when the lease says too little.
  */
 std::optional<std::string> AnswerOf(const Lease& lease, const std::string& mac);
+
+/** @return the bytes of a link address; nothing when the text is none. */
+std::optional<std::array<unsigned char, 6>> MacBytes(const std::string& mac);
 
 /** A lease of an IPv6 address. */
 struct Lease6 {

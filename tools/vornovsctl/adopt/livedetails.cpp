@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <arpa/inet.h>
 #include <array>
-#include <cstdio>
 #include <linux/if_addr.h>
 #include <linux/rtnetlink.h>
 
@@ -29,20 +28,13 @@ std::optional<Identifier> IdentifierOf(const std::string& address)
 /** The identifier that follows from a link address by itself. */
 std::optional<Identifier> IdentifierOfMac(const std::string& mac)
 {
-    std::array<unsigned, 6> bytes{};
-    if (std::sscanf(mac.c_str(), "%2x:%2x:%2x:%2x:%2x:%2x", &bytes[0], &bytes[1], &bytes[2],
-                    &bytes[3], &bytes[4], &bytes[5]) != 6) {
+    const auto bytes = MacBytes(mac);
+    if (!bytes) {
         return std::nullopt;
     }
-    const auto byte = [&](std::size_t index) { return static_cast<unsigned char>(bytes[index]); };
-    return Identifier{static_cast<unsigned char>(byte(0) ^ 2U),
-                      byte(1),
-                      byte(2),
-                      0xff,
-                      0xfe,
-                      byte(3),
-                      byte(4),
-                      byte(5)};
+    const auto& [first, second, third, fourth, fifth, sixth] = *bytes;
+    return Identifier{
+        static_cast<unsigned char>(first ^ 2U), second, third, 0xff, 0xfe, fourth, fifth, sixth};
 }
 
 std::string TextOf(const Identifier& identifier)

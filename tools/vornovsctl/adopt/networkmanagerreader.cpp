@@ -300,7 +300,7 @@ void ReadOptions(const HostView& host, Wish& wish)
         lease.domain = options["DHCP4.domain_name"];
         lease.seconds =
             vornhost::ToNumber(options["DHCP4.dhcp_lease_time"], 0, UINT32_MAX).value_or(0);
-        const std::int64_t end = std::atoll(options["DHCP4.expiry"].c_str());
+        const std::int64_t end = std::strtoll(options["DHCP4.expiry"].c_str(), nullptr, 10);
         lease.begin = end == 0 ? 0 : end - lease.seconds;
         wish.lease = lease;
     }

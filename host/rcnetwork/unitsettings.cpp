@@ -196,7 +196,8 @@ void UnitPlanner::MoveIpv6Stack()
     if (Live(former, kDisableIpv6) != off) {
         Set(Settings(), Carrier(), kDisableIpv6, off);
     }
-    if ((mode != kAddressModeNone || off != "0") && !HasOwnLinkLocal()) {
+    const bool goes = m_unit.takeDown && m_former.made;
+    if ((mode != kAddressModeNone || off != "0") && !HasOwnLinkLocal() && !goes) {
         Set(m_steps.settingsAfter, Carrier(), kAddressMode, mode);
     }
     if (Carrier() == m_unit.name) {

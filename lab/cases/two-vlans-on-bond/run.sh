@@ -14,7 +14,6 @@ for bond in bond0 bond1; do
 done
 probes_finish Register 100
 pull_each_cable bond0 1000
-stop_and_start
 
 step "Start from the files, as after a loss of power"
 for bridge in $(ovs-vsctl list-br); do

@@ -4,6 +4,7 @@
 
 #include "support/atomicfile.h"
 #include "support/interfacename.h"
+#include "support/interfacevalues.h"
 #include "support/process.h"
 #include "support/runlock.h"
 #include "support/servicemanager.h"
@@ -11,6 +12,7 @@
 
 #include <array>
 #include <cerrno>
+#include <climits>
 #include <csignal>
 #include <cstring>
 #include <filesystem>
@@ -100,7 +102,8 @@ std::vector<pid_t> ProcessesOf(pid_t leader)
     std::vector<pid_t> ids;
     std::error_code error;
     for (const auto& entry : fs::directory_iterator("/proc", error)) {
-        const pid_t id = std::atoi(entry.path().filename().c_str());
+        const auto number = ToNumber(entry.path().filename(), 1, INT_MAX);
+        const auto id = static_cast<pid_t>(number.value_or(0));
         const auto process = id > 0 ? ReadProcess(id) : std::nullopt;
         if (process && !process->ended && process->group == leader && IsClientName(process->name)) {
             ids.push_back(id);

@@ -1,6 +1,8 @@
 #include "clientoptions.h"
 
+#include <algorithm>
 #include <array>
+#include <charconv>
 #include <cstdint>
 #include <cstdio>
 #include <sstream>
@@ -14,14 +16,20 @@ constexpr char kEthernetId[] = "01:";
 constexpr unsigned kLeastMetric = 1000;
 constexpr unsigned kMetricPerVlan = 100;
 constexpr unsigned kVlanShift = 20;
+constexpr size_t kTailDigits = 8;
+constexpr int kHexadecimal = 16;
 
-/** The last four bytes of a link address as a number. */
+/** The last four bytes of a link address as a number; 0 when it is none. */
 std::uint32_t TailOf(const std::string& mac)
 {
-    std::array<unsigned, 6> bytes{};
-    (void)std::sscanf(mac.c_str(), "%x:%x:%x:%x:%x:%x", &bytes[0], &bytes[1], &bytes[2], &bytes[3],
-                      &bytes[4], &bytes[5]);
-    return (bytes[2] << 24U) | (bytes[3] << 16U) | (bytes[4] << 8U) | bytes[5];
+    std::string digits = mac;
+    std::erase(digits, ':');
+    std::uint32_t number = 0;
+    if (digits.size() >= kTailDigits) {
+        const char* const end = digits.data() + digits.size();
+        (void)std::from_chars(end - kTailDigits, end, number, kHexadecimal);
+    }
+    return number;
 }
 
 std::string Hexadecimal(std::uint32_t number)

@@ -70,6 +70,10 @@ bool UnitPlanner::IsCarried(const Address& address) const
     if (!IsLinkLocal(address)) {
         return true;
     }
+    // A stop takes the member out of its bond last, and until then the kernel refuses it one.
+    if (m_unit.takeDown && m_unit.carrierLink != nullptr && IsReleased(*m_unit.carrierLink)) {
+        return false;
+    }
     // The kernel makes the link-local address of a port as soon as that has a carrier.
     if (!ToSwitch() && !WireHasCarrier()) {
         return false;

@@ -141,6 +141,15 @@ void UnitPlanner::KeepOwnSetting(const std::string& setting)
 
 void UnitPlanner::ReturnSettings()
 {
+    // A run that was cut short has left the device that it made deaf to routers.
+    const auto hears = m_record.ownSettings.find(kAcceptRouters);
+    const bool made = m_unit.IsGroup() || m_unit.kind == UnitKind::kVlan;
+    if (!m_quiet && made && Carrier() == m_unit.name && hears != m_record.ownSettings.end()) {
+        if (Live(Carrier(), kAcceptRouters) != hears->second && !m_unit.takeDown) {
+            Set(m_steps.settingsAfter, Carrier(), kAcceptRouters, hears->second);
+        }
+        m_record.ownSettings.erase(hears);
+    }
     for (const Link* member : m_unit.members) {
         InterfaceRecord& record = m_steps.records[member->name];
         for (const auto& [setting, own] : record.ownSettings) {
@@ -167,6 +176,7 @@ void UnitPlanner::CarrySettings()
         if (m_quiet && setting == kAcceptRouters) {
             if (value != "0") {
                 Set(m_steps.settingsAfter, Carrier(), setting, value);
+                m_record.ownSettings[kAcceptRouters] = value;
             }
         } else if (!HasOwnWay(setting) && Live(former, setting) != value) {
             Set(Settings(), Carrier(), setting, value);
@@ -196,7 +206,8 @@ void UnitPlanner::MoveIpv6Stack()
     if (Live(former, kDisableIpv6) != off) {
         Set(Settings(), Carrier(), kDisableIpv6, off);
     }
-    if ((mode != kAddressModeNone || off != "0") && !HasOwnLinkLocal()) {
+    const bool goes = m_unit.takeDown && m_former.made;
+    if ((mode != kAddressModeNone || off != "0") && !HasOwnLinkLocal() && !goes) {
         Set(m_steps.settingsAfter, Carrier(), kAddressMode, mode);
     }
     if (Carrier() == m_unit.name) {

@@ -58,7 +58,7 @@ bool InterfaceFile::UsesClient() const
 std::string InterfaceParser::Hex(const std::string& key, size_t least, size_t most)
 {
     const std::string value = Value(key);
-    const std::string bytes = value.empty() ? std::string() : HexBytes(value, least, most);
+    std::string bytes = value.empty() ? std::string() : HexBytes(value, least, most);
     if (bytes.empty() && !value.empty()) {
         Refuse(key, "not " + std::to_string(least) + " to " + std::to_string(most) +
                         " bytes in hexadecimal digits");

@@ -282,7 +282,7 @@ std::optional<LinkCommand> ParseLinkCommand(const std::string& text)
 std::optional<Route> ParseRoute(const std::string& text, std::string& problem)
 {
     RouteParser parser(text);
-    const auto route = parser.Parse();
+    auto route = parser.Parse();
     problem = parser.Problem();
     return route;
 }

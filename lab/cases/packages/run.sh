@@ -194,7 +194,7 @@ install_by_hand()
 
     step "Remove once somebody else rules"
     expect_success systemctl -q disable vornovs-network.service vornovs-network-wait-online.service
-    expect_success packages_apt purge libvornovs1 vornovs-host vornovs-tools
+    expect_success packages_apt purge libvornovs1 vornovs-host
     expect_same_host "after the second purge"
     host_files >"$lab_out/files-purged"
     expect_same_text "the host's files" "$lab_out/files-before" "$lab_out/files-purged"

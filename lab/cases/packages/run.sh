@@ -7,7 +7,7 @@ host_files()
 {
     find / -xdev \( -path /lab -o -path /var/log -o -path /var/cache -o -path /var/lib/dpkg \
         -o -path /var/lib/apt -o -path /var/lib/systemd -o -path /var/backups -o -path /root \
-        -o -path /tmp \) -prune -o -printf '%M %u:%g %y %p %l\n' |
+        -o -path /tmp -o -path /var/tmp \) -prune -o -printf '%M %u:%g %y %p %l\n' |
         grep -v -e ' /etc/ld.so.cache' -e ' /etc/apt/sources.list.d/vornovs.list' \
             -e ' /etc/openvswitch' -e ' /var/lib/openvswitch' -e ' /etc/\.resolv' | sort
 }
@@ -194,7 +194,7 @@ install_by_hand()
 
     step "Remove once somebody else rules"
     expect_success systemctl -q disable vornovs-network.service vornovs-network-wait-online.service
-    expect_success packages_apt purge libvornovs1 vornovs-host vornovs-tools
+    expect_success packages_apt purge libvornovs1 vornovs-host
     expect_same_host "after the second purge"
     host_files >"$lab_out/files-purged"
     expect_same_text "the host's files" "$lab_out/files-before" "$lab_out/files-purged"

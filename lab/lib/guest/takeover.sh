@@ -176,7 +176,15 @@ expect_given_back()
     # What differs after that is told by the comparison.
     (wait_until 60 manager_has_settled >/dev/null) || rm -f "$lab_out/failure"
     snapshot "$1"
-    expect_unchanged managed "$1"
+    rm -rf "$lab_out/snapshots/managed-$1"
+    cp -r "$lab_out/snapshots/managed" "$lab_out/snapshots/managed-$1"
+    if [ "$1" = released ] && [ "$(manager_name)" != ifupdown ]; then
+        # Only where the kernel itself listens to routers does it matter what the kernel would do
+        # with a prefix; it is as it was after the reboot.
+        sed -i '/^net\/ipv6\/conf\/[^/]*\/autoconf:/d' "$lab_out/snapshots/released/sysctls" \
+            "$lab_out/snapshots/managed-released/sysctls"
+    fi
+    expect_unchanged "managed-$1" "$1"
     packages_units >"$lab_out/got-units"
     expect_same_text "$1: what starts with the machine" "$lab_out/managed-units" \
         "$lab_out/got-units"

@@ -93,7 +93,8 @@ bool Leave(const Request& request)
     for (const std::string& name : request.names) {
         std::string error;
         if (clients.contains(name) && !DropClient(name, error)) {
-            Say({Severity::kError, "the client of " + std::string(name).append(": ").append(error)});
+            Say({Severity::kError,
+                 "the client of " + std::string(name).append(": ").append(error)});
             done = false;
         }
     }

@@ -68,8 +68,13 @@ TEST(BondIPConflict, IsNoneWithoutAddresses)
     EXPECT_EQ(Conflict(Host("IPADDR=192.0.2.10/24\n", "")), "none");
     EXPECT_EQ(Conflict(Host("IPADDR=\nNETMASK=\n", "IPADDR=192.0.2.1/24\n")), "none");
     EXPECT_EQ(Conflict(Host("IPV6ADDR=2001:db8::1/64\n", "IPV6ADDR=2001:db8::2/64\n")), "none");
+    EXPECT_EQ(Conflict(Host("IPADDR=192.0.2.10/24\n", "BOOTPROTO=dhcp\n")), "none");
+}
+
+TEST(BondIPConflict, MayBeAnAddressBesideALease)
+{
     EXPECT_EQ(Conflict(Host("IPADDR=192.0.2.10/24\n", "BOOTPROTO=dhcp\nIPADDR=192.0.2.1/24\n")),
-              "none");
+              "1 eth2");
 }
 
 TEST(BondIPConflict, MayBeTheBondsOwnOtherSlave)

@@ -144,7 +144,7 @@ void UnitPlanner::ChangeMode(const LiveBond& live, const BondOptions& options)
     for (const std::string& member : members) {
         const std::string link = "link set dev " + member;
         lines.push_back(link + " down");
-        lines.push_back(link + " master " + bond);
+        lines.push_back(std::string(link).append(" master ").append(bond));
     }
     m_remarks.push_back({Severity::kNotice, bond + " changes its mode to " + options.Get("mode")});
 }

@@ -158,7 +158,7 @@ void CompleteFromKernel(const HostView& host, Wish& wish)
 {
     const vornhost::Link* const link = host.live.Find(wish.name);
     if (link == nullptr) {
-        wish.obstacles.push_back("there is no such interface");
+        wish.obstacles.emplace_back("there is no such interface");
         return;
     }
     ReadKind(host, *link, wish);

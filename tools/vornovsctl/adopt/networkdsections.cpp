@@ -402,7 +402,9 @@ void TakeNetworkdSection(const IniSection& section, const std::string& path, Wis
     for (const auto& [key, value] : section.keys) {
         const auto take = keys->find(key);
         if (take == keys->end() || !take->second(value, wish)) {
-            wish.obstacles.push_back(path + ": " + key + '=' + value + " cannot be carried over");
+            std::string obstacle = path;
+            obstacle.append(": ").append(key).append("=").append(value);
+            wish.obstacles.push_back(obstacle.append(" cannot be carried over"));
         }
     }
 }

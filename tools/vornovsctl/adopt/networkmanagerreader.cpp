@@ -210,7 +210,7 @@ private:
             if (sign != std::string::npos) {
                 const std::string value = word.substr(sign + 1);
                 if (name == "table" || name == "src") {
-                    route += ' ' + name + ' ' + value;
+                    route.append(" ").append(name).append(" ").append(value);
                 } else if (name == "onlink") {
                     route += value == "true" ? " onlink" : "";
                 } else {

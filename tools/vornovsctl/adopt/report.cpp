@@ -63,7 +63,7 @@ std::string ObstaclesText(const Wishes& wishes)
     std::string text;
     for (const auto& [name, wish] : wishes) {
         for (const std::string& obstacle : wish.obstacles) {
-            text += (text.empty() ? "" : "\n") + name + ": " + obstacle;
+            text.append(text.empty() ? "" : "\n").append(name).append(": ").append(obstacle);
         }
     }
     return text;

@@ -66,7 +66,7 @@ bool TakeRouteWords(const Words& words, std::size_t from, const std::string& int
                 return false;
             }
         } else if (IsOneOf(word, {"via", "metric", "src", "table"})) {
-            route += ' ' + word + ' ' + value;
+            route.append(" ").append(word).append(" ").append(value);
         } else if (word == "proto" || (word == "scope" && value == "link")) {
             continue; // what it would be anyway, or what is only a mark
         } else {
@@ -130,10 +130,8 @@ bool TakeOldRoute(const Words& words, Wish& wish)
             destination = word;
         } else if (index + 1 == words.size()) {
             return false;
-        } else if (const std::string& value = words[++index]; word == "gw") {
-            rest += " via " + value;
-        } else if (word == "metric") {
-            rest += " metric " + value;
+        } else if (const std::string& value = words[++index]; word == "gw" || word == "metric") {
+            rest.append(word == "gw" ? " via " : " metric ").append(value);
         } else if (word == "netmask") {
             const auto length = vornhost::MaskLength(value);
             destination += length ? '/' + std::to_string(*length) : "";

@@ -44,14 +44,9 @@ protected:
         ASSERT_EQ(RunProgram({"chmod", "0755", path}), kSilentSuccess);
     }
 
-    static int Retriers()
+    static size_t Retriers()
     {
-        const std::string beginning("rc.network\0retry", 16);
-        int count = 0;
-        for (const auto& entry : std::filesystem::directory_iterator("/proc")) {
-            count += ReadFile(entry.path() / "cmdline").rfind(beginning, 0) == 0 ? 1 : 0;
-        }
-        return count;
+        return Processes("cmdline", std::string("rc.network\0retry", 16)).size();
     }
 
     static void OnSwitch()
@@ -83,7 +78,7 @@ TEST_F(Automatic, OnlyOneRunTriesAgain)
     EXPECT_EQ(RcNetwork({"start"}).exitCode, 1);
     EXPECT_EQ(RcNetwork({"retry"}), kSilentSuccess) << "it leaves the work to the other one";
 
-    EXPECT_EQ(Retriers(), 1);
+    EXPECT_EQ(Retriers(), 1U);
 }
 
 TEST_F(Automatic, NobodyTriesAgainOnceTheFilesWantNoSwitch)
@@ -163,7 +158,7 @@ TEST_F(Automatic, SystemdStartsTheSwitchAndRunsWhatTriesAgain)
     EXPECT_THAT(systemd.Jobs(), ElementsAre("StartUnit vornovs-db.service",
                                             "StartUnit vornovs-network-retry.service"));
     EXPECT_EQ(Network(), "eth0 192.0.2.5/24\n");
-    EXPECT_EQ(Retriers(), 0);
+    EXPECT_EQ(Retriers(), 0U);
 }
 
 TEST_F(Automatic, BootWaitsForAnInterfaceThatIsSlow)

@@ -5,7 +5,6 @@
 #include <algorithm>
 #include <csignal>
 #include <cstdlib>
-#include <filesystem>
 #include <string>
 
 #include <sys/mount.h>
@@ -20,20 +19,6 @@ using testing::StartsWith;
 constexpr char kServersLog[] = "/run/servers.log";
 constexpr char kServersProcess[] = "/run/servers.pid";
 constexpr char kDhcp[] = "DEVICE=eth0\nBOOTPROTO=dhcp\nIPV6_AUTOCONF=yes\nDHCPV6C=no\nMETRIC=7\n";
-
-/** Whether a client is at work in this test's network; there may be others on the machine. */
-bool AnyClientRuns()
-{
-    std::error_code gone;
-    const auto here = std::filesystem::read_symlink("/proc/self/ns/net");
-    for (const auto& process : std::filesystem::directory_iterator("/proc")) {
-        if (ReadFile(process.path() / "comm") == "dhcpcd\n" &&
-            std::filesystem::read_symlink(process.path() / "ns/net", gone) == here) {
-            return true;
-        }
-    }
-    return false;
-}
 
 /** A host with a real client and, in another network, a real server and router. */
 class DhcpHost : public Host {
@@ -197,7 +182,7 @@ TEST_F(DhcpHost, AClientThatWasKilledIsStartedAnewAndAStopEndsIt)
     EXPECT_EQ(Served("eth0"), "on eth0");
     EXPECT_THAT(ReadFile("/etc/resolv.conf"), testing::Not(HasSubstr("nameserver")));
     EXPECT_EQ(ReadFile("/proc/sys/net/ipv6/conf/eth0/accept_ra"), "1\n");
-    EXPECT_TRUE(WaitUntil([] { return !AnyClientRuns(); }));
+    EXPECT_TRUE(WaitUntil([] { return Processes("comm", "dhcpcd\n").empty(); }));
     EXPECT_EQ(Requests("DHCPDISCOVER"), 1);
     EXPECT_EQ(Requests("DHCPRELEASE"), 0);
 }

@@ -46,14 +46,7 @@ protected:
     /** The folders of the processes that wait for the end of a hold. */
     static std::vector<std::filesystem::path> Holders()
     {
-        const std::string beginning("rc.network\0holder", 17);
-        std::vector<std::filesystem::path> holders;
-        for (const auto& entry : std::filesystem::directory_iterator("/proc")) {
-            if (ReadFile(entry.path() / "cmdline").rfind(beginning, 0) == 0) {
-                holders.push_back(entry.path());
-            }
-        }
-        return holders;
+        return Processes("cmdline", std::string("rc.network\0holder", 17));
     }
 };
 

@@ -85,6 +85,20 @@ bool WaitUntil(const std::function<bool()>& condition)
     return true;
 }
 
+std::vector<std::filesystem::path> Processes(const std::string& file, const std::string& beginning)
+{
+    std::vector<std::filesystem::path> found;
+    std::error_code ended;
+    const auto here = std::filesystem::read_symlink("/proc/self/ns/net");
+    for (const auto& process : std::filesystem::directory_iterator("/proc")) {
+        if (ReadFile(process.path() / file).rfind(beginning, 0) == 0 &&
+            std::filesystem::read_symlink(process.path() / "ns/net", ended) == here) {
+            found.push_back(process.path());
+        }
+    }
+    return found;
+}
+
 void Host::SetUp()
 {
     Delete(kState);

@@ -9,6 +9,7 @@
 #include <gtest/gtest.h>
 
 #include <chrono>
+#include <filesystem>
 #include <functional>
 #include <string>
 #include <vector>
@@ -29,6 +30,12 @@ std::string Snapshot();
 
 /** Waits until a condition holds. @return  false when it did not within 20 seconds. */
 bool WaitUntil(const std::function<bool()>& condition);
+
+/**
+ * The folders in /proc of the processes in this test's network whose file there begins so: others
+ * on the machine are those of tests that run side by side.
+ */
+std::vector<std::filesystem::path> Processes(const std::string& file, const std::string& beginning);
 
 /** The ports eth0 and eth1, down and without addresses, and their cables. */
 class Host : public testing::Test {

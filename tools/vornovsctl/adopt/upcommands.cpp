@@ -126,11 +126,17 @@ bool TakeOldRoute(const Words& words, Wish& wish)
         const std::string& word = words[index];
         if (word == "-net" || word == "-host") {
             host = word == "-host";
-        } else if (destination.empty()) {
+            continue;
+        }
+        if (destination.empty()) {
             destination = word;
-        } else if (index + 1 == words.size()) {
+            continue;
+        }
+        if (index + 1 == words.size()) {
             return false;
-        } else if (const std::string& value = words[++index]; word == "gw" || word == "metric") {
+        }
+        const std::string& value = words[++index];
+        if (word == "gw" || word == "metric") {
             rest.append(word == "gw" ? " via " : " metric ").append(value);
         } else if (word == "netmask") {
             const auto length = vornhost::MaskLength(value);

@@ -1,5 +1,6 @@
 # shellcheck shell=bash disable=SC2154 # variables of the guest's other files
 
+lab_packages=/lab/packages/vornovs
 lab_unit_link=/etc/systemd/system/multi-user.target.wants/vornovs-network.service
 
 # Everything on the disk, with mode, owner and size; without what logs, caches and clocks change.

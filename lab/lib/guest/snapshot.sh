@@ -116,7 +116,8 @@ snapshot_files()
     # One process for all of them: a process is what an emulated processor is slowest at.
     if [ -s "$1/file-list" ]; then
         tr '\n' '\0' <"$1/file-list" | xargs -0 stat -c '%A %U:%G %n' >"$1/file-modes"
-        tr '\n' '\0' <"$1/file-list" | xargs -0 cp -p --parents -t "$1/files"
+        # Names of folders above are taken as if this were the root.
+        tr '\n' '\0' <"$1/file-list" | (cd / && xargs -0 cp -p --parents -t "$1/files")
     fi
     rm "$1/file-list"
 }

@@ -25,10 +25,11 @@ bearer()
     fi
 }
 
-# Addresses without what changes by itself: temporary ones, and the time that they are good for.
+# Addresses without what changes by itself: temporary ones and those that once were, and the time
+# that they are good for.
 steady_addresses()
 {
-    ip -oneline address show dev "$1" scope global | grep -v ' temporary ' |
+    ip -oneline address show dev "$1" scope global | grep -v -e ' temporary ' -e ' deprecated ' |
         awk '{ for (i = 3; i <= NF; i++) if ($i == "inet" || $i == "inet6") print $i, $(i + 1) }' |
         sort
 }

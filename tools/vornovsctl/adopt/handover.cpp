@@ -171,37 +171,42 @@ void MarkNetworkRoutes(const HostView& host, const std::string& name, const char
     }
 }
 
-/** For the moment in which the daemon takes over it is to leave everything as it finds it. */
+/** For the moment in which the daemon takes over it is to leave what is lasting as it finds it. */
 std::string KeepPathOf(const AdoptedInterface& interface)
 {
     return "/run/systemd/network/" + interface.origin.substr(interface.origin.rfind('/') + 1) +
            ".d/zz-vornovs-keep.conf";
 }
 
-void GiveToNetworkd(const HostView& host, const AdoptionRecord& record,
-                    const std::set<std::string>& names, Hands& hands)
+Standby GiveToNetworkd(const HostView& host, const AdoptionRecord& record,
+                       const std::set<std::string>& names, Hands& hands)
 {
     if (!IsActive(host, kNetworkdUnit)) {
-        return;
+        return {};
     }
     if (!Owns(record, names, Manager::kNetworkd)) {
         (void)hands.Run({"networkctl", "reload"});
-        return;
+        return {};
     }
     std::set<std::string> paths;
+    std::set<std::string> own;
     for (const AdoptedInterface& interface : record.interfaces) {
         if (interface.manager == Manager::kNetworkd && names.contains(interface.name)) {
             paths.insert(KeepPathOf(interface));
+            own.insert(interface.name);
         }
     }
     for (const std::string& path : paths) {
-        hands.Write(path, "[Network]\nKeepConfiguration=yes\n", kReadable);
+        hands.Write(path, "[Network]\nKeepConfiguration=static\n", kReadable);
     }
+    Standby standby = StandbyFor(host, own);
+    PutUp(standby, host, hands);
     StartAnew(kNetworkdUnit, hands);
     for (const std::string& path : paths) {
         hands.Remove(path);
         hands.RemoveEmptyFolder(path.substr(0, path.rfind('/')));
     }
+    return standby;
 }
 
 /**
@@ -333,18 +338,12 @@ void TakeFromManagers(const HostView& host, const AdoptionRecord& record,
     }
 }
 
-void CheckForDuplicatesAgain(const std::set<std::string>& names, Hands& hands)
+LooseEnds GiveToManagers(const HostView& host, const AdoptionRecord& record,
+                         const std::set<std::string>& names, Hands& hands)
 {
-    for (const std::string& name : names) {
-        CheckForDuplicates(name, true, hands);
-    }
-}
-
-std::set<std::string> GiveToManagers(const HostView& host, const AdoptionRecord& record,
-                                     const std::set<std::string>& names, Hands& hands)
-{
-    GiveToNetworkd(host, record, names, hands);
-    std::set<std::string> unchecked = GiveToNetworkManager(host, record, names, hands);
+    LooseEnds ends;
+    ends.standby = GiveToNetworkd(host, record, names, hands);
+    ends.unchecked = GiveToNetworkManager(host, record, names, hands);
     for (const AdoptedInterface& interface : record.interfaces) {
         if (!names.contains(interface.name)) {
             continue;
@@ -359,7 +358,15 @@ std::set<std::string> GiveToManagers(const HostView& host, const AdoptionRecord&
             }
         }
     }
-    return unchecked;
+    return ends;
+}
+
+void TieUp(const LooseEnds& ends, const HostView& now, Hands& hands)
+{
+    TakeDown(ends.standby, now, hands);
+    for (const std::string& name : ends.unchecked) {
+        CheckForDuplicates(name, true, hands);
+    }
 }
 
 } // namespace vornovsctl

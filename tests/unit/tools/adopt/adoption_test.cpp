@@ -483,7 +483,7 @@ TEST(NetworkManager, IsToldWhichProfileIsActiveWhenItGetsAnInterfaceBack)
     host.Write("/proc/sys/net/ipv6/conf/eth0/accept_dad", "1\n");
     hands.runs.clear();
 
-    EXPECT_THAT(vornovsctl::PerformRelease(host.view, {"eth0"}, record, hands),
+    EXPECT_THAT(vornovsctl::PerformRelease(host.view, {"eth0"}, record, hands).unchecked,
                 ElementsAre("eth0"));
 
     EXPECT_THAT(hands.runs, Contains("sysctl -q -w net/ipv6/conf/eth0/accept_dad=0"));

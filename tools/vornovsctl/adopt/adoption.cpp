@@ -1,5 +1,6 @@
 #include "adopt/adoption.h"
 
+#include "adopt/kernelsettings.h"
 #include "adopt/livedetails.h"
 #include "adopt/networkdreader.h"
 #include "adopt/networkmanagerreader.h"
@@ -116,6 +117,7 @@ AdoptedInterface InterfaceOf(const HostView& host, const Hands& hands, const Wis
     }
     interface.clients = ClientsOf(host, wish.name);
     interface.stateLine = StateLineOf(host, wish.name);
+    interface.settings = KernelSettingsOf(host, wish.name);
     return interface;
 }
 
@@ -220,6 +222,7 @@ LooseEnds PerformRelease(const HostView& host, const std::set<std::string>& name
         }
     }
     (void)RunNetwork("leave", names, hands);
+    RestoreKernelSettings(host, record, names, hands);
     LooseEnds ends = GiveToManagers(host, record, names, hands);
     std::erase_if(record.interfaces, [&](const AdoptedInterface& interface) {
         return names.contains(interface.name);

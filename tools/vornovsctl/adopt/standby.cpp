@@ -1,6 +1,8 @@
 #include "adopt/standby.h"
 
 #include <algorithm>
+#include <arpa/inet.h>
+#include <array>
 #include <linux/if_addr.h>
 #include <linux/rtnetlink.h>
 #include <sys/socket.h>
@@ -9,22 +11,85 @@ namespace vornovsctl {
 
 namespace {
 
-constexpr unsigned kWholeAddress = 32;
-constexpr unsigned kHalfAddress = 64;
+constexpr unsigned kWholeAddress4 = 32;
+constexpr unsigned kWholeAddress6 = 128;
+constexpr unsigned kHalfAddress6 = 64;
 constexpr std::uint32_t kEver = UINT32_MAX;
+constexpr std::uint32_t kKernelMetric6 = 256;
 
-bool IsStoodInFor(const vornhost::Address& address)
+bool Has(const vornhost::Address& address, std::uint32_t flag)
 {
-    return address.scope == RT_SCOPE_UNIVERSE && address.preferredSeconds != kEver &&
-           address.peer.empty() && (address.flags & IFA_F_DEPRECATED) == 0 &&
-           (address.family == AF_INET6 || address.prefixLength < kWholeAddress);
+    return (address.flags & flag) != 0;
 }
 
-bool IsStoodInFor(const vornhost::Route& route)
+bool IsDynamic(const vornhost::Address& address)
 {
-    return route.type == RTN_UNICAST && route.nextHops.size() == 1 &&
-           (route.nextHops.front().gateway.empty() ||
-            route.nextHops.front().gatewayFamily == route.family);
+    return address.preferredSeconds != kEver;
+}
+
+/** Whether a manager would not go on with an address as it is. */
+bool IsStoodInFor(const vornhost::Address& address, Manager manager)
+{
+    if (!address.peer.empty() || Has(address, IFA_F_DEPRECATED) ||
+        (address.family == AF_INET && address.prefixLength >= kWholeAddress4)) {
+        return false;
+    }
+    const bool isLocal = address.family == AF_INET6 && address.scope == RT_SCOPE_LINK;
+    const bool isGlobal = address.scope == RT_SCOPE_UNIVERSE;
+    switch (manager) {
+    case Manager::kNetworkd:
+        return isGlobal && IsDynamic(address);
+    case Manager::kNetworkManager:
+        return (isGlobal || isLocal) && !Has(address, IFA_F_NOPREFIXROUTE | IFA_F_TEMPORARY);
+    case Manager::kIfupdown:
+        // What routers tell is up to the kernel.
+        return isGlobal && IsDynamic(address) &&
+               (address.family == AF_INET || address.prefixLength == kWholeAddress6);
+    case Manager::kNobody:
+        break;
+    }
+    return false;
+}
+
+bool IsStoodInFor(const vornhost::Route& route, Manager manager)
+{
+    const bool simple = route.type == RTN_UNICAST && route.nextHops.size() == 1 &&
+                        (route.nextHops.front().gateway.empty() ||
+                         route.nextHops.front().gatewayFamily == route.family);
+    // Nobody makes the fixed ones again on behalf of ifupdown.
+    return simple && (manager == Manager::kNetworkd || manager == Manager::kNetworkManager ||
+                      (manager == Manager::kIfupdown && route.protocol == RTPROT_DHCP));
+}
+
+std::string NetworkOf(const vornhost::Address& address)
+{
+    std::array<unsigned char, sizeof(in6_addr)> bytes{};
+    std::array<char, INET6_ADDRSTRLEN> text{};
+    if (inet_pton(address.family, address.local.c_str(), bytes.data()) != 1) {
+        return "";
+    }
+    for (unsigned bit = address.prefixLength; bit < 8 * bytes.size(); ++bit) {
+        bytes.at(bit / 8) &= static_cast<unsigned char>(~(0x80U >> (bit % 8)));
+    }
+    return inet_ntop(address.family, bytes.data(), text.data(), text.size()) == nullptr
+               ? ""
+               : text.data();
+}
+
+/** The route that the kernel has made of an address, and that goes with it. */
+vornhost::Route KernelRouteOf(const vornhost::Address& address)
+{
+    vornhost::Route route;
+    route.family = address.family;
+    route.table = RT_TABLE_MAIN;
+    route.protocol = RTPROT_KERNEL;
+    route.destination = NetworkOf(address);
+    route.prefixLength = address.prefixLength;
+    route.source = address.family == AF_INET ? address.local : "";
+    route.priority =
+        address.family == AF_INET6 && address.metric == 0 ? kKernelMetric6 : address.metric;
+    route.nextHops.push_back({address.index, "", 0, 1, false});
+    return route;
 }
 
 std::string Length(const vornhost::Address& address)
@@ -37,50 +102,76 @@ std::string Lifetime(std::uint32_t seconds)
     return seconds == kEver ? "forever" : std::to_string(seconds);
 }
 
-/** "change ADDRESS ..." with what the address shall be good for. */
-std::string ChangeOf(const vornhost::Address& address, const std::string& device,
-                     std::uint32_t valid, std::uint32_t preferred)
+std::string Lifetimes(std::uint32_t valid, std::uint32_t preferred)
 {
-    const bool temporary = (address.flags & IFA_F_TEMPORARY) != 0;
-    const bool own = address.family == AF_INET6 && address.prefixLength == kHalfAddress;
-    return "address change " + address.local +
-           (address.family == AF_INET ? "/32" : Length(address)) + " dev " + device +
-           (address.family == AF_INET || (address.flags & IFA_F_NOPREFIXROUTE) != 0
-                ? " noprefixroute"
-                : "") +
-           (own && !temporary ? " mngtmpaddr" : "") + " valid_lft " + Lifetime(valid) +
-           " preferred_lft " + Lifetime(preferred) + '\n';
+    return " valid_lft " + Lifetime(valid) + " preferred_lft " + Lifetime(preferred) + '\n';
 }
 
-std::string TextOf(const vornhost::Route& route, const std::string& device)
+/** As its manager would have made an address of IPv6, which can be said of one that is there. */
+std::string ChangeOf(const StoodInAddress& entry, bool forEver)
 {
-    const vornhost::NextHop& hop = route.nextHops.front();
+    const vornhost::Address& address = entry.address;
+    const bool bare = entry.manager == Manager::kIfupdown;
+    const bool own = entry.manager == Manager::kNetworkd && !Has(address, IFA_F_TEMPORARY) &&
+                     address.prefixLength == kHalfAddress6;
+    return "address change " + address.local + Length(address) + " dev " + entry.device +
+           (address.scope == RT_SCOPE_LINK ? " scope link" : "") + (bare ? "" : " noprefixroute") +
+           (own ? " mngtmpaddr" : "") +
+           Lifetimes(forEver ? kEver : address.validSeconds,
+                     forEver ? kEver : address.preferredSeconds);
+}
+
+std::string TextOf(const StoodInRoute& entry)
+{
+    const vornhost::Route& route = entry.route;
+    const std::string& gateway = route.nextHops.front().gateway;
     const std::string destination =
         route.destination.empty() ? std::string("default")
                                   : route.destination + '/' + std::to_string(route.prefixLength);
-    return destination + (hop.gateway.empty() ? "" : " via " + hop.gateway) + " dev " + device +
+    return destination + (gateway.empty() ? "" : " via " + gateway) + " dev " + entry.device +
            " table " + std::to_string(route.table);
 }
 
-std::string OriginalOf(const vornhost::Route& route, const std::string& device)
+/** With a metric of its own: a manager would believe that one of the same is what it wants. */
+std::string SubstituteOf(const StoodInRoute& entry)
 {
-    return TextOf(route, device) + " proto " + std::to_string(route.protocol) + " metric " +
-           std::to_string(route.priority) + '\n';
+    return TextOf(entry) + " proto static metric " + std::to_string(entry.route.priority + 1);
 }
 
-/** Of a metric of its own: systemd-networkd would take one of the same for what it wants to make.
- */
-std::string SubstituteOf(const vornhost::Route& route, const std::string& device)
+std::string NewSubstituteOf(const StoodInRoute& entry)
 {
-    return TextOf(route, device) + " proto static metric " + std::to_string(route.priority + 1);
+    const vornhost::NextHop& hop = entry.route.nextHops.front();
+    const bool direct = hop.gateway.empty();
+    return "route replace " + SubstituteOf(entry) +
+           (entry.route.source.empty() ? "" : " src " + entry.route.source) +
+           (hop.onLink ? " onlink" : "") +
+           (entry.route.family == AF_INET && direct ? " scope link" : "") + '\n';
 }
 
-std::string SubstituteWords(const vornhost::Route& route)
+std::string RemovalOf(const StoodInRoute& entry)
 {
-    const bool direct = route.nextHops.front().gateway.empty();
-    return (route.source.empty() ? "" : " src " + route.source) +
-           (route.nextHops.front().onLink ? std::string(" onlink") : "") +
-           (route.family == AF_INET && direct ? " scope link" : "") + '\n';
+    return "route del " + TextOf(entry) + " proto " + std::to_string(entry.route.protocol) +
+           " metric " + std::to_string(entry.route.priority) + '\n';
+}
+
+/** Routes to networks first: those through gateways there need them. */
+std::string RouteLines(const Standby& standby, int family)
+{
+    std::string lines;
+    for (const bool direct : {true, false}) {
+        for (const StoodInRoute& entry : standby.routes) {
+            if (entry.route.family == family &&
+                entry.route.nextHops.front().gateway.empty() == direct) {
+                lines += NewSubstituteOf(entry);
+            }
+        }
+    }
+    for (const StoodInRoute& entry : standby.routes) {
+        if (entry.route.family == family && entry.route.protocol != RTPROT_KERNEL) {
+            lines += RemovalOf(entry);
+        }
+    }
+    return lines;
 }
 
 void RunBatch(int family, const std::string& lines, Hands& hands)
@@ -90,24 +181,31 @@ void RunBatch(int family, const std::string& lines, Hands& hands)
     }
 }
 
-bool IsThere(const vornhost::Address& address, const HostView& now)
+bool IsThere(const StoodInAddress& entry, const HostView& now)
 {
+    const vornhost::Address& address = entry.address;
+    // Only systemd-networkd gets one that lasts for ever meanwhile.
+    if (address.family == AF_INET6 && entry.manager != Manager::kNetworkd) {
+        return true;
+    }
     const auto& all = now.live.addresses;
     return std::any_of(all.begin(), all.end(), [&](const vornhost::Address& each) {
         return each.index == address.index && each.local == address.local &&
-               each.prefixLength == address.prefixLength && each.preferredSeconds != kEver;
+               each.prefixLength == address.prefixLength &&
+               (address.family == AF_INET || IsDynamic(each));
     });
 }
 
-bool IsThere(const vornhost::Route& route, const Standby& standby, const HostView& now)
+bool IsThere(const StoodInRoute& entry, const Standby& standby, const HostView& now)
 {
+    const vornhost::Route& route = entry.route;
     const vornhost::NextHop& hop = route.nextHops.front();
     if (hop.gateway.empty()) {
         // It may be the kernel now that makes it of the address.
         return std::all_of(standby.addresses.begin(), standby.addresses.end(),
-                           [&](const vornhost::Address& address) {
-                               return address.family != route.family ||
-                                      address.index != hop.index || IsThere(address, now);
+                           [&](const StoodInAddress& each) {
+                               return each.address.family != route.family ||
+                                      each.address.index != hop.index || IsThere(each, now);
                            });
     }
     const auto& all = now.live.routes;
@@ -120,92 +218,91 @@ bool IsThere(const vornhost::Route& route, const Standby& standby, const HostVie
     });
 }
 
-/** Routes that lead to gateways first: those through them need them. */
-std::string RouteLines(const Standby& standby, int family, const HostView& host)
-{
-    std::string lines;
-    for (const bool direct : {true, false}) {
-        for (const vornhost::Route& route : standby.routes) {
-            const vornhost::NextHop& hop = route.nextHops.front();
-            if (route.family == family && hop.gateway.empty() == direct) {
-                lines += "route replace " + SubstituteOf(route, host.NameOf(hop.index)) +
-                         SubstituteWords(route);
-            }
-        }
-    }
-    for (const vornhost::Route& route : standby.routes) {
-        if (route.family == family) {
-            lines += "route del " + OriginalOf(route, host.NameOf(route.nextHops.front().index));
-        }
-    }
-    return lines;
-}
-
 } // namespace
 
-Standby StandbyFor(const HostView& host, const std::set<std::string>& names)
+Standby StandbyFor(const HostView& host, const std::map<std::string, Manager>& managers)
 {
+    const auto managerOf = [&](const std::string& name) {
+        const auto found = managers.find(name);
+        return found == managers.end() ? Manager::kNobody : found->second;
+    };
     Standby standby;
     for (const vornhost::Address& address : host.live.addresses) {
-        if (names.contains(host.NameOf(address.index)) && IsStoodInFor(address)) {
-            standby.addresses.push_back(address);
+        const std::string name = host.NameOf(address.index);
+        if (!IsStoodInFor(address, managerOf(name))) {
+            continue;
+        }
+        standby.addresses.push_back({address, name, managerOf(name)});
+        const bool bare = address.family == AF_INET6 && managerOf(name) == Manager::kIfupdown;
+        if (!Has(address, IFA_F_NOPREFIXROUTE) && !bare) {
+            standby.routes.push_back({KernelRouteOf(address), name});
         }
     }
     for (const vornhost::Route& route : host.live.routes) {
-        if (IsStoodInFor(route) && names.contains(host.NameOf(route.nextHops.front().index))) {
-            standby.routes.push_back(route);
+        const std::string name =
+            route.nextHops.empty() ? "" : host.NameOf(route.nextHops.front().index);
+        if (IsStoodInFor(route, managerOf(name))) {
+            standby.routes.push_back({route, name});
         }
     }
     return standby;
 }
 
-void PutUp(const Standby& standby, const HostView& host, Hands& hands)
+void PutUp(const Standby& standby, Hands& hands)
 {
     for (const int family : {AF_INET, AF_INET6}) {
         std::string before;
         std::string after;
-        for (const vornhost::Address& address : standby.addresses) {
-            const std::string device = host.NameOf(address.index);
+        for (const StoodInAddress& entry : standby.addresses) {
+            const vornhost::Address& address = entry.address;
             if (address.family != family) {
                 continue;
             }
             if (family == AF_INET) {
                 // The same address with another length, beside which the former one can be anew.
-                before +=
-                    "address replace " + address.local + "/32 dev " + device + " noprefixroute\n";
-                after += "address del " + address.local + Length(address) + " dev " + device + '\n';
+                before += "address replace " + address.local + "/32 dev " + entry.device +
+                          " noprefixroute\n";
+                after += "address del " + address.local + Length(address) + " dev " + entry.device +
+                         '\n';
             } else {
-                before += ChangeOf(address, device, kEver, kEver);
+                after += ChangeOf(entry, entry.manager == Manager::kNetworkd);
             }
         }
-        RunBatch(family, before + RouteLines(standby, family, host) + after, hands);
+        RunBatch(family, before + RouteLines(standby, family) + after, hands);
     }
 }
 
 bool IsReplaced(const Standby& standby, const HostView& now)
 {
     return std::all_of(standby.addresses.begin(), standby.addresses.end(),
-                       [&](const auto& address) { return IsThere(address, now); }) &&
+                       [&](const auto& entry) { return IsThere(entry, now); }) &&
            std::all_of(standby.routes.begin(), standby.routes.end(),
-                       [&](const auto& route) { return IsThere(route, standby, now); });
+                       [&](const auto& entry) { return IsThere(entry, standby, now); });
 }
 
 void TakeDown(const Standby& standby, const HostView& now, Hands& hands)
 {
     for (const int family : {AF_INET, AF_INET6}) {
         std::string lines;
-        for (const vornhost::Route& route : standby.routes) {
-            if (route.family == family && IsThere(route, standby, now)) {
-                lines += "route del " +
-                         SubstituteOf(route, now.NameOf(route.nextHops.front().index)) + '\n';
+        for (const StoodInRoute& entry : standby.routes) {
+            if (entry.route.family == family && IsThere(entry, standby, now)) {
+                lines += "route del " + SubstituteOf(entry) + '\n';
             }
         }
-        for (const vornhost::Address& address : standby.addresses) {
-            const std::string device = now.NameOf(address.index);
-            if (address.family == family && !IsThere(address, now)) {
-                lines += ChangeOf(address, device, address.validSeconds, address.preferredSeconds);
-            } else if (address.family == family && family == AF_INET) {
-                lines += "address del " + address.local + "/32 dev " + device + '\n';
+        for (const StoodInAddress& entry : standby.addresses) {
+            const vornhost::Address& address = entry.address;
+            const std::string substitute = address.local + "/32 dev " + entry.device;
+            const bool there = IsThere(entry, now);
+            if (address.family != family || (there && family == AF_INET6)) {
+                continue;
+            }
+            if (there) {
+                lines += "address del " + substitute + '\n';
+            } else if (family == AF_INET) {
+                lines += "address change " + substitute + " noprefixroute" +
+                         Lifetimes(address.validSeconds, address.preferredSeconds);
+            } else {
+                lines += ChangeOf(entry, false);
             }
         }
         RunBatch(family, lines, hands);

@@ -1,31 +1,46 @@
 /**
- * What stands in for addresses and routes of interfaces while systemd-networkd starts with them. It
- * drops what it did not make itself before it asks servers and routers, and an address of IPv4 that
- * it finds does not become what it would have made of it.
+ * What stands in for addresses and routes of interfaces while their manager begins with them again.
+ * systemd-networkd drops what it did not make before it asks servers and routers, and none of the
+ * managers makes of an address that it finds what it would have made itself.
  */
 #ifndef VORNOVSCTL_ADOPT_STANDBY_H
 #define VORNOVSCTL_ADOPT_STANDBY_H
 
 #include "adopt/hands.h"
 #include "adopt/hostview.h"
+#include "adopt/wish.h"
 
-#include <set>
+#include <map>
 #include <string>
 #include <vector>
 
 namespace vornovsctl {
 
-/** What the interfaces had, and will have again. */
-struct Standby {
-    std::vector<vornhost::Address> addresses; /**< those of servers and routers */
-    std::vector<vornhost::Route> routes;
+/** An address as it was, and will be again. */
+struct StoodInAddress {
+    vornhost::Address address;
+    std::string device;
+    Manager manager = Manager::kNobody;
 };
 
-/** @return  what there is to stand in for. */
-Standby StandbyFor(const HostView& host, const std::set<std::string>& names);
+struct StoodInRoute {
+    vornhost::Route route;
+    std::string device;
+};
 
-/** Replaces it by what systemd-networkd keeps when it is told to keep what is lasting. */
-void PutUp(const Standby& standby, const HostView& host, Hands& hands);
+struct Standby {
+    std::vector<StoodInAddress> addresses;
+    std::vector<StoodInRoute> routes;
+};
+
+/**
+ * @param managers  the interfaces by their names.
+ * @return  what there is to stand in for.
+ */
+Standby StandbyFor(const HostView& host, const std::map<std::string, Manager>& managers);
+
+/** Replaces it by what the managers leave alone. */
+void PutUp(const Standby& standby, Hands& hands);
 
 /** Whether everything is there again by itself. */
 bool IsReplaced(const Standby& standby, const HostView& now);

@@ -12,6 +12,7 @@ namespace {
 using testing::ElementsAre;
 using testing::IsEmpty;
 using unit::RecordedHost;
+using vornovsctl::Manager;
 using vornovsctl::StandbyFor;
 
 class ListingHands : public vornovsctl::Hands {
@@ -85,7 +86,7 @@ protected:
 
 TEST_F(StandbyTest, IsLastingAndOfAMetricOfItsOwn)
 {
-    PutUp(StandbyFor(m_host.view, {"eth0"}), m_host.view, m_hands);
+    PutUp(StandbyFor(m_host.view, {{"eth0", Manager::kNetworkd}}), m_hands);
 
     EXPECT_THAT(m_hands.runs,
                 ElementsAre("-4\n"
@@ -99,19 +100,69 @@ TEST_F(StandbyTest, IsLastingAndOfAMetricOfItsOwn)
                             "route del 192.0.2.0/24 dev eth0 table 254 proto 16 metric 100\n"
                             "address del 192.0.2.17/24 dev eth0\n",
                             "-6\n"
-                            "address change 2001:db8::1:2/64 dev eth0 noprefixroute mngtmpaddr"
-                            " valid_lft forever preferred_lft forever\n"
-                            "address change 2001:db8::180/128 dev eth0 noprefixroute"
-                            " valid_lft forever preferred_lft forever\n"
                             "route replace default via fe80::1 dev eth0 table 254 proto static"
                             " metric 1025\n"
                             "route del default via fe80::1 dev eth0 table 254 proto 4"
-                            " metric 1024\n"));
+                            " metric 1024\n"
+                            "address change 2001:db8::1:2/64 dev eth0 noprefixroute mngtmpaddr"
+                            " valid_lft forever preferred_lft forever\n"
+                            "address change 2001:db8::180/128 dev eth0 noprefixroute"
+                            " valid_lft forever preferred_lft forever\n"));
+}
+
+TEST_F(StandbyTest, HasTheRoutesThatTheKernelMadeOfAddresses)
+{
+    m_host.view.live.routes.clear();
+    m_host.view.live.addresses.clear();
+    m_host.AddAddress("eth0", "192.0.2.10", 24);
+    m_host.AddAddress("eth0", "2001:db8::10", 64);
+    m_host.AddAddress("eth0", "fe80::10", 64);
+    Leased("192.0.2.17", 24); // as it is to be
+    const auto standby = StandbyFor(m_host.view, {{"eth0", Manager::kNetworkManager}});
+
+    PutUp(standby, m_hands);
+
+    EXPECT_THAT(m_hands.runs,
+                ElementsAre("-4\n"
+                            "address replace 192.0.2.10/32 dev eth0 noprefixroute\n"
+                            "route replace 192.0.2.0/24 dev eth0 table 254 proto static metric 1"
+                            " src 192.0.2.10 scope link\n"
+                            "address del 192.0.2.10/24 dev eth0\n",
+                            "-6\n"
+                            "route replace 2001:db8::/64 dev eth0 table 254 proto static"
+                            " metric 257\n"
+                            "route replace fe80::/64 dev eth0 table 254 proto static metric 257\n"
+                            "address change 2001:db8::10/64 dev eth0 noprefixroute"
+                            " valid_lft forever preferred_lft forever\n"
+                            "address change fe80::10/64 dev eth0 scope link noprefixroute"
+                            " valid_lft forever preferred_lft forever\n"));
+    EXPECT_TRUE(IsReplaced(standby, m_host.view));
+    m_host.view.live.addresses.front().prefixLength = 32;
+    EXPECT_FALSE(IsReplaced(standby, m_host.view));
+}
+
+TEST_F(StandbyTest, LeavesToTheKernelWhatRoutersTell)
+{
+    vornhost::Route& network = m_host.view.live.routes.back();
+    m_host.view.live.routes = {network, m_host.view.live.routes.front()};
+
+    PutUp(StandbyFor(m_host.view, {{"eth0", Manager::kIfupdown}}), m_hands);
+
+    EXPECT_THAT(m_hands.runs,
+                ElementsAre("-4\n"
+                            "address replace 192.0.2.17/32 dev eth0 noprefixroute\n"
+                            "route replace 192.0.2.0/24 dev eth0 table 254 proto static metric 101"
+                            " src 192.0.2.17 scope link\n"
+                            "route del 192.0.2.0/24 dev eth0 table 254 proto 16 metric 100\n"
+                            "address del 192.0.2.17/24 dev eth0\n",
+                            "-6\n"
+                            "address change 2001:db8::180/128 dev eth0"
+                            " valid_lft 500 preferred_lft 300\n"));
 }
 
 TEST_F(StandbyTest, GoesWhenEverythingIsThereAgain)
 {
-    const auto standby = StandbyFor(m_host.view, {"eth0"});
+    const auto standby = StandbyFor(m_host.view, {{"eth0", Manager::kNetworkd}});
 
     EXPECT_TRUE(IsReplaced(standby, m_host.view));
     TakeDown(standby, m_host.view, m_hands);
@@ -129,7 +180,7 @@ TEST_F(StandbyTest, GoesWhenEverythingIsThereAgain)
 
 TEST_F(StandbyTest, EndsWithItsLeaseWhenNoServerAnswers)
 {
-    const auto standby = StandbyFor(m_host.view, {"eth0"});
+    const auto standby = StandbyFor(m_host.view, {{"eth0", Manager::kNetworkd}});
     LoseAll();
 
     EXPECT_FALSE(IsReplaced(standby, m_host.view));
@@ -148,9 +199,9 @@ TEST_F(StandbyTest, EndsWithItsLeaseWhenNoServerAnswers)
 
 TEST_F(StandbyTest, IsNotNeededForWhatIsOfOtherInterfaces)
 {
-    const auto standby = StandbyFor(m_host.view, {"eth2"});
+    const auto standby = StandbyFor(m_host.view, {{"eth2", Manager::kNetworkd}});
 
-    PutUp(standby, m_host.view, m_hands);
+    PutUp(standby, m_hands);
 
     EXPECT_THAT(standby.addresses, IsEmpty());
     EXPECT_THAT(standby.routes, IsEmpty());

@@ -51,11 +51,35 @@ host_answers()
 
 # The default routes, without what makes no difference or changes by itself: that a gateway was said
 # to be on the link, where it is; the link's MTU and hop limit, which some managers write to a
-# router's routes; how long these are good for.
+# router's routes; how long these are good for; the source address, where it is the one that the
+# kernel would take without a word.
 ways_out()
 {
-    default_routes |
-        sed -E -e 's/ onlink//' -e 's/ (mtu|hoplimit) [0-9]+//g' -e 's/ expires [0-9]+sec//'
+    local line device source
+    while read -r line; do
+        device="$(word_after dev "$line")"
+        source="$(word_after src "$line")"
+        if [ -n "$source" ] && [ "$source" = "$(first_address "$device" "$source")" ]; then
+            line="${line/ src $source/}"
+        fi
+        echo "$line"
+    done < <(default_routes |
+        sed -E -e 's/ onlink//' -e 's/ (mtu|hoplimit) [0-9]+//g' -e 's/ expires [0-9]+sec//')
+}
+
+# word_after WORD LINE
+word_after()
+{
+    sed -n "s/.* $1 \([^ ]*\).*/\1/p" <<<"$2"
+}
+
+# first_address DEVICE ADDRESS: the first one of the device of the same family.
+first_address()
+{
+    local family=-4
+    [[ $2 != *:* ]] || family=-6
+    ip "$family" -oneline address show dev "$1" scope global |
+        awk 'NR == 1 { sub("/.*", "", $4); print $4 }'
 }
 
 host_has_routes()

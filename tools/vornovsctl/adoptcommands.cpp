@@ -21,8 +21,8 @@ namespace {
 constexpr char kLockName[] = "adopt.lock";
 constexpr int kLockSeconds = 60;
 // A client that goes on with a lease has it at once; one that finds no server waits in vain.
-constexpr std::chrono::seconds kPatience{25};
-constexpr std::chrono::milliseconds kGlance{250};
+constexpr std::chrono::seconds kSettlingTime{25};
+constexpr std::chrono::milliseconds kBetweenGlances{250};
 
 std::set<std::string> NamesOf(const Context& context)
 {
@@ -34,12 +34,13 @@ std::set<std::string> NamesOf(const Context& context)
 Belongings WaitFor(const Belongings& before, const std::set<std::string>& names)
 {
     Belongings missing;
-    for (auto waited = std::chrono::milliseconds(0); waited <= kPatience; waited += kGlance) {
+    for (auto waited = std::chrono::milliseconds(0); waited <= kSettlingTime;
+         waited += kBetweenGlances) {
         missing = Missing(before, BelongingsOf(HostView::Now(), names));
         if (missing.empty()) {
             break;
         }
-        std::this_thread::sleep_for(kGlance);
+        std::this_thread::sleep_for(kBetweenGlances);
     }
     return missing;
 }
@@ -70,8 +71,8 @@ Belongings WaitForManagers(const AdoptionRecord& record, const Belongings& befor
                            const std::set<std::string>& names)
 {
     for (auto waited = std::chrono::milliseconds(0);
-         waited <= kPatience && !AreSettled(record, names); waited += kGlance) {
-        std::this_thread::sleep_for(kGlance);
+         waited <= kSettlingTime && !AreSettled(record, names); waited += kBetweenGlances) {
+        std::this_thread::sleep_for(kBetweenGlances);
     }
     return WaitFor(before, names);
 }

@@ -27,7 +27,6 @@ constexpr char kCardTool[] = "/sbin/ethtool";
 constexpr char kModuleTool[] = "/sbin/modprobe";
 constexpr char kBondingLoaded[] = "/sys/class/net/bonding_masters";
 constexpr std::chrono::seconds kToolDeadline{15};
-constexpr std::chrono::seconds kServiceDeadline{60};
 constexpr std::chrono::seconds kBridgeDeadline{8};
 constexpr std::chrono::milliseconds kBridgePoll{10};
 
@@ -124,7 +123,7 @@ bool Applier::RunServices(const Stage& stage)
         const auto words = Words(line);
         const std::string service = words.at(0).substr(words.at(0).rfind('/') + 1);
         std::string error;
-        return RunService(service, words.at(1), kServiceDeadline, error) ||
+        return RunService(service, words.at(1), m_plan.servicePatience, error) ||
                Fail(line + " failed: " + OneLine(error));
     });
 }

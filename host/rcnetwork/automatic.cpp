@@ -122,6 +122,8 @@ std::set<std::string> NeededInterfaces(const std::map<std::string, InterfaceFile
 bool StartAtBoot(const Request& request)
 {
     constexpr unsigned kUsualSeconds = 10;
+    // Until now nothing of the host can be reached. A switch that takes longer is followed later.
+    constexpr unsigned kUsualSwitchSeconds = 20;
     {
         // From now on an interface that appears is brought up by itself, after this run.
         const Descriptor lock = TakeNetworkLock();
@@ -131,7 +133,9 @@ bool StartAtBoot(const Request& request)
         }
     }
     WaitForInterfaces(HostSeconds("DEVICE_SECONDS", kUsualSeconds, 0));
-    return StartLocked(request);
+    Request start = request;
+    start.servicePatience = HostSeconds("SWITCH_SECONDS", kUsualSwitchSeconds, 1);
+    return StartLocked(start);
 }
 
 bool StartAppeared(const std::string& interface)

@@ -113,6 +113,7 @@ Plan MakePlan(const Inputs& inputs)
 {
     Plan plan;
     plan.waitForSwitch = inputs.request.withoutSwitch.empty();
+    plan.servicePatience = inputs.request.servicePatience;
     const Kinship kinship(inputs);
     const std::vector<Unit> units = DecideUnits(inputs, kinship, plan.remarks);
     Steps steps;

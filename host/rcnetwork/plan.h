@@ -16,6 +16,7 @@
 #include "support/remembered.h"
 #include "support/switchdatabase.h"
 
+#include <chrono>
 #include <map>
 #include <set>
 #include <string>
@@ -30,8 +31,9 @@ struct Request {
     std::set<std::string> names; ///< Plain interfaces; none: everything.
     /** Interfaces that the switch could not be made to carry: they stay reachable without it. */
     std::set<std::string> withoutSwitch;
-    bool switchHung = false;     ///< It was asked before and did not answer.
-    std::set<std::string> known; ///< Named ones that were there when the run began.
+    bool switchHung = false;                  ///< It was asked before and did not answer.
+    std::chrono::seconds servicePatience{60}; ///< How long a service may take to start.
+    std::set<std::string> known;              ///< Named ones that were there when the run began.
 };
 
 /** What is known of the switch. */
@@ -89,6 +91,7 @@ struct Plan {
     RunState recordBefore; ///< To be on disk before the first change...
     RunState recordAfter;  ///< ...and after the last one.
     bool waitForSwitch = true;
+    std::chrono::seconds servicePatience{60};
 
     bool Empty() const { return stages.empty(); }
     std::string Text() const;

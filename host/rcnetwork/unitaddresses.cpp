@@ -19,6 +19,25 @@ bool IsLinkLocal(const Address& address)
     return address.family == AF_INET6 && address.scope == RT_SCOPE_LINK;
 }
 
+/** Whether the kernel has made it of another one, with which it goes. */
+bool IsTemporary(const Address& address)
+{
+    return address.family == AF_INET6 && (address.flags & IFA_F_TEMPORARY) != 0;
+}
+
+/**
+ * The kernel makes a new temporary address on the target and takes none from outside, so the former
+ * one is carried for those that use it, and for nobody else.
+ */
+Address AsAddressOfItsOwn(Address address)
+{
+    if (IsTemporary(address)) {
+        address.flags &= ~std::uint32_t{IFA_F_TEMPORARY};
+        address.preferredSeconds = 0;
+    }
+    return address;
+}
+
 /** Whether both cannot stand on one interface: IPv6 knows an address once, whatever its length. */
 bool SameOnOneInterface(const Address& one, const Address& other)
 {
@@ -142,10 +161,11 @@ void UnitPlanner::RemoveAddresses()
         const Source* source = m_unit.SourceOf(address.index);
         if (source != nullptr && source->stays && !IsGathered(*source->link)) {
             // A port's link-local address goes with its IPv6 stack.
-            if (!IsLinkLocal(address)) {
+            if (!IsLinkLocal(address) && !IsTemporary(address)) {
                 RemoveAddress(address, source->link->name);
             }
-        } else if (carrier != nullptr && address.index == carrier->index && IsUnwanted(address)) {
+        } else if (carrier != nullptr && address.index == carrier->index && IsUnwanted(address) &&
+                   !IsTemporary(address)) {
             RemoveAddress(address, Carrier());
             removesFromCarrier = removesFromCarrier || address.family == AF_INET;
         }
@@ -224,7 +244,7 @@ void UnitPlanner::CarryAddressesOf(const Source& source)
     for (const Address& address : inOrder) {
         if (address.index == source.link->index && IsCarried(address) &&
             m_carried.insert(IsLinkLocal(address) ? "link" : AddressText(address)).second) {
-            CarryAddress(address, source);
+            CarryAddress(AsAddressOfItsOwn(address), source);
         }
     }
 }

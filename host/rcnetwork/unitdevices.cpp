@@ -5,7 +5,7 @@ namespace vornhost {
 /** Whether the carrier is given the link-local address that is in use, and makes none itself. */
 bool UnitPlanner::BringsLinkLocal() const
 {
-    return m_moves && !m_unit.takeDown && !Live(MainSource(), "ipv6.conf.disable_ipv6").empty();
+    return m_moves && !m_unit.takeDown && !Live(MainSource(), kDisableIpv6).empty();
 }
 
 /** Whether a device is made in the place of another one, and has settings before it is used. */

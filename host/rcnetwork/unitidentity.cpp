@@ -66,12 +66,24 @@ void UnitPlanner::WantSetting(const std::string& setting, const std::string& wan
     m_record.formerSettings.emplace(setting, live);
 }
 
+/** Whether the file turns the stack off. */
+bool UnitPlanner::GoesWithoutIpv6() const
+{
+    return m_unit.addWanted && !m_unit.takeDown && !m_unit.file->ipv6;
+}
+
 void UnitPlanner::PlanAutoconf()
 {
     if (!m_unit.addWanted) {
         return;
     }
     const InterfaceFile& file = *m_unit.file;
+    const std::string former = m_unit.carrierLink == nullptr ? kNewInterface : Carrier();
+    // Where it moves, the stack of the other device is turned off as it is moved.
+    if (GoesWithoutIpv6() && !(m_moves && m_unit.MainSource() != nullptr) &&
+        Live(former, kDisableIpv6) == "0") {
+        Set(Settings(), Carrier(), kDisableIpv6, "1");
+    }
     PlanLinkLocal();
     if (file.privacy) {
         WantSetting(kTemporary, std::to_string(*file.privacy));

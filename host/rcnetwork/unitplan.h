@@ -16,6 +16,7 @@ namespace vornhost {
 constexpr char kAddressMode[] = "ipv6.conf.addr_gen_mode";
 constexpr char kAddressModeNone[] = "1";
 constexpr char kAcceptRouters[] = "ipv6.conf.accept_ra";
+constexpr char kDisableIpv6[] = "ipv6.conf.disable_ipv6";
 
 /** One "ip -batch", in the order in which its parts run. */
 struct BatchParts {
@@ -149,6 +150,7 @@ private:
              const std::string& setting, const std::string& value) const;
 
     // unitidentity.cpp: how addresses are made of what routers say
+    bool GoesWithoutIpv6() const;
     void PlanAutoconf();
     void PlanLinkLocal();
     void WantSetting(const std::string& setting, const std::string& wanted);

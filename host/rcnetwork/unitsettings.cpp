@@ -10,8 +10,6 @@
 namespace vornhost {
 namespace {
 
-constexpr char kDisableIpv6[] = "ipv6.conf.disable_ipv6";
-
 // Moved with the IPv6 stack, following the MTU, or not for writing.
 constexpr std::array<std::string_view, 6> kSettingsOfTheirOwn{kDisableIpv6,
                                                               kAddressMode,
@@ -192,11 +190,14 @@ void UnitPlanner::MoveIpv6Stack()
 {
     const std::string source = MainSource();
     const bool silenced = m_record.formerSettings.contains(kDisableIpv6) && source == m_unit.name;
-    const std::string off =
+    std::string off =
         silenced ? m_record.formerSettings.at(kDisableIpv6) : Live(source, kDisableIpv6);
     const std::string mode = Live(source, kAddressMode);
     if (m_unit.MainSource() == nullptr || off.empty()) {
         return;
+    }
+    if (GoesWithoutIpv6()) {
+        off = "1";
     }
     const bool madeLate = &Settings() != &m_steps.settingsBefore;
     const std::string former = m_unit.carrierLink == nullptr ? kNewInterface : Carrier();
@@ -287,7 +288,9 @@ void UnitPlanner::RestorePort(const std::string& name)
     for (const char* setting : {kAddressMode, kDisableIpv6}) {
         const auto former = record.formerSettings.find(setting);
         if (former != record.formerSettings.end()) {
-            if (Live(name, setting) != former->second) {
+            const bool stays =
+                setting == std::string_view(kDisableIpv6) && name == Carrier() && GoesWithoutIpv6();
+            if (Live(name, setting) != former->second && !stays) {
                 Set(m_steps.settingsBefore, name, setting, former->second);
             }
             record.formerSettings.erase(former);

@@ -67,14 +67,19 @@ bool AreSettled(const AdoptionRecord& record, const std::set<std::string>& names
 }
 
 /** The same for interfaces that managers have got back. */
-Belongings WaitForManagers(const AdoptionRecord& record, const Belongings& before,
-                           const std::set<std::string>& names)
+Belongings WaitForManagers(const AdoptionRecord& record, const LooseEnds& ends,
+                           const Belongings& before, const std::set<std::string>& names,
+                           Hands& hands)
 {
     for (auto waited = std::chrono::milliseconds(0);
-         waited <= kSettlingTime && !AreSettled(record, names); waited += kBetweenGlances) {
+         waited <= kSettlingTime &&
+         (!AreSettled(record, names) || !IsReplaced(ends.standby, HostView::Now()));
+         waited += kBetweenGlances) {
         std::this_thread::sleep_for(kBetweenGlances);
     }
-    return WaitFor(before, names);
+    const Belongings missing = WaitFor(before, names);
+    TieUp(ends, HostView::Now(), hands);
+    return missing;
 }
 
 Answer FailedFor(const std::string& reason, Json fields)
@@ -198,17 +203,16 @@ private:
     {
         const std::string text = failure + ".\n";
         const AdoptionRecord whole = m_record;
-        std::set<std::string> unchecked;
+        LooseEnds ends;
         try {
-            unchecked = PerformRelease(HostView::Now(), m_names, m_record, m_hands);
+            ends = PerformRelease(HostView::Now(), m_names, m_record, m_hands);
         } catch (const std::exception& error) {
             return Failed(kOutOfStep,
                           text + "It could not be undone: " + error.what() +
                               ".\nRun 'vornovsctl release' when that is mended.",
                           Fields(false));
         }
-        const Belongings missing = WaitForManagers(whole, before, m_names);
-        CheckForDuplicatesAgain(unchecked, m_hands);
+        const Belongings missing = WaitForManagers(whole, ends, before, m_names, m_hands);
         return FailedFor(
             text + "It was undone" +
                 (missing.empty() ? "." : ", but still missing: " + List(missing) + '.'),
@@ -256,17 +260,16 @@ Answer ReleaseAll(const Context& context, Hands& hands)
     context.tell(ReleaseText(*record, names));
     const Belongings before = BelongingsOf(host, names);
     const AdoptionRecord whole = *record;
-    std::set<std::string> unchecked;
+    LooseEnds ends;
     try {
-        unchecked = PerformRelease(host, names, *record, hands);
+        ends = PerformRelease(host, names, *record, hands);
     } catch (const std::exception& error) {
         return Failed(kOutOfStep,
                       error.what() + std::string(".\nRun 'vornovsctl release' again when that is "
                                                  "mended."),
                       ReleaseFields(*record, names, false));
     }
-    const Belongings missing = WaitForManagers(whole, before, names);
-    CheckForDuplicatesAgain(unchecked, hands);
+    const Belongings missing = WaitForManagers(whole, ends, before, names, hands);
     if (!missing.empty()) {
         return FailedFor(
             "released, but missing since: " + List(missing) + ".\nSee the manager's log.", plan);

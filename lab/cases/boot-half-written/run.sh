@@ -2,7 +2,7 @@
 
 phase_start()
 {
-    boots_install
+    boots_enable
     expect_success vornovsctl register alpha
     expect_answers
 

@@ -4,7 +4,7 @@ lab_server=/usr/sbin/ovsdb-server
 
 phase_start()
 {
-    boots_install
+    boots_enable
     expect_success vornovsctl register alpha
     expect_answers
 

@@ -13,7 +13,7 @@ moment()
 
 phase_start()
 {
-    boots_install
+    boots_enable
     reboot_machine plain
 }
 

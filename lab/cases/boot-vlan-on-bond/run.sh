@@ -15,7 +15,7 @@ expect_bond()
 
 phase_start()
 {
-    boots_install
+    boots_enable
     reboot_machine plain
 }
 

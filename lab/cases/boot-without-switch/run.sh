@@ -4,7 +4,7 @@ lab_daemon=/usr/lib/openvswitch-switch/ovs-vswitchd
 
 phase_start()
 {
-    boots_install
+    boots_enable
     expect_success vornovsctl register alpha
     expect_answers
     mv "$lab_daemon" "$lab_daemon.away"

@@ -5,7 +5,7 @@ lab_lease=120
 phase_start()
 {
     local asked4 asked6
-    takeover_install
+    takeover_begin
     takeover_adopt
     takeover_register
 

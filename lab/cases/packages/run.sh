@@ -1,5 +1,6 @@
 # shellcheck shell=bash disable=SC2154 # variables of the guest's other files
 
+lab_packages=/lab/packages/vornovs
 lab_unit_link=/etc/systemd/system/multi-user.target.wants/vornovs-network.service
 
 # Everything on the disk, with mode, owner and size; without what logs, caches and clocks change.
@@ -55,11 +56,33 @@ make_later_version()
     done
 }
 
-# As README says.
-install_product()
+# The commands of README's section about one's own machine, one a line.
+readme_commands()
 {
-    expect_success packages_apt install \
-        "$lab_packages"/{libvornovs1,vornovs-host,vornovs-tools}_*.deb
+    sed -n '/^## Install it on your own machine/,/^## /p' /lab/README.md |
+        awk '/^```/ { inside = !inside; next } inside && NF { sub(/ *#.*/, ""); print }'
+}
+
+# README's reader is not root, and apt asks for a consent.
+sudo()
+{
+    case $1 in
+        apt-get) packages_apt "${@:2}" ;;
+        *) "$@" ;;
+    esac
+}
+
+# readme_command PATTERN: runs the commands of README that match, as they stand there, in a folder
+# where scripts/package has been run.
+readme_command()
+{
+    local command commands
+    commands="$(readme_commands | grep -E -- "$1")" || fail "README has no command '$1'"
+    while read -r command; do
+        step "README: $command"
+        eval "expect_success $command" >"$lab_out/output"
+        show <"$lab_out/output"
+    done <<<"$commands"
 }
 
 # What must not end with an upgrade.
@@ -73,23 +96,58 @@ daemons()
 phase_start()
 {
     wait_until 90 host_answers
-    step "What the packages need of Debian's"
+    mkdir -p /lab/readme/build
+    ln -s "$lab_packages" /lab/readme/build/packages
+    cd /lab/readme || exit 1
     expect_success packages_apt update
-    expect_success packages_apt install openvswitch-switch dhcpcd-base openresolv uuid-runtime ethtool \
-        libnl-3-200 libnl-route-3-200 libsystemd0 kmod
-    host_files >"$lab_out/files-before"
-    host_units >"$lab_out/units-before"
 
-    step "Install"
+    install_as_readme_says
+    adopt_as_readme_says
+    reboot_machine adopt_again
+}
+
+install_as_readme_says()
+{
+    expect_equal "README's first command" scripts/package "$(readme_commands | head -n 1)"
     snapshot_network before
-    install_product
+    resolver_settings >"$lab_out/resolver-before"
+    readme_command apt-get
     snapshot_network installed
     expect_unchanged before installed
+    resolver_settings >"$lab_out/resolver-installed"
+    expect_same_text "the name servers" "$lab_out/resolver-before" "$lab_out/resolver-installed"
     expect_no_unit_of_ours
-    expect_same_units "after installing"
     expect_equal "interfaces' files" "" "$(ls -A /etc/sysconfig/network-scripts)"
+    # What the host is to be again when ours are purged: what Debian's packages, which came along,
+    # have brought, and nothing else.
+    dpkg-query -L libvornovs1 vornovs-host vornovs-tools | sort -u >"$lab_out/files-ours"
+    host_files | awk -v ours="$lab_out/files-ours" \
+        'BEGIN { while ((getline name < ours) > 0) is[name] = 1 } !($4 in is)' \
+        >"$lab_out/files-before"
+    host_units | grep -v ' vornovs' >"$lab_out/units-before"
     remember_managed
+}
 
+adopt_as_readme_says()
+{
+    readme_command 'adopt --dry-run'
+    expect_nothing_done
+    readme_command 'vornovsctl adopt$'
+    expect_same_host "adopted as README says"
+    readme_command 'vornovsctl register'
+    expect_ports_on_switch
+    expect_same_host "on the switch as README says"
+    readme_command 'vornovsctl unregister'
+    expect_no_switch_devices
+    expect_same_host "plain as README says"
+    readme_command 'vornovsctl release'
+    expect_same_host "released as README says"
+    expect_given_back released
+    expect_equal "commands of README" 7 "$(readme_commands | wc -l)"
+}
+
+phase_adopt_again()
+{
     step "Adopt and register"
     expect_success vornovsctl adopt
     expect_success vornovsctl register alpha
@@ -179,7 +237,8 @@ install_by_hand()
 {
     step "Install again, and write a file by hand"
     snapshot_network again
-    install_product
+    expect_success packages_apt install \
+        "$lab_packages"/{libvornovs1,vornovs-host,vornovs-tools}_*.deb
     snapshot_network reinstalled
     expect_unchanged again reinstalled
     expect_no_unit_of_ours

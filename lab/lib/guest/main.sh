@@ -43,7 +43,8 @@ lab_main()
     if [ -e /lab/case/run.sh ]; then
         lab_run_case
         if phase_ends_in_reboot; then
-            systemctl reboot
+            # As "systemctl reboot" does where nobody is asked first.
+            systemctl start --no-block reboot.target
             return
         fi
     fi

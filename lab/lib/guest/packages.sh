@@ -1,16 +1,5 @@
 # shellcheck shell=bash disable=SC2154 # variables of the guest's other files
-# The repository's packages on the machine with systemd, installed as its users do.
-
-lab_packages=/lab/packages/vornovs
-
-# packages_install PACKAGE...: from the folder that scripts/package makes, with what they need of
-# Debian's.
-packages_install()
-{
-    echo "deb [trusted=yes] file:$lab_packages ./" >/etc/apt/sources.list.d/vornovs.list
-    expect_success packages_apt update
-    expect_success packages_apt install "$@"
-}
+# The repository's packages on the machine with systemd, handled as its users do.
 
 # packages_apt COMMAND...: apt-get, whose words go to a file that the results have.
 packages_apt()

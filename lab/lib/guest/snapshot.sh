@@ -48,10 +48,24 @@ snapshot_links()
         sed '/^ovs-system:/d' | sort
 }
 
+# Fleeting IPv6 addresses, one a line: temporary ones, which the kernel makes now and then, and those
+# that nobody uses any more; and the multicast groups that they are asked for by.
+fleeting()
+{
+    ip -6 -oneline address show |
+        awk '/ (temporary|deprecated) / {
+            sub("/.*", "", $4)
+            print $4
+            groups = split($4, group, ":")
+            printf "ff02::1:ff%s:%s\n", substr("0000" group[groups - 1], length(group[groups - 1]) + 3),
+                group[groups]
+        }'
+}
+
 snapshot_addresses()
 {
     # How long addresses of servers and routers are good changes by itself.
-    ip -oneline address show |
+    ip -oneline address show | grep -v -e ' temporary ' -e ' deprecated ' |
         sed -E -e 's/^[0-9]+: //' -e 's/\\//g' -e 's/_lft [0-9]+sec/_lft SECONDS/g' -e 's/  +/ /g' |
         sort
 }
@@ -59,7 +73,7 @@ snapshot_addresses()
 snapshot_routes()
 {
     ip -4 -details route show table all | sed -e 's/^/4 /' -e 's/ *$//' | sort
-    ip -6 -details route show table all | sed -E -e 's/^/6 /' -e 's/ expires [0-9]+sec//' \
+    ip -6 -details route show table all | grep -v -F -w -f <(fleeting) | sed -E -e 's/^/6 /' -e 's/ expires [0-9]+sec//' \
         -e 's/ *$//' | sort
     ip -4 rule show | sed 's/^/rule 4 /'
     ip -6 rule show | sed 's/^/rule 6 /'
@@ -70,6 +84,7 @@ snapshot_groups()
 {
     ip maddress show |
         awk '/^[0-9]+:/ { name = $2; next } { $1 = $1; print name, $0 }' |
+        grep -v -F -w -f <(fleeting) |
         sed '/^ovs-system /d' | sort
 }
 
@@ -107,18 +122,18 @@ snapshot_switch()
 # with the switch's use is not configuration, and neither is an empty folder for it.
 snapshot_files()
 {
-    local file
     mkdir -p "$1/files"
     # A host need not have each of them; one that comes or goes changes the list.
     { find /etc/sysconfig /usr/vorn/etc /etc/vornovs-host.conf /etc/vorninfo.conf \
         /etc/network /etc/systemd /etc/NetworkManager /etc/netplan /etc/udev /etc/sysctl.d \
         /etc/modprobe.d /etc/dhcp /etc/resolvconf.conf /etc/resolv.conf -type f \
         2>/dev/null || true; } | sort >"$1/file-list"
-    while read -r file; do
-        stat -c '%A %U:%G %n' "$file"
-        mkdir -p "$1/files${file%/*}"
-        cp -p "$file" "$1/files$file"
-    done <"$1/file-list" >"$1/file-modes"
+    # One process for all of them: a process is what an emulated processor is slowest at.
+    if [ -s "$1/file-list" ]; then
+        tr '\n' '\0' <"$1/file-list" | xargs -0 stat -c '%A %U:%G %n' >"$1/file-modes"
+        # Names of folders above are taken as if this were the root.
+        tr '\n' '\0' <"$1/file-list" | (cd / && xargs -0 cp -p --parents -t "$1/files")
+    fi
     rm "$1/file-list"
 }
 

@@ -29,6 +29,10 @@ topology_build()
     in_outside sysctl -q -w net.ipv4.conf.all.arp_ignore=1 net.ipv4.conf.all.arp_announce=2 \
         net.ipv4.conf.default.rp_filter=0 net.ipv6.conf.default.accept_dad=0 \
         net.ipv6.conf.all.accept_dad=0 net.ipv6.conf.all.keep_addr_on_down=1
+    if servers_there; then
+        # A kernel that hears routers forgets one that says of itself that it is none.
+        in_outside sysctl -q -w net.ipv6.conf.all.forwarding=1
+    fi
 
     topology_set_cards_aside
     while read -r word name kind mac rest; do

@@ -2,8 +2,8 @@
 # The disk of the machine with systemd: Debian from its packages, as an installation leaves it.
 #   base.tar     what mmdebstrap makes of the packages below
 #   fresh.ext4   the same as a file system, with the lab's settings; no guest ever writes to it
-#   ready.ext4   that with what this repository's packages need of Debian's, which would take the
-#                guest longer to install than the rest of a case
+#   ready.ext4   that with this repository's packages, which an emulated processor would take a
+#                minute to install; the case `packages` does, with the disk above
 
 # What a host has before this repository's packages come: every network manager, none in charge.
 lab_disk_packages=(
@@ -12,28 +12,29 @@ lab_disk_packages=(
     iproute2 iputils-ping ethtool fping dnsmasq-base tcpdump
 )
 
-# What the repository's packages need besides.
-lab_needed_packages=(
+# What apt is offered as a folder of packages: what the repository's need besides, and one that
+# excludes another.
+lab_offered_packages=(
     openvswitch-switch dhcpcd-base openresolv libnl-3-200 libnl-route-3-200 libsystemd0 libstdc++6
+    systemd-resolved
 )
-
-# What the guest's apt is offered as a folder of packages.
-lab_offered_packages=("${lab_needed_packages[@]}" systemd-resolved)
 
 # lab_make_disks KIND...: sets $lab_disk_fresh and $lab_disk_ready, and makes the named ones of them
 # unless they were made of the same things.
 lab_make_disks()
 {
-    local folder=$lab_build/disk here=${BASH_SOURCE[0]} base print kind image turn
+    local folder=$lab_build/disk here=${BASH_SOURCE[0]} base made_of kind image turn
     base=$folder/base-$(lab_disk_packages_print).tar
-    print=$(printf '%s\n' "$here" "${here%/*}/write-disk" "$lab_debian/.packages" | fingerprint)
-    lab_disk_fresh=$folder/fresh-$print.ext4
-    lab_disk_ready=$folder/ready-$print.ext4
+    made_of=("$here" "${here%/*}/write-disk" "$lab_debian/.packages")
+    lab_disk_fresh=$folder/fresh-$(printf '%s\n' "${made_of[@]}" | fingerprint).ext4
+    made_of+=("$lab_packages_folder/Packages")
+    lab_disk_ready=$folder/ready-$(printf '%s\n' "${made_of[@]}" | fingerprint).ext4
     mkdir -p "$folder"
     exec {turn}>"$folder/.turn"
     flock "$turn"
     for kind in "$@"; do
-        image=$folder/$kind-$print.ext4
+        image=lab_disk_$kind
+        image=${!image}
         if [[ ! -f $image ]]; then
             ensure_host_packages mmdebstrap e2fsprogs dpkg-dev
             rm -f "$folder/$kind"-*.ext4
@@ -89,7 +90,9 @@ lab_write_disk()
     local archive=$1 kind=$2 image=$3 modules packages=()
     say_note "writing the $kind disk of the lab's machine with systemd"
     if [[ $kind == ready ]]; then
-        packages=("${lab_needed_packages[@]}")
+        for kind in "${lab_product_packages[@]}"; do
+            packages+=("$lab_packages_folder/$kind"_*.deb)
+        done
     fi
     modules=$(echo "$lab_debian"/lib/modules/*)
     as_root "$lab_source/lib/host/write-disk" "$archive" "$modules" "$image.new" "${packages[@]}" \

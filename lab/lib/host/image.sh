@@ -293,6 +293,8 @@ lab_make_guest_image()
         cp -r "$lab_layers/product/lab/clients" "$root/lab/"
         mkdir -p "$root/lab/packages/vornovs"
         cp "$lab_packages_folder"/{*.deb,Packages} "$root/lab/packages/vornovs/"
+        # What it tells people to do is done in a case.
+        cp "$lab_root/README.md" "$root/lab/"
         ln -s lab/machine/init "$root/init"
     else
         ln -s lab/init "$root/init"

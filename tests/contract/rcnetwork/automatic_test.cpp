@@ -190,6 +190,23 @@ TEST_F(Automatic, BootGoesOnWithoutAnInterfaceThatDoesNotCome)
     EXPECT_TRUE(std::filesystem::exists("/run/vornovs/network.boot"));
 }
 
+TEST_F(Automatic, BootGoesOnWithoutASwitchThatTakesTooLong)
+{
+    WriteFile(kSettings, "SWITCH_SECONDS=1\n");
+    OnSwitch();
+    Script("vornovs-db", "exec sleep 30");
+    const auto begin = std::chrono::steady_clock::now();
+
+    const Outcome outcome = RcNetwork({"--boot", "start"});
+
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(10));
+    EXPECT_EQ(outcome.exitCode, 1);
+    EXPECT_THAT(outcome.errors, HasSubstr("vornovs-db start failed: did not end in time"));
+    EXPECT_EQ(Network(), "eth0 192.0.2.5/24\n");
+    EXPECT_EQ(ReadFile(kWaitingPath), "[\"eth0\"]\n");
+    EXPECT_EQ(RcNetwork({"stop"}).exitCode, 0);
+}
+
 TEST_F(Automatic, BootDoesNotWaitWhenNothingIsMissing)
 {
     File("eth0", kStatic);

@@ -1,6 +1,6 @@
 #include "adopt/adoption.h"
 
-#include "adopt/handover.h"
+#include "adopt/kernelsettings.h"
 #include "adopt/livedetails.h"
 #include "adopt/networkdreader.h"
 #include "adopt/networkmanagerreader.h"
@@ -117,6 +117,7 @@ AdoptedInterface AdoptedInterfaceOf(const HostView& host, const Hands& hands, co
     }
     interface.clients = ClientsOf(host, wish.name);
     interface.stateLine = StateLineOf(host, wish.name);
+    interface.settings = KernelSettingsOf(host, wish.name);
     return interface;
 }
 
@@ -203,8 +204,8 @@ void PerformAdoption(const HostView& host, const std::set<std::string>& names,
     ForgetNameServers(record, names, hands);
 }
 
-std::set<std::string> PerformRelease(const HostView& host, const std::set<std::string>& names,
-                                     AdoptionRecord& record, Hands& hands)
+LooseEnds PerformRelease(const HostView& host, const std::set<std::string>& names,
+                         AdoptionRecord& record, Hands& hands)
 {
     SetPhase(names, Phase::kReleasing, record);
     record.Save(hands);
@@ -221,7 +222,8 @@ std::set<std::string> PerformRelease(const HostView& host, const std::set<std::s
         }
     }
     (void)RunNetwork("leave", names, hands);
-    std::set<std::string> unchecked = GiveToManagers(host, record, names, hands);
+    RestoreKernelSettings(host, record, names, hands);
+    LooseEnds ends = GiveToManagers(host, record, names, hands);
     std::erase_if(record.interfaces, [&](const AdoptedInterface& interface) {
         return names.contains(interface.name);
     });
@@ -230,7 +232,7 @@ std::set<std::string> PerformRelease(const HostView& host, const std::set<std::s
     } else {
         record.Save(hands);
     }
-    return unchecked;
+    return ends;
 }
 
 } // namespace vornovsctl

@@ -6,6 +6,7 @@
 #define VORNOVSCTL_ADOPT_ADOPTION_H
 
 #include "adopt/adoptionrecord.h"
+#include "adopt/handover.h"
 #include "adopt/hostview.h"
 #include "adopt/wish.h"
 
@@ -23,12 +24,9 @@ void AddToRecord(const HostView& host, const Hands& hands, const Wishes& wishes,
 void PerformAdoption(const HostView& host, const std::set<std::string>& names,
                      AdoptionRecord& record, Hands& hands);
 
-/**
- * Gives these interfaces back. @throws std::runtime_error when it cannot.
- * @return  as GiveToManagers().
- */
-std::set<std::string> PerformRelease(const HostView& host, const std::set<std::string>& names,
-                                     AdoptionRecord& record, Hands& hands);
+/** Gives these interfaces back. @throws std::runtime_error when it cannot. */
+LooseEnds PerformRelease(const HostView& host, const std::set<std::string>& names,
+                         AdoptionRecord& record, Hands& hands);
 
 } // namespace vornovsctl
 

@@ -128,7 +128,8 @@ Json ToJson(const AdoptedInterface& interface)
             {"phase", NameIn(kPhases, interface.phase)},
             {"files", files},
             {"clients", clients},
-            {"stateLine", interface.stateLine}};
+            {"stateLine", interface.stateLine},
+            {"settings", interface.settings}};
 }
 
 AdoptedInterface InterfaceFrom(const Json& json)
@@ -148,6 +149,7 @@ AdoptedInterface InterfaceFrom(const Json& json)
                                      client.at("words").get<std::vector<std::string>>()});
     }
     interface.stateLine = json.at("stateLine").get<std::string>();
+    interface.settings = json.at("settings").get<std::map<std::string, std::string>>();
     return interface;
 }
 

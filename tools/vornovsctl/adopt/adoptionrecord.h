@@ -9,6 +9,7 @@
 #include "adopt/hands.h"
 #include "adopt/wish.h"
 
+#include <map>
 #include <optional>
 #include <set>
 #include <string>
@@ -46,7 +47,8 @@ struct AdoptedInterface {
     Phase phase = Phase::kAdopting;
     std::vector<ChangedFile> files; /**< of its own: configuration, lease */
     std::vector<EndedClient> clients;
-    std::string stateLine; /**< of ifupdown, such as "eth0=eth0" */
+    std::string stateLine;                       /**< of ifupdown, such as "eth0=eth0" */
+    std::map<std::string, std::string> settings; /**< of the kernel, as KernelSettingsOf() */
 
     bool operator==(const AdoptedInterface&) const = default;
 };

@@ -124,8 +124,8 @@ bool IsOwnNetwork(const HostView& host, const vornhost::Link& link, const std::s
         });
 }
 
-std::vector<std::string> ReplacementOf(const Json& route, const std::string& family,
-                                       const std::string& name, const char* protocol)
+std::vector<std::string> MarkOf(const Json& route, const std::string& family,
+                                const std::string& name)
 {
     std::vector<std::string> words{"ip",
                                    family,
@@ -135,7 +135,7 @@ std::vector<std::string> ReplacementOf(const Json& route, const std::string& fam
                                    "dev",
                                    name,
                                    "proto",
-                                   protocol,
+                                   "static",
                                    "metric",
                                    std::to_string(route.value("metric", 0U))};
     if (const std::string source = route.value("prefsrc", ""); !source.empty()) {
@@ -152,26 +152,25 @@ std::vector<std::string> ReplacementOf(const Json& route, const std::string& fam
  * kernel's. While the interface is ours they are marked as somebody's, so that they go along when
  * the addresses move.
  */
-void MarkNetworkRoutes(const HostView& host, const std::string& name, const char* from,
-                       const char* to, Hands& hands)
+void MarkNetworkRoutes(const HostView& host, const std::string& name, Hands& hands)
 {
     const vornhost::Link* const link = host.live.Find(name);
     for (const std::string family : {"-4", "-6"}) {
         const auto text =
-            host.run({"ip", "-j", family, "route", "show", "dev", name, "proto", from});
+            host.run({"ip", "-j", family, "route", "show", "dev", name, "proto", "kernel"});
         const Json routes = Json::parse(text.value_or("[]"), nullptr, false);
         if (!routes.is_array() || link == nullptr) {
             continue;
         }
         for (const Json& route : routes) {
             if (!route.contains("gateway") && IsOwnNetwork(host, *link, route.value("dst", ""))) {
-                (void)hands.Run(ReplacementOf(route, family, name, to));
+                (void)hands.Run(MarkOf(route, family, name));
             }
         }
     }
 }
 
-/** For the moment in which the daemon takes over it is to leave everything as it finds it. */
+/** For the moment in which the daemon takes over it is to leave what is lasting as it finds it. */
 std::string KeepPathOf(const AdoptedInterface& interface)
 {
     return "/run/systemd/network/" + interface.origin.substr(interface.origin.rfind('/') + 1) +
@@ -195,13 +194,33 @@ void GiveToNetworkd(const HostView& host, const AdoptionRecord& record,
         }
     }
     for (const std::string& path : paths) {
-        hands.Write(path, "[Network]\nKeepConfiguration=yes\n", kReadableMode);
+        hands.Write(path, "[Network]\nKeepConfiguration=static\n", kReadableMode);
     }
     StartAnew(kNetworkdUnit, hands);
     for (const std::string& path : paths) {
         hands.Remove(path);
         hands.RemoveEmptyFolder(path.substr(0, path.rfind('/')));
     }
+}
+
+/** Those who begin anew with these interfaces. */
+std::map<std::string, Manager> BeginnersOf(const HostView& host, const AdoptionRecord& record,
+                                           const std::set<std::string>& names)
+{
+    const bool networkd = IsActive(host, kNetworkdUnit);
+    const bool networkManager = IsActive(host, kNetworkManagerUnit);
+    std::map<std::string, Manager> beginners;
+    for (const AdoptedInterface& interface : record.interfaces) {
+        const Manager manager = interface.manager;
+        const bool begins =
+            (manager == Manager::kNetworkd && networkd) ||
+            (manager == Manager::kNetworkManager && networkManager && !interface.profile.empty()) ||
+            (manager == Manager::kIfupdown && !interface.clients.empty());
+        if (begins && names.contains(interface.name)) {
+            beginners[interface.name] = manager;
+        }
+    }
+    return beginners;
 }
 
 /**
@@ -230,8 +249,6 @@ std::set<std::string> GiveToNetworkManager(const HostView& host, const AdoptionR
         const vornhost::Link* const link = host.live.Find(interface.name);
         if (interface.manager == Manager::kNetworkManager && names.contains(interface.name) &&
             link != nullptr && !interface.profile.empty()) {
-            MarkNetworkRoutes(host, interface.name, "static", "kernel", hands);
-            MarkNetworkRoutes(host, interface.name, "dhcp", "kernel", hands);
             if (host.Text("/proc/sys/net/ipv6/conf/" + interface.name + "/accept_dad") == "1\n") {
                 CheckForDuplicates(interface.name, false, hands);
                 unchecked.insert(interface.name);
@@ -328,23 +345,19 @@ void TakeFromManagers(const HostView& host, const AdoptionRecord& record,
     RestartDaemons(host, record, names, hands);
     for (const AdoptedInterface& interface : record.interfaces) {
         if (names.contains(interface.name) && interface.manager == Manager::kNetworkManager) {
-            MarkNetworkRoutes(host, interface.name, "kernel", "static", hands);
+            MarkNetworkRoutes(host, interface.name, hands);
         }
     }
 }
 
-void CheckForDuplicatesAgain(const std::set<std::string>& names, Hands& hands)
+LooseEnds GiveToManagers(const HostView& host, const AdoptionRecord& record,
+                         const std::set<std::string>& names, Hands& hands)
 {
-    for (const std::string& name : names) {
-        CheckForDuplicates(name, true, hands);
-    }
-}
-
-std::set<std::string> GiveToManagers(const HostView& host, const AdoptionRecord& record,
-                                     const std::set<std::string>& names, Hands& hands)
-{
+    LooseEnds ends;
+    ends.standby = StandbyFor(host, BeginnersOf(host, record, names));
+    PutUp(ends.standby, hands);
     GiveToNetworkd(host, record, names, hands);
-    std::set<std::string> unchecked = GiveToNetworkManager(host, record, names, hands);
+    ends.unchecked = GiveToNetworkManager(host, record, names, hands);
     for (const AdoptedInterface& interface : record.interfaces) {
         if (!names.contains(interface.name)) {
             continue;
@@ -359,7 +372,15 @@ std::set<std::string> GiveToManagers(const HostView& host, const AdoptionRecord&
             }
         }
     }
-    return unchecked;
+    return ends;
+}
+
+void TieUp(const LooseEnds& ends, const HostView& now, Hands& hands)
+{
+    TakeDown(ends.standby, now, hands);
+    for (const std::string& name : ends.unchecked) {
+        CheckForDuplicates(name, true, hands);
+    }
 }
 
 } // namespace vornovsctl

@@ -6,6 +6,7 @@
 
 #include "adopt/adoptionrecord.h"
 #include "adopt/hostview.h"
+#include "adopt/standby.h"
 
 #include <set>
 #include <string>
@@ -30,15 +31,18 @@ void ForgetNameServers(const AdoptionRecord& record, const std::set<std::string>
 void TakeFromManagers(const HostView& host, const AdoptionRecord& record,
                       const std::set<std::string>& names, Hands& hands);
 
-/**
- * Has them go on with interfaces that they may manage again.
- * @return  the interfaces whose addresses are not checked for duplicates meanwhile.
- */
-std::set<std::string> GiveToManagers(const HostView& host, const AdoptionRecord& record,
-                                     const std::set<std::string>& names, Hands& hands);
+/** What is left to do when the managers are done with what they got back. */
+struct LooseEnds {
+    std::set<std::string>
+        unchecked; /**< whose addresses are not checked for duplicates meanwhile */
+    Standby standby;
+};
 
-/** Has addresses checked for duplicates again. */
-void CheckForDuplicatesAgain(const std::set<std::string>& names, Hands& hands);
+/** Has them go on with interfaces that they may manage again. */
+LooseEnds GiveToManagers(const HostView& host, const AdoptionRecord& record,
+                         const std::set<std::string>& names, Hands& hands);
+
+void TieUp(const LooseEnds& ends, const HostView& now, Hands& hands);
 
 } // namespace vornovsctl
 

@@ -81,6 +81,7 @@ private:
             if (!state.iaid.empty()) {
                 m_wish.identity.iaid = state.iaid;
             }
+            m_wish.identity.hostName6 = identity.hostName6;
             return;
         }
         m_wish.identity.clientId = identity.clientId;

@@ -26,6 +26,7 @@ enum class WishKind { kSingle, kBond, kVlan };
 struct DhcpIdentity {
     std::optional<std::string> clientId; /**< hex with colons, or "none" */
     std::optional<std::string> hostName; /**< or "none" */
+    bool hostName6 = true;               /**< whether servers of IPv6 are told it, too */
     std::optional<std::string> duid;     /**< hex with colons */
     std::optional<std::string> iaid;     /**< eight hex digits */
 

@@ -136,6 +136,9 @@ private:
             SetIf("DHCP_CLIENT_ID", identity.clientId.value_or(""));
             SetIf("DHCP_HOSTNAME", identity.hostName.value_or(""));
         }
+        if (!identity.hostName6) {
+            Set("DHCPV6_HOSTNAME", "none");
+        }
         SetIf("DHCPV6_DUID", identity.duid.value_or(""));
         SetIf("DHCP_IAID", identity.iaid.value_or(""));
         SetIf("PEERROUTES", m_wish.peerRoutes);

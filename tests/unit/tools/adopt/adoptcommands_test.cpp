@@ -89,7 +89,7 @@ TEST_F(AdoptCommands, ReleaseRefusesWhileAnInterfaceIsOnTheSwitch)
     std::filesystem::create_directories("/usr/vorn/etc/vornnetd/adopted");
     std::ofstream("/usr/vorn/etc/vornnetd/adopted/record.json")
         << R"({"version":1,"interfaces":[{"name":"eth0","manager":"ifupdown","origin":"",)"
-           R"("profile":"","phase":"adopted","files":[],"clients":[],"stateLine":""}],)"
+           R"("profile":"","phase":"adopted","files":[],"clients":[],"stateLine":"","settings":{}}],)"
            R"("silencers":[],"units":[]})";
 
     EXPECT_EQ(Ctl({"release"}),

@@ -15,6 +15,7 @@ using testing::Contains;
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
+using testing::Not;
 using unit::RecordedHost;
 using vornovsctl::AdoptionRecord;
 using vornovsctl::HostView;
@@ -410,6 +411,7 @@ TEST(AdoptionRecord, KeepsBytesThatAreNoText)
     interface.files.push_back(
         {"/a", std::string("\0\xff\n", 3), 0600, vornovsctl::SavedFile{"\xe9", 0640, 1, 2}});
     interface.clients.push_back({"/run/pid", {"dhclient", "eth0"}});
+    interface.settings = {{"net/ipv6/conf/eth0/accept_ra", "1"}};
     record.interfaces.push_back(interface);
     record.silencers.push_back(
         {vornovsctl::Silencer::kNetdev, "/b", "bond0", vornovsctl::SavedFile{"", 0644, 0, 0}});
@@ -476,17 +478,22 @@ TEST(NetworkManager, IsToldWhichProfileIsActiveWhenItGetsAnInterfaceBack)
                                                 "connection.type:802-3-ethernet\n"
                                                 "ipv4.method:auto\nipv6.method:auto\n");
     host.Answer("systemctl is-active NetworkManager.service", "active\n");
+    host.Write("/proc/sys/net/ipv4/conf/eth0/promote_secondaries", "0\n");
+    host.Write("/proc/sys/net/ipv6/conf/eth0/autoconf", "1\n");
     AdoptionRecord record;
     vornovsctl::AddToRecord(host.view, hands, vornovsctl::ReadWishes(host.view, {}), record);
     vornovsctl::PerformAdoption(host.view, {"eth0"}, record, hands);
 
     host.Write("/proc/sys/net/ipv6/conf/eth0/accept_dad", "1\n");
+    host.Write("/proc/sys/net/ipv4/conf/eth0/promote_secondaries", "1\n");
     hands.runs.clear();
 
-    EXPECT_THAT(vornovsctl::PerformRelease(host.view, {"eth0"}, record, hands),
+    EXPECT_THAT(vornovsctl::PerformRelease(host.view, {"eth0"}, record, hands).unchecked,
                 ElementsAre("eth0"));
 
     EXPECT_THAT(hands.runs, Contains("sysctl -q -w net/ipv6/conf/eth0/accept_dad=0"));
+    EXPECT_THAT(hands.runs, Contains("sysctl -q -w net/ipv4/conf/eth0/promote_secondaries=0"));
+    EXPECT_THAT(hands.runs, Not(Contains(HasSubstr("autoconf"))));
     EXPECT_EQ(host.Read("/run/NetworkManager/devices/2"),
               "[device]\nmanaged=true\nconnection-uuid=one\nnm-owned=false\n");
     EXPECT_EQ(hands.runs.back(), "systemctl start NetworkManager.service");

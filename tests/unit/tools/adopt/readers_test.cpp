@@ -10,6 +10,7 @@ namespace {
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
+using testing::Not;
 using unit::Recorded;
 using unit::RecordedHost;
 using vornovsctl::ReadWishes;
@@ -280,6 +281,19 @@ TEST(Ifupdown, ItsLeaseAndIdentityAreCarriedOver)
     const vornovsctl::Lease lease{"192.0.2.19",  "255.255.255.192", "192.0.2.1", {"192.0.2.1"},
                                   {"192.0.2.1"}, "example.net",     600,         1795250807};
     EXPECT_EQ(wish.lease, lease);
+}
+
+TEST(Ifupdown, ItsClientTellsServersOfIpv6NoNameUnlessItIsAskedTo)
+{
+    RecordedHost host;
+    host.AddLink("eth0", kMac0);
+    host.Write("/etc/network/interfaces", "auto eth0\niface eth0 inet6 dhcp\n");
+
+    EXPECT_THAT(TextOf(OnlyWish(host)), HasSubstr("DHCPV6_HOSTNAME=none\n"));
+
+    host.Write("/etc/dhcp/dhclient.conf", "send fqdn.fqdn = gethostname();\n");
+
+    EXPECT_THAT(TextOf(OnlyWish(host)), Not(HasSubstr("DHCPV6_HOSTNAME")));
 }
 
 TEST(Ifupdown, FixedAddressesRoutesAndCommandsAreCarriedOver)

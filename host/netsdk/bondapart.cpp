@@ -1,7 +1,9 @@
 #include "bondchange.h"
 
+#include "support/contains.h"
 #include "support/fileslock.h"
 #include "support/filestates.h"
+#include "support/interfacename.h"
 #include "support/livesettings.h"
 #include "support/networkprogram.h"
 
@@ -10,13 +12,6 @@
 
 namespace vornhost {
 namespace {
-
-constexpr char kBridgePrefix[] = "ovs_";
-
-bool Contains(const std::vector<std::string>& list, const std::string& name)
-{
-    return std::find(list.begin(), list.end(), name) != list.end();
-}
 
 /** The interfaces of which one stands for the addressing while there is no bond. */
 std::vector<std::string> CarriersOf(const BondPlan& plan)

@@ -2,6 +2,7 @@
 
 #include "bondmodes.h"
 
+#include "support/contains.h"
 #include "support/filestates.h"
 #include "support/settings.h"
 
@@ -33,11 +34,6 @@ unsigned FileMode(const FileStates& states, const std::string& interface)
 {
     const auto state = states.find(interface);
     return state == states.end() ? FileState{}.mode : state->second.mode;
-}
-
-bool Contains(const std::vector<std::string>& list, const std::string& name)
-{
-    return std::find(list.begin(), list.end(), name) != list.end();
 }
 
 void RemoveKeys(KeyValueFile& file, const std::vector<std::string>& keys)

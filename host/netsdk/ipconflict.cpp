@@ -1,5 +1,6 @@
 #include "support/filestates.h"
 #include "support/interfacefile.h"
+#include "support/interfacename.h"
 #include "support/settings.h"
 #include "support/uplink.h"
 
@@ -19,8 +20,6 @@
 namespace {
 
 using vornhost::WantedAddress;
-
-constexpr char kBridgePrefix[] = "ovs_";
 
 /** @return  nothing when there is no file that can be read. */
 std::optional<std::vector<WantedAddress>> IPv4AddressesOf(const std::string& interface)
@@ -42,8 +41,8 @@ std::set<std::string> InterfacesWithBridgeFile()
     for (const auto& entry :
          std::filesystem::directory_iterator(vornhost::kConfigurationFolder, ignored)) {
         const std::string name = vornhost::InterfaceOfFileName(entry.path().filename().string());
-        if (name.starts_with(kBridgePrefix)) {
-            names.insert(name.substr(sizeof kBridgePrefix - 1));
+        if (name.starts_with(vornhost::kBridgePrefix)) {
+            names.insert(name.substr(vornhost::kBridgePrefixSize));
         }
     }
     return names;
@@ -81,7 +80,7 @@ std::optional<std::vector<std::string>> Conflicts(const std::string& bond)
     const std::vector<std::string> slaves = vornhost::ListedSlaves(bond);
     std::vector<std::string> conflicts;
     for (const std::string& name : InterfacesWithBridgeFile()) {
-        const std::string bridge = kBridgePrefix + name;
+        const std::string bridge = vornhost::kBridgePrefix + name;
         if (bridge == bond || name == bond || (!slaves.empty() && name == slaves[0])) {
             continue;
         }

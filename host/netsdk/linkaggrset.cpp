@@ -1,6 +1,7 @@
 #include "bondchange.h"
 #include "bondmodes.h"
 
+#include "support/contains.h"
 #include "support/interfacename.h"
 
 #include <algorithm>
@@ -18,11 +19,6 @@ std::string Name(const char (&field)[VORN_NAME_SIZE])
     return {field, ::strnlen(field, VORN_NAME_SIZE)};
 }
 
-bool Contains(const std::vector<std::string>& list, const std::string& name)
-{
-    return std::find(list.begin(), list.end(), name) != list.end();
-}
-
 /** @return  the bond and the slaves of a record, no slaves when the record is wrong. */
 BondPlan PlanOf(const VORNLINKAGGROPT& opt)
 {
@@ -33,7 +29,7 @@ BondPlan PlanOf(const VORNLINKAGGROPT& opt)
     for (int index = 0; index < count; ++index) {
         const std::string slave = Name(opt.rgszSlave[index]);
         if (!vornhost::IsInterfaceName(slave) || slave == plan.name ||
-            Contains(plan.slaves, slave)) {
+            vornhost::Contains(plan.slaves, slave)) {
             return {};
         }
         plan.slaves.push_back(slave);

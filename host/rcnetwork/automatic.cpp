@@ -24,12 +24,11 @@ using std::chrono::seconds;
 using Clock = std::chrono::steady_clock;
 
 constexpr char kBootMark[] = "/run/vornovs/network.boot";
-constexpr mode_t kPrivate = 0600;
 /** The lock that the library holds while it edits files, as it is called below /run. */
 constexpr char kConfigurationLock[] = "file!tmp!ovs_config.lock";
 constexpr char kDeviceManager[] = "/run/udev/control";
 constexpr char kDeviceRecord[] = "/run/udev/data/n";
-constexpr std::chrono::milliseconds kPoll{100};
+constexpr std::chrono::milliseconds kBetweenLooks{100};
 /** Far more than a conversion takes: somebody has left a hold and not its holder. */
 constexpr seconds kConversionLimit{300};
 
@@ -58,7 +57,7 @@ void WaitForInterfaces(seconds limit)
     const auto deadline = Clock::now() + limit;
     std::set<std::string> missing = Missing(needed);
     while (!missing.empty() && Clock::now() < deadline) {
-        std::this_thread::sleep_for(kPoll);
+        std::this_thread::sleep_for(kBetweenLooks);
         missing = Missing(needed);
     }
     for (const std::string& name : missing) {
@@ -70,7 +69,7 @@ void WaitForConversion()
 {
     const auto deadline = Clock::now() + kConversionLimit;
     while (ConversionRuns() && Clock::now() < deadline) {
-        std::this_thread::sleep_for(kPoll);
+        std::this_thread::sleep_for(kBetweenLooks);
     }
 }
 
@@ -128,7 +127,7 @@ bool StartAtBoot(const Request& request)
     {
         // From now on an interface that appears is brought up by itself, after this run.
         const Descriptor lock = TakeNetworkLock();
-        if (lock && !ReplaceFile(kBootMark, "", kPrivate)) {
+        if (lock && !ReplaceFile(kBootMark, "", kPrivateFile)) {
             Say({Severity::kWarning,
                  std::string("cannot write ") + kBootMark + ": " + std::strerror(errno)});
         }

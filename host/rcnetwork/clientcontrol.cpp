@@ -35,11 +35,10 @@ constexpr char kLeaseFolder[] = "/var/lib/dhcpcd/";
 constexpr std::array kLeaseEndings{".lease", ".lease6"};
 constexpr char kConfigurationEnding[] = ".conf";
 constexpr char kHeader[] = "# Written by rc.network for its client; not to be edited.\n";
-constexpr mode_t kPrivate = 0600;
-constexpr std::chrono::seconds kUnitDeadline{20};
+constexpr std::chrono::seconds kClientDeadline{20};
 constexpr std::chrono::seconds kEndDeadline{5};
 constexpr std::chrono::seconds kStartDeadline{5};
-constexpr std::chrono::milliseconds kPoll{10};
+constexpr std::chrono::milliseconds kLookAgain{10};
 
 std::string FileOf(const std::string& interface, const char* ending)
 {
@@ -119,7 +118,7 @@ bool WaitFor(const std::function<bool()>& condition, std::chrono::milliseconds t
         if (std::chrono::steady_clock::now() > deadline) {
             return false;
         }
-        std::this_thread::sleep_for(kPoll);
+        std::this_thread::sleep_for(kLookAgain);
     }
     return true;
 }
@@ -148,7 +147,7 @@ bool EndProcesses(pid_t leader)
     (void)kill(leader, SIGTERM);
     const auto gone = [&] { return ProcessesOf(leader).empty(); };
     if (WaitFor([&] { return !ReadProcess(leader) || ReadProcess(leader)->ended; }, kEndDeadline) &&
-        WaitFor(gone, kPoll)) {
+        WaitFor(gone, kLookAgain)) {
         return true;
     }
     for (const int signal : {SIGTERM, SIGKILL}) {
@@ -214,7 +213,7 @@ bool WriteFormers(const std::string& interface, const std::vector<std::string>& 
     for (const std::string& former : formers) {
         text += former + "\n";
     }
-    return ReplaceFile(FileOf(interface, ".former"), text, kPrivate);
+    return ReplaceFile(FileOf(interface, ".former"), text, kPrivateFile);
 }
 
 /** What this one is going to say is its own again. */
@@ -243,7 +242,7 @@ bool WriteConfiguration(const std::string& interface, const ClientOptions& optio
     for (const std::string& option : options) {
         text += option + "\n";
     }
-    return ReplaceFile(FileOf(interface, kConfigurationEnding), text, kPrivate);
+    return ReplaceFile(FileOf(interface, kConfigurationEnding), text, kPrivateFile);
 }
 
 ClientOptions ReadConfiguration(const fs::path& path)
@@ -266,19 +265,10 @@ void ForgetFiles(const std::string& interface)
     }
 }
 
-std::string Joined(const std::vector<std::string>& words)
-{
-    std::string text;
-    for (const std::string& word : words) {
-        text += (text.empty() ? "" : " ") + word;
-    }
-    return text;
-}
-
 bool RunEvent(const std::vector<std::string>& event)
 {
     ProcessOptions options;
-    options.deadline = kUnitDeadline;
+    options.deadline = kClientDeadline;
     options.environment = ToolEnvironment();
     options.environment.insert(options.environment.end(), event.begin(), event.end());
     return RunProcess({kEventProgram}, options).Succeeded();
@@ -314,7 +304,7 @@ bool StartClient(const std::string& interface, const std::vector<std::string>& f
         error = std::string("cannot write its configuration: ") + std::strerror(errno);
         return false;
     }
-    const bool started = SystemdRuns() ? StartUnit(UnitOf(interface), kUnitDeadline, &error)
+    const bool started = SystemdRuns() ? StartUnit(UnitOf(interface), kClientDeadline, &error)
                                        : Spawn({kClientProgram, interface}, error);
     if (started) {
         for (const std::string& former : formers) {
@@ -327,7 +317,7 @@ bool StartClient(const std::string& interface, const std::vector<std::string>& f
 
 bool EndClient(const std::string& interface, std::string& error)
 {
-    if (SystemdRuns() && !StopUnit(UnitOf(interface), kUnitDeadline, &error)) {
+    if (SystemdRuns() && !StopUnit(UnitOf(interface), kClientDeadline, &error)) {
         return false;
     }
     const pid_t leader = RecordedProcess(interface);

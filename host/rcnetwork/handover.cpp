@@ -21,7 +21,6 @@ using Json = nlohmann::json;
 
 /** Longer than any conversion takes from one program to the next. */
 constexpr unsigned long kLifetimeSeconds = 120;
-constexpr mode_t kPrivate = 0600;
 
 /** A clock that nobody sets and that goes on while the host sleeps. */
 unsigned long BootSecond()
@@ -100,7 +99,7 @@ bool SaveHandover(const Handover& handover)
     if (handover.Empty()) {
         return unlink(kHandoverPath) == 0 || errno == ENOENT;
     }
-    return ReplaceFile(kHandoverPath, HandoverText(handover, BootSecond()), kPrivate);
+    return ReplaceFile(kHandoverPath, HandoverText(handover, BootSecond()), kPrivateFile);
 }
 
 } // namespace vornhost

@@ -20,7 +20,6 @@ namespace {
 using Json = nlohmann::json;
 
 constexpr char kHoldPath[] = "/run/vornovs/network.hold";
-constexpr mode_t kPrivate = 0600;
 
 struct Hold {
     std::string token;
@@ -44,7 +43,7 @@ std::optional<Hold> ReadHold()
 bool WriteHold(const Hold& hold)
 {
     const Json json = {{"token", hold.token}, {"names", hold.names}};
-    return ReplaceFile(kHoldPath, json.dump() + "\n", kPrivate);
+    return ReplaceFile(kHoldPath, json.dump() + "\n", kPrivateFile);
 }
 
 /** Differs from any other of this boot, and of an earlier one whose file survived. */

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <sstream>
+#include <support/contains.h>
 
 namespace vornhost {
 namespace {
@@ -14,11 +15,6 @@ std::vector<std::string> SplitAtCommas(const std::string& text)
         parts.push_back(part);
     }
     return parts;
-}
-
-bool Contains(const std::vector<std::string>& list, const std::string& name)
-{
-    return std::find(list.begin(), list.end(), name) != list.end();
 }
 
 /** The members in the order in which they were given, while they are still those. */

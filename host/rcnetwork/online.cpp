@@ -20,7 +20,7 @@ namespace {
 using Clock = std::chrono::steady_clock;
 
 constexpr std::chrono::seconds kPatience{15};
-constexpr std::chrono::milliseconds kPoll{250};
+constexpr std::chrono::milliseconds kBetweenAnswers{250};
 constexpr std::uint32_t kNotYet = IFA_F_TENTATIVE | IFA_F_DADFAILED;
 
 /** Looks for the addresses of one file. */
@@ -180,7 +180,7 @@ bool WaitUntilOnline()
             }
             return done;
         }
-        std::this_thread::sleep_for(kPoll);
+        std::this_thread::sleep_for(kBetweenAnswers);
     }
 }
 

@@ -17,7 +17,7 @@ using std::chrono::milliseconds;
 constexpr char kInterfaces[] = "/sys/class/net/";
 constexpr milliseconds kLinkDeadline{5000};
 constexpr milliseconds kPartnerDeadline{10000};
-constexpr milliseconds kPoll{10};
+constexpr milliseconds kAskAgain{10};
 /** Three seconds until a partner expects nothing any more, and as long until it acts on that. */
 constexpr milliseconds kAloneTime{6500};
 constexpr milliseconds kDatabaseLimit{5000};
@@ -58,7 +58,7 @@ bool WaitUntil(const std::function<bool()>& condition, milliseconds limit)
         if (std::chrono::steady_clock::now() >= deadline) {
             return false;
         }
-        std::this_thread::sleep_for(kPoll);
+        std::this_thread::sleep_for(kAskAgain);
     }
     return true;
 }

@@ -18,8 +18,6 @@ namespace vornhost {
 namespace {
 
 constexpr int kTries = 2;
-constexpr mode_t kPrivate = 0600;
-constexpr char kLacpMode[] = "802.3ad";
 
 void WriteHandover(const Handover& handover)
 {
@@ -156,7 +154,7 @@ void Reconciler::SettleHandover(const Inputs& inputs)
 
 void Reconciler::Save(const RunState& former, const RunState& state)
 {
-    if (state != former && !ReplaceFile(kRunStatePath, RunStateText(state), kPrivate)) {
+    if (state != former && !ReplaceFile(kRunStatePath, RunStateText(state), kPrivateFile)) {
         SayOnce({{Severity::kError,
                   std::string("cannot write ") + kRunStatePath + ": " + std::strerror(errno)}});
     }

@@ -27,8 +27,7 @@ using Clock = std::chrono::steady_clock;
 
 constexpr char kWaitingPath[] = "/run/vornovs/network.waiting";
 constexpr char kRetryLock[] = "retry.lock";
-constexpr mode_t kPrivate = 0600;
-constexpr std::chrono::seconds kPoll{1};
+constexpr std::chrono::seconds kBetweenTries{1};
 /** A switch that runs and does not carry what it shall makes every attempt a short outage. */
 constexpr std::chrono::seconds kFirstPause{15};
 constexpr std::chrono::seconds kLongestPause{600};
@@ -37,7 +36,7 @@ void Write(const std::set<std::string>& names)
 {
     if (names.empty()) {
         (void)::unlink(kWaitingPath);
-    } else if (!ReplaceFile(kWaitingPath, Json(names).dump() + "\n", kPrivate)) {
+    } else if (!ReplaceFile(kWaitingPath, Json(names).dump() + "\n", kPrivateFile)) {
         Say({Severity::kError,
              std::string("cannot write ") + kWaitingPath + ": " + std::strerror(errno)});
     }
@@ -102,7 +101,7 @@ void RetryUntilDone()
     auto next = Clock::now() + pause;
     std::string tried = SwitchProcesses();
     for (auto names = WaitingForSwitch(); !names.empty(); names = WaitingForSwitch()) {
-        std::this_thread::sleep_for(kPoll);
+        std::this_thread::sleep_for(kBetweenTries);
         const std::string processes = SwitchProcesses();
         if ((Clock::now() < next && (processes.empty() || processes == tried)) ||
             ConversionRuns()) {

@@ -22,7 +22,6 @@ namespace {
 
 constexpr char kLockName[] = "network.lock";
 constexpr int kLockSeconds = 90;
-constexpr mode_t kPrivate = 0600;
 
 bool ForgetRecords(const std::set<std::string>& names)
 {
@@ -35,7 +34,7 @@ bool ForgetRecords(const std::set<std::string>& names)
     for (const std::string& name : names) {
         state.interfaces.erase(name);
     }
-    if (!ReplaceFile(kRunStatePath, RunStateText(state), kPrivate)) {
+    if (!ReplaceFile(kRunStatePath, RunStateText(state), kPrivateFile)) {
         Say({Severity::kError,
              std::string("cannot write ") + kRunStatePath + ": " + std::strerror(errno)});
         return false;

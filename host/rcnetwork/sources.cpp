@@ -8,8 +8,6 @@
 namespace vornhost {
 namespace {
 
-constexpr char kLacpMode[] = "802.3ad";
-
 class SourceFinder {
 public:
     SourceFinder(const Inputs& inputs, const Kinship& kinship, Unit& unit)

@@ -1,11 +1,11 @@
 #include "unit.h"
 
 #include <algorithm>
+#include <support/interfacename.h>
 
 namespace vornhost {
 namespace {
 
-constexpr char kBridgePrefix[] = "ovs_";
 constexpr char kBondSuffix[] = "-bond";
 
 } // namespace
@@ -17,7 +17,7 @@ std::string BridgeOf(const std::string& plainName)
 
 std::string PlainOf(const std::string& name)
 {
-    return name.rfind(kBridgePrefix, 0) == 0 ? name.substr(sizeof kBridgePrefix - 1) : name;
+    return name.rfind(kBridgePrefix, 0) == 0 ? name.substr(kBridgePrefixSize) : name;
 }
 
 std::vector<std::string> Unit::ForeignPorts() const

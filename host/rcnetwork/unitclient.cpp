@@ -1,3 +1,4 @@
+#include "support/interfacevalues.h"
 #include "unitplan.h"
 
 #include <algorithm>
@@ -8,18 +9,6 @@
 #include <sys/socket.h>
 
 namespace vornhost {
-namespace {
-
-std::string Joined(const std::vector<std::string>& names)
-{
-    std::string text;
-    for (const std::string& name : names) {
-        text += (text.empty() ? "" : ",") + name;
-    }
-    return text;
-}
-
-} // namespace
 
 /** Where this unit's client may have run; its lease is the latest of them. */
 std::vector<std::string> UnitPlanner::ClientNames() const
@@ -209,7 +198,7 @@ void UnitPlanner::PlanClient()
         EndClient(name, "drop");
     }
     if (!wanted.empty() && !stays) {
-        m_steps.startClients.push_back("start " + Carrier() + " of " + Joined(formers) + ": " +
+        m_steps.startClients.push_back("start " + Carrier() + " of " + Joined(formers, ",") + ": " +
                                        ClientText(wanted));
     }
     if (m_unit.file != nullptr) {

@@ -12,7 +12,6 @@ namespace vornhost {
 
 namespace {
 
-constexpr std::string_view kBridgePrefix = "ovs_";
 constexpr std::string_view kSwitchDevice = "ovs-system";
 
 // Callers compare as far as the shorter of the two goes.
@@ -50,8 +49,7 @@ public:
             selection.passedOver.push_back(link.name);
         } else if (link.type != ARPHRD_ETHER || candidate.wireless) {
             selection.notEthernet.push_back(link.name);
-        } else if (!candidate.tag &&
-                   kBridgePrefix.size() + link.name.size() > kLongestInterfaceName) {
+        } else if (!candidate.tag && kBridgePrefixSize + link.name.size() > kLongestInterfaceName) {
             selection.tooLong.push_back(link.name);
         } else {
             selection.convertible.push_back(link.name);

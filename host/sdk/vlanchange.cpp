@@ -19,8 +19,6 @@
 namespace vornhost {
 namespace {
 
-constexpr char kBridgePrefix[] = "ovs_";
-
 int Fail(const std::string& name, const std::string& reason)
 {
     ::syslog(LOG_ERR, "vornsdk: VLAN %s: %s", name.c_str(), reason.c_str());

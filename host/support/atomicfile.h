@@ -10,6 +10,9 @@
 
 namespace vornhost {
 
+/** The mode of files that only root reads: they may hold secrets, or nobody else needs them. */
+constexpr mode_t kPrivateFile = 0600;
+
 /**
  * Gives a file a new content, or makes it. An existing one keeps its owner, group and mode; behind
  * a symbolic link the file that it points at is replaced and the link stays. The file gets a new

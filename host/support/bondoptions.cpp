@@ -84,7 +84,7 @@ const Option* FindOption(std::string_view name)
 }
 
 /** Both, with the separator between them where there are two. */
-std::string Joined(std::string list, const char* separator, const std::string& next)
+std::string Appended(std::string list, const char* separator, const std::string& next)
 {
     if (!list.empty()) {
         list += separator;
@@ -151,7 +151,7 @@ std::string LiveValue(const Option& option, const std::string& line)
     }
     std::string list;
     for (const std::string& word : words) {
-        list = Joined(list, ",", word);
+        list = Appended(list, ",", word);
     }
     return list;
 }
@@ -176,7 +176,7 @@ BondOptions BondOptions::Parse(std::string_view text)
         std::string value = word.substr(equals + 1);
         if (name == kArpTargets) {
             const std::string former = options.Get(name);
-            value = Joined(former, ",", WithoutSigns(value));
+            value = Appended(former, ",", WithoutSigns(value));
         }
         options.values[name] = NamedValue(name, value);
     }
@@ -208,7 +208,7 @@ std::string BondOptions::Text() const
     std::string text = values.contains(kMode) ? Assignment(kMode, Get(kMode)) : "";
     for (const auto& [name, value] : values) {
         if (name != kMode) {
-            text = Joined(text, " ", Assignment(name, value));
+            text = Appended(text, " ", Assignment(name, value));
         }
     }
     return text;

@@ -12,6 +12,9 @@
 
 namespace vornhost {
 
+/** The kernel's name of link aggregation that is negotiated. */
+constexpr char kLacpMode[] = "802.3ad";
+
 /** Where the kernel shows its interfaces; a bond's options are in "NAME/bonding" below it. */
 constexpr char kInterfaceFolder[] = "/sys/class/net";
 

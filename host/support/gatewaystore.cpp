@@ -108,7 +108,7 @@ bool CanBeGateway(const in6_addr& address)
 }
 
 template <typename Address>
-std::optional<std::string> NormalAddress(int family, const std::string& text)
+std::optional<std::string> NormalGateway(int family, const std::string& text)
 {
     Address address{};
     char normal[INET6_ADDRSTRLEN] = {};
@@ -138,8 +138,8 @@ bool LockFile(int file)
 
 std::optional<std::string> NormalGatewayAddress(AddressFamily family, const std::string& text)
 {
-    return family == AddressFamily::kIPv4 ? NormalAddress<in_addr>(AF_INET, text)
-                                          : NormalAddress<in6_addr>(AF_INET6, text);
+    return family == AddressFamily::kIPv4 ? NormalGateway<in_addr>(AF_INET, text)
+                                          : NormalGateway<in6_addr>(AF_INET6, text);
 }
 
 std::optional<GatewayStore> GatewayStore::Load(const std::string& path)

@@ -12,7 +12,6 @@
 namespace vornhost {
 namespace {
 
-constexpr char kBridgePrefix[] = "ovs_";
 constexpr unsigned kMostVlan = 4095;
 constexpr unsigned kLongestForwardDelay = 30;
 

@@ -5,6 +5,7 @@
 #include <cctype>
 #include <charconv>
 #include <cstdint>
+#include <sstream>
 
 #include <arpa/inet.h>
 
@@ -25,6 +26,25 @@ std::string Trimmed(const std::string& text)
         return {};
     }
     return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
+}
+
+std::vector<std::string> Words(const std::string& text)
+{
+    std::istringstream stream(text);
+    std::vector<std::string> words;
+    for (std::string word; stream >> word;) {
+        words.push_back(word);
+    }
+    return words;
+}
+
+std::string Joined(const std::vector<std::string>& words, const char* separator)
+{
+    std::string text;
+    for (const std::string& word : words) {
+        text += (text.empty() ? "" : separator) + word;
+    }
+    return text;
 }
 
 std::optional<unsigned> ToNumber(const std::string& text, unsigned least, unsigned most)

@@ -6,6 +6,7 @@
 
 #include <optional>
 #include <string>
+#include <vector>
 
 namespace vornhost {
 
@@ -13,6 +14,11 @@ std::string Lower(std::string text);
 
 /** @return  the text without blanks at either end. */
 std::string Trimmed(const std::string& text);
+
+/** @return  what stands between blanks. */
+std::vector<std::string> Words(const std::string& text);
+
+std::string Joined(const std::vector<std::string>& words, const char* separator = " ");
 
 /** @return  nothing when the text is no number within the bounds. */
 std::optional<unsigned> ToNumber(const std::string& text, unsigned least, unsigned most);

@@ -1,4 +1,5 @@
 #include "settings.h"
+#include "contains.h"
 
 #include <algorithm>
 #include <array>
@@ -7,12 +8,6 @@ namespace vornhost {
 namespace {
 
 constexpr char kMtu[] = "MTU";
-
-template <std::size_t Size>
-bool Contains(const std::array<std::string_view, Size>& list, std::string_view word)
-{
-    return std::find(list.begin(), list.end(), word) != list.end();
-}
 
 /** "IPADDR", "IPADDR0" and "IPADDR255", but not "IPADDRESSES". */
 bool IsNumbered(std::string_view key, std::string_view name)

@@ -12,7 +12,6 @@
 namespace vornhost {
 namespace {
 
-constexpr std::string_view kBridgePrefix = "ovs_";
 constexpr std::string_view kSwitchDevice = "ovs-system";
 
 const Link* FindByIndex(const LiveNetwork& network, int index)
@@ -42,7 +41,7 @@ bool CanBecomePort(const LiveNetwork& network, const Link& parent)
     constexpr std::string_view kNever[] = {kBridgePrefix, "wlan", "ppp", "tun"};
     const Link* const master = FindByIndex(network, parent.master);
     return parent.kind != "bridge" && parent.kind != "openvswitch" &&
-           kBridgePrefix.size() + parent.name.size() <= kLongestInterfaceName &&
+           kBridgePrefixSize + parent.name.size() <= kLongestInterfaceName &&
            (parent.master == 0 || (master != nullptr && master->name == kSwitchDevice)) &&
            std::none_of(std::begin(kNever), std::end(kNever),
                         [&](std::string_view prefix) { return parent.name.starts_with(prefix); });

@@ -3,6 +3,7 @@
 #include "atomicfile.h"
 #include "filestates.h"
 #include "interfacefile.h"
+#include "interfacename.h"
 #include "remembered.h"
 #include "settings.h"
 
@@ -16,10 +17,8 @@
 namespace vornhost {
 namespace {
 
-constexpr char kBridgePrefix[] = "ovs_";
 constexpr char kFilePrefix[] = "ifcfg-";
-constexpr char kOptions[] = "BONDING_OPTS";
-constexpr mode_t kPrivate = 0600;
+constexpr char kOptionsKey[] = "BONDING_OPTS";
 
 std::string MemoryFolder()
 {
@@ -48,7 +47,7 @@ std::set<std::string> InterfacesWithFilesIn(const std::string& folder)
 bool IsWholeOnSwitch(const std::string& bond, const KeyValueFile& file)
 {
     const std::string bridge = kBridgePrefix + bond;
-    if (file.Get("DEVICE") != bond || !file.Get(kOptions) || file.Get("BRIDGE") != bridge) {
+    if (file.Get("DEVICE") != bond || !file.Get(kOptionsKey) || file.Get("BRIDGE") != bridge) {
         return false;
     }
     const auto state = ReadFileState(bridge);
@@ -65,7 +64,7 @@ bool Remember(const std::string& bond, const KeyValueFile& file)
     }
     std::error_code ignored; // the write says what is wrong with the folder
     std::filesystem::create_directories(MemoryFolder(), ignored);
-    return ReplaceFile(MemoryPath(bond), file.Text(), kPrivate);
+    return ReplaceFile(MemoryPath(bond), file.Text(), kPrivateFile);
 }
 
 /** Whether the files say that the way back is over; half of it leaves the bridge's file or name. */
@@ -87,7 +86,7 @@ bool GiveBack(const std::string& bond)
     }
     const auto now = KeyValueFile::Parse(file->text.value_or(""));
     // Who has deleted the file or written options meanwhile wants it so.
-    if (file->text && !now.Get(kOptions)) {
+    if (file->text && !now.Get(kOptionsKey)) {
         KeyValueFile whole = *known;
         (void)whole.Remove("BRIDGE");
         (void)CarryChanges(

@@ -21,8 +21,8 @@ namespace {
 constexpr char kLockName[] = "adopt.lock";
 constexpr int kLockSeconds = 60;
 // A client that goes on with a lease has it at once; one that finds no server waits in vain.
-constexpr std::chrono::seconds kPatience{25};
-constexpr std::chrono::milliseconds kGlance{250};
+constexpr std::chrono::seconds kSettlingTime{25};
+constexpr std::chrono::milliseconds kBetweenGlances{250};
 
 std::set<std::string> NamesOf(const Context& context)
 {
@@ -34,12 +34,13 @@ std::set<std::string> NamesOf(const Context& context)
 Belongings WaitFor(const Belongings& before, const std::set<std::string>& names)
 {
     Belongings missing;
-    for (auto waited = std::chrono::milliseconds(0); waited <= kPatience; waited += kGlance) {
+    for (auto waited = std::chrono::milliseconds(0); waited <= kSettlingTime;
+         waited += kBetweenGlances) {
         missing = Missing(before, BelongingsOf(HostView::Now(), names));
         if (missing.empty()) {
             break;
         }
-        std::this_thread::sleep_for(kGlance);
+        std::this_thread::sleep_for(kBetweenGlances);
     }
     return missing;
 }
@@ -71,10 +72,10 @@ Belongings WaitForManagers(const AdoptionRecord& record, const LooseEnds& ends,
                            Hands& hands)
 {
     for (auto waited = std::chrono::milliseconds(0);
-         waited <= kPatience &&
+         waited <= kSettlingTime &&
          (!AreSettled(record, names) || !IsReplaced(ends.standby, HostView::Now()));
-         waited += kGlance) {
-        std::this_thread::sleep_for(kGlance);
+         waited += kBetweenGlances) {
+        std::this_thread::sleep_for(kBetweenGlances);
     }
     const Belongings missing = WaitFor(before, names);
     TieUp(ends, HostView::Now(), hands);

@@ -6,14 +6,13 @@
 
 #include <algorithm>
 #include <set>
+#include <support/interfacename.h>
 
 namespace vornovsctl {
 
 namespace {
 
-constexpr std::size_t kLongestInterfaceName = VORN_NAME_SIZE - 1;
 constexpr std::size_t kLongestClientName = 255;
-constexpr std::size_t kBridgePrefixSize = 4; // "ovs_"
 constexpr int kModes = VORN_LINK_AGGR_OVS_BALANCE_TCP;
 
 bool IsControl(char character)
@@ -49,7 +48,7 @@ std::string ClientFault(const std::string& name)
 
 std::string InterfaceFault(const std::string& name)
 {
-    std::string fault = NameFault(name, kLongestInterfaceName);
+    std::string fault = NameFault(name, vornhost::kLongestInterfaceName);
     if (!fault.empty()) {
         return fault;
     }
@@ -65,7 +64,8 @@ std::string InterfaceFault(const std::string& name)
 std::string PlainInterfaceFault(const std::string& name)
 {
     std::string fault = InterfaceFault(name);
-    if (fault.empty() && name.size() + kBridgePrefixSize > kLongestInterfaceName) {
+    if (fault.empty() &&
+        name.size() + vornhost::kBridgePrefixSize > vornhost::kLongestInterfaceName) {
         return "is longer than 11 characters, which leaves no room for its bridge's";
     }
     return fault;

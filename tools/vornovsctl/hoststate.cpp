@@ -6,13 +6,13 @@
 #include <cerrno>
 #include <fstream>
 #include <string_view>
+#include <support/interfacename.h>
 #include <unistd.h>
 
 namespace vornovsctl {
 
 namespace {
 
-constexpr std::string_view kBridgePrefix = "ovs_";
 constexpr char kTakenOffPath[] = "/usr/vorn/etc/vornovs/ovs_ignore.conf";
 constexpr char kInterfaceFilePrefix[] = "/etc/sysconfig/network-scripts/ifcfg-";
 
@@ -112,13 +112,14 @@ Json StateFields(const HostState& state)
 
 std::string BridgeOf(const std::string& interface)
 {
-    return std::string(kBridgePrefix) + interface;
+    return vornhost::kBridgePrefix + interface;
 }
 
 std::string InterfaceOf(const std::string& bridge)
 {
-    const bool ours = bridge.size() > kBridgePrefix.size() && bridge.starts_with(kBridgePrefix);
-    return ours ? bridge.substr(kBridgePrefix.size()) : "";
+    const bool ours =
+        bridge.size() > vornhost::kBridgePrefixSize && bridge.starts_with(vornhost::kBridgePrefix);
+    return ours ? bridge.substr(vornhost::kBridgePrefixSize) : "";
 }
 
 Json NamesOrNull(const std::optional<Names>& names)

@@ -158,6 +158,36 @@ TEST_F(DhcpHost, TheLeaseGoesWhereTheAddressesGo)
     EXPECT_EQ(Requests("DHCPRELEASE"), 0);
 }
 
+/** What a client tells when a server has given it something. */
+void TellNameServer(const std::string& interface, const std::string& server)
+{
+    EXPECT_EQ(RunProgram({"env", "interface=" + interface, "reason=BOUND", "protocol=dhcp",
+                          "if_configured=true", "if_up=true", "if_down=false",
+                          "interface_order=" + interface, "new_domain_name_servers=" + server,
+                          "/usr/vorn/lib/vornovs-dhcp-event"}),
+              (Outcome{0, "", ""}));
+}
+
+TEST_F(DhcpHost, NameServersOfThePreferredWayComeFirstWhoeverSpokeLast)
+{
+    WriteFile("/run/vornovs/dhcp/eth0.conf", "interface eth0\nmetric 200\n");
+    WriteFile("/run/vornovs/dhcp/eth1.conf", "interface eth1\nmetric 100\n");
+    for (const bool again : {false, true}) {
+        TellNameServer("eth1", "192.0.2.1");
+        EXPECT_THAT(ReadFile("/etc/resolv.conf"), HasSubstr("nameserver 192.0.2.1\n")) << again;
+        TellNameServer("eth0", "192.0.2.2");
+        EXPECT_THAT(ReadFile("/etc/resolv.conf"),
+                    HasSubstr("from eth1.dhcp, eth0.dhcp\n"
+                              "# /etc/resolv.conf.head can replace this line\n"
+                              "nameserver 192.0.2.1\nnameserver 192.0.2.2\n"))
+            << again;
+    }
+    for (const std::string interface : {"eth0", "eth1"}) {
+        Delete("/run/vornovs/dhcp/" + interface + ".conf");
+        Delete("/run/dhcpcd/hook-state/resolv.conf/" + interface + ".dhcp");
+    }
+}
+
 TEST_F(DhcpHost, AClientThatWasKilledIsStartedAnewAndAStopEndsIt)
 {
     File("eth0", kDhcp);

@@ -6,6 +6,7 @@
 #include "adopt/networkmanagerreader.h"
 #include "adopt/silencers.h"
 #include "adopt/writer.h"
+#include "hands.h"
 
 #include <algorithm>
 #include <array>
@@ -15,9 +16,7 @@ namespace vornovsctl {
 
 namespace {
 
-constexpr unsigned kReadable = 0644;
-constexpr unsigned kPrivate = 0600;
-constexpr char kLeaseFolder[] = "/var/lib/dhcpcd/";
+constexpr char kDhcpcdFolder[] = "/var/lib/dhcpcd/";
 constexpr char kNetworkProgram[] = "/etc/rc.network";
 constexpr std::array kOurUnits{"vornovs-network.service", "vornovs-network-wait-online.service"};
 // With nothing to wait for it waits until it has waited too long.
@@ -96,8 +95,8 @@ std::optional<std::string> Lease6TextOf(const HostView& host, const Wish& wish)
     return std::nullopt;
 }
 
-AdoptedInterface InterfaceOf(const HostView& host, const Hands& hands, const Wish& wish,
-                             const std::map<std::string, NetworkManagerDevice>& profiles)
+AdoptedInterface AdoptedInterfaceOf(const HostView& host, const Hands& hands, const Wish& wish,
+                                    const std::map<std::string, NetworkManagerDevice>& profiles)
 {
     AdoptedInterface interface;
     interface.name = wish.name;
@@ -107,13 +106,14 @@ AdoptedInterface InterfaceOf(const HostView& host, const Hands& hands, const Wis
         interface.profile = profile->second.profile;
     }
     const std::string path = FilePathOf(wish.name);
-    interface.files.push_back({path, FileTextOf(wish), kReadable, hands.Read(path)});
-    const std::string leasePath = kLeaseFolder + wish.name + ".lease";
+    interface.files.push_back({path, FileTextOf(wish), kReadableMode, hands.Read(path)});
+    const std::string leasePath = kDhcpcdFolder + wish.name + ".lease";
     if (const auto lease = LeaseTextOf(host, wish)) {
-        interface.files.push_back({leasePath, *lease, kPrivate, hands.Read(leasePath)});
+        interface.files.push_back({leasePath, *lease, kPrivateMode, hands.Read(leasePath)});
     }
     if (const auto lease = Lease6TextOf(host, wish)) {
-        interface.files.push_back({leasePath + '6', *lease, kPrivate, hands.Read(leasePath + '6')});
+        interface.files.push_back(
+            {leasePath + '6', *lease, kPrivateMode, hands.Read(leasePath + '6')});
     }
     interface.clients = ClientsOf(host, wish.name);
     interface.stateLine = StateLineOf(host, wish.name);
@@ -173,7 +173,7 @@ void AddToRecord(const HostView& host, const Hands& hands, const Wishes& wishes,
 {
     const auto profiles = ReadNetworkManagerDevices(host);
     for (const auto& [name, wish] : wishes) {
-        record.interfaces.push_back(InterfaceOf(host, hands, wish, profiles));
+        record.interfaces.push_back(AdoptedInterfaceOf(host, hands, wish, profiles));
     }
     AddUnits(host, wishes, record);
     AddSilencers(host, hands, record);

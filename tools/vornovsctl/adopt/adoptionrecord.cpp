@@ -1,6 +1,7 @@
 #include "adopt/adoptionrecord.h"
 
 #include "answer.h"
+#include "hands.h"
 
 #include <algorithm>
 #include <array>
@@ -12,7 +13,6 @@ namespace {
 
 constexpr char kRecordPath[] = "/usr/vorn/etc/vornnetd/adopted/record.json";
 constexpr int kVersion = 1;
-constexpr unsigned kPrivate = 0600; // files of managers may hold secrets
 
 constexpr std::array kPhases{"adopting", "adopted", "releasing"};
 constexpr std::array kSilencers{"interfaces", "network", "netdev", "keyfile", "cloud"};
@@ -211,7 +211,7 @@ void AdoptionRecord::Save(Hands& hands) const
             {{"unit", unit.unit}, {"enable", unit.enable}, {"before", unit.before}});
     }
     hands.Write(kRecordPath, json.dump(2, ' ', false, Json::error_handler_t::replace) + '\n',
-                kPrivate);
+                kPrivateMode);
 }
 
 void AdoptionRecord::Forget(Hands& hands)

@@ -8,7 +8,7 @@ namespace vornovsctl {
 
 namespace {
 
-constexpr char kDigits[] = "0123456789abcdef";
+constexpr char kHexDigits[] = "0123456789abcdef";
 
 std::string HexOf(const std::string& bytes)
 {
@@ -16,8 +16,8 @@ std::string HexOf(const std::string& bytes)
     for (const char byte : bytes) {
         const auto value = static_cast<unsigned char>(byte);
         text += text.empty() ? "" : ":";
-        text += kDigits[value >> 4U];
-        text += kDigits[value & 0xfU];
+        text += kHexDigits[value >> 4U];
+        text += kHexDigits[value & 0xfU];
     }
     return text;
 }
@@ -74,7 +74,7 @@ std::vector<std::string> StatementsOf(const std::string& text)
     return statements;
 }
 
-std::vector<std::string> ListOf(const std::string& text)
+std::vector<std::string> LeaseList(const std::string& text)
 {
     std::vector<std::string> values;
     std::string part;
@@ -120,11 +120,11 @@ void ReadLeaseStatement(const std::string& statement, Lease& lease, std::int64_t
     } else if (const auto mask = After(statement, "option subnet-mask ")) {
         lease.netmask = *mask;
     } else if (const auto routers = After(statement, "option routers ")) {
-        lease.routers = ListOf(*routers);
+        lease.routers = LeaseList(*routers);
     } else if (const auto seconds = After(statement, "option dhcp-lease-time ")) {
         lease.seconds = static_cast<std::uint32_t>(std::strtoul(seconds->c_str(), nullptr, 10));
     } else if (const auto dns = After(statement, "option domain-name-servers ")) {
-        lease.dns = ListOf(*dns);
+        lease.dns = LeaseList(*dns);
     } else if (const auto server = After(statement, "option dhcp-server-identifier ")) {
         lease.server = *server;
     } else if (const auto domain = After(statement, "option domain-name ")) {

@@ -1,6 +1,7 @@
 #include "adopt/handover.h"
 
 #include "answer.h"
+#include "hands.h"
 
 #include <algorithm>
 #include <arpa/inet.h>
@@ -16,7 +17,6 @@ namespace vornovsctl {
 namespace {
 
 constexpr char kStatePath[] = "/run/network/ifstate";
-constexpr unsigned kReadable = 0644;
 
 bool IsActive(const HostView& host, const char* unit)
 {
@@ -82,9 +82,9 @@ void SetStateLine(const AdoptedInterface& interface, bool up, Hands& hands)
         text += line == interface.stateLine ? "" : line + '\n';
     }
     text += up ? interface.stateLine + '\n' : "";
-    hands.Write(kStatePath, text, kReadable);
+    hands.Write(kStatePath, text, kReadableMode);
     hands.Write(std::string(kStatePath) + '.' + interface.name, (up ? interface.name : "") + '\n',
-                kReadable);
+                kReadableMode);
 }
 
 /** Whether two addresses are the same up to a length. */
@@ -194,7 +194,7 @@ void GiveToNetworkd(const HostView& host, const AdoptionRecord& record,
         }
     }
     for (const std::string& path : paths) {
-        hands.Write(path, "[Network]\nKeepConfiguration=static\n", kReadable);
+        hands.Write(path, "[Network]\nKeepConfiguration=static\n", kReadableMode);
     }
     StartAnew(kNetworkdUnit, hands);
     for (const std::string& path : paths) {
@@ -257,7 +257,7 @@ std::set<std::string> GiveToNetworkManager(const HostView& host, const AdoptionR
             hands.Write("/run/NetworkManager/devices/" + std::to_string(link->index),
                         "[device]\nmanaged=true\nconnection-uuid=" + interface.profile +
                             "\nnm-owned=" + (made ? "true" : "false") + '\n',
-                        kReadable);
+                        kReadableMode);
         }
     }
     StartAnew(kNetworkManagerUnit, hands);

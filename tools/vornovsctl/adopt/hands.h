@@ -12,6 +12,9 @@
 
 namespace vornovsctl {
 
+constexpr unsigned kReadableMode = 0644;
+constexpr unsigned kPrivateMode = 0600; // files of managers may hold secrets
+
 /** A file as it is: what it takes to make it again. */
 struct SavedFile {
     std::string text;

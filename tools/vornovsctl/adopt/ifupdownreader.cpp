@@ -8,6 +8,7 @@
 #include <array>
 #include <sstream>
 #include <string_view>
+#include <support/contains.h>
 #include <support/interfacevalues.h>
 #include <sys/socket.h>
 
@@ -15,24 +16,8 @@ namespace vornovsctl {
 
 namespace {
 
-constexpr char kLeaseFolder[] = "/var/lib/dhcp/";
+constexpr char kDhclientFolder[] = "/var/lib/dhcp/";
 constexpr char kClientConfiguration[] = "/etc/dhcp/dhclient.conf";
-
-std::vector<std::string> WordsOf(const std::string& text)
-{
-    std::istringstream stream(text);
-    std::vector<std::string> words;
-    for (std::string word; stream >> word;) {
-        words.push_back(word);
-    }
-    return words;
-}
-
-template <std::size_t Size>
-bool Contains(const std::array<std::string_view, Size>& list, std::string_view word)
-{
-    return std::find(list.begin(), list.end(), word) != list.end();
-}
 
 class StanzaReader {
 public:
@@ -64,7 +49,7 @@ private:
         constexpr std::array<std::string_view, 5> kMethods{"static", "manual", "dhcp", "auto",
                                                            "loopback"};
         const std::string& method = m_stanza.method;
-        if ((m_stanza.family != "inet" && !m_ipv6) || !Contains(kMethods, method) ||
+        if ((m_stanza.family != "inet" && !m_ipv6) || !vornhost::Contains(kMethods, method) ||
             (!m_ipv6 && method == "auto")) {
             Refuse("its method " + Quoted(m_stanza.family + ' ' + method) +
                    " cannot be carried over");
@@ -82,7 +67,7 @@ private:
     void ReadClient(const std::string& prefix)
     {
         const std::string& name = m_wish.name;
-        const auto leases = m_host.Text(kLeaseFolder + prefix + name + ".leases").value_or("");
+        const auto leases = m_host.Text(kDhclientFolder + prefix + name + ".leases").value_or("");
         const auto state = ParseDhclientLeases(leases, name);
         const auto* const link = m_host.live.Find(name);
         // The one that was started last ran with these words, and ifupdown always uses the same.
@@ -150,7 +135,7 @@ private:
 
     static void Append(const std::string& value, std::vector<std::string>& list)
     {
-        for (const std::string& word : WordsOf(value)) {
+        for (const std::string& word : vornhost::Words(value)) {
             if (std::find(list.begin(), list.end(), word) == list.end()) {
                 list.push_back(word);
             }
@@ -165,7 +150,7 @@ private:
         if (name == "mtu") {
             m_wish.mtu = vornhost::ToNumber(value, 68, 65535);
         } else if (name == "hwaddress") {
-            const std::vector<std::string> words = WordsOf(value);
+            const std::vector<std::string> words = vornhost::Words(value);
             m_wish.mac = words.empty() ? "" : vornhost::Lower(words.back());
         } else if (name == "link-speed" || name == "link-duplex") {
             ethtool(name.substr(5) + ' ' + value);
@@ -204,7 +189,7 @@ private:
             "broadcast",    "network",      "accept_ra",   "autoconf",
             "dad-attempts", "dad-interval", "ll-attempts", "ll-interval",
             "ip-forward",   "leasetime",    "leasehours",  "pre-up-delay"};
-        return Contains(kNames, name);
+        return vornhost::Contains(kNames, name);
     }
 
     void FinishAddress()

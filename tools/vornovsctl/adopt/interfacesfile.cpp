@@ -4,6 +4,7 @@
 #include <array>
 #include <sstream>
 #include <string_view>
+#include <support/interfacevalues.h>
 
 namespace vornovsctl {
 
@@ -12,16 +13,6 @@ namespace {
 constexpr std::string_view kAside = "#adopted# ";     // a line that comes back as it was
 constexpr std::string_view kReplaced = "#replaced# "; // one after which its replacement stands
 constexpr int kDeepestInclusion = 16;
-
-std::vector<std::string> WordsOf(const std::string& text)
-{
-    std::istringstream stream(text);
-    std::vector<std::string> words;
-    for (std::string word; stream >> word;) {
-        words.push_back(word);
-    }
-    return words;
-}
 
 /** A line with those that continue it. */
 struct LogicalLine {
@@ -41,7 +32,7 @@ std::string Stripped(std::string_view text)
     return std::string(text.substr(first, text.find_last_not_of(kBlanks) - first + 1));
 }
 
-std::vector<LogicalLine> LinesOf(const std::string& text)
+std::vector<LogicalLine> LogicalLinesOf(const std::string& text)
 {
     std::vector<LogicalLine> lines;
     bool continues = false;
@@ -106,7 +97,7 @@ private:
         }
         m_config.paths.push_back(path);
         m_inInterface = false;
-        for (const LogicalLine& line : LinesOf(m_readText(path))) {
+        for (const LogicalLine& line : LogicalLinesOf(m_readText(path))) {
             if (!line.IsEmpty()) {
                 ReadLine(path, line.text, depth);
             }
@@ -115,7 +106,7 @@ private:
 
     void ReadLine(const std::string& path, const std::string& text, int depth)
     {
-        std::vector<std::string> words = WordsOf(text);
+        std::vector<std::string> words = vornhost::Words(text);
         const std::string keyword = words.front();
         if (!IsKeyword(keyword)) {
             if (m_inInterface) {
@@ -223,7 +214,7 @@ std::string EachLineAside(const std::string& raw)
 /** The line that names interfaces, without some of them. */
 std::string NamesWithout(const LogicalLine& line, const std::set<std::string>& names)
 {
-    std::vector<std::string> words = WordsOf(line.text);
+    std::vector<std::string> words = vornhost::Words(line.text);
     const std::size_t before = words.size();
     std::erase_if(words, [&](const std::string& word) {
         return names.contains(word.substr(0, word.find('=')));
@@ -273,12 +264,12 @@ std::string WithoutInterfaces(const std::string& text, const std::set<std::strin
 {
     std::string result;
     bool aside = false;
-    for (const LogicalLine& line : LinesOf(text)) {
+    for (const LogicalLine& line : LogicalLinesOf(text)) {
         if (line.IsEmpty()) {
             result += line.raw;
             continue;
         }
-        const std::vector<std::string> words = WordsOf(line.text);
+        const std::vector<std::string> words = vornhost::Words(line.text);
         if (IsKeyword(words[0])) {
             aside = words[0] == "iface" && words.size() > 1 && names.contains(words[1]);
         }

@@ -6,6 +6,7 @@
 #include <array>
 #include <ctime>
 #include <sstream>
+#include <support/interfacevalues.h>
 
 namespace vornovsctl {
 
@@ -14,7 +15,7 @@ namespace {
 constexpr char kRunFolder[] = "/run/systemd/netif/";
 
 /** The lines "KEY=value" of its state files. */
-std::map<std::string, std::string> ValuesOf(const std::string& text)
+std::map<std::string, std::string> StateValues(const std::string& text)
 {
     std::map<std::string, std::string> values;
     std::istringstream stream(text);
@@ -34,16 +35,6 @@ std::string WithColons(const std::string& digits)
         text += (text.empty() ? "" : ":") + digits.substr(index, 2);
     }
     return text;
-}
-
-std::vector<std::string> WordsOf(const std::string& text)
-{
-    std::istringstream stream(text);
-    std::vector<std::string> words;
-    for (std::string word; stream >> word;) {
-        words.push_back(word);
-    }
-    return words;
 }
 
 std::string FileName(const std::string& path)
@@ -74,7 +65,7 @@ void ReadLease(const HostView& host, const std::string& index, Wish& wish)
     if (!text) {
         return;
     }
-    const auto values = ValuesOf(*text);
+    const auto values = StateValues(*text);
     const auto get = [&](const char* key) {
         const auto value = values.find(key);
         return value == values.end() ? std::string() : value->second;
@@ -83,8 +74,8 @@ void ReadLease(const HostView& host, const std::string& index, Wish& wish)
     lease.address = get("ADDRESS");
     lease.netmask = get("NETMASK");
     lease.server = get("SERVER_ADDRESS");
-    lease.routers = WordsOf(get("ROUTER"));
-    lease.dns = WordsOf(get("DNS"));
+    lease.routers = vornhost::Words(get("ROUTER"));
+    lease.dns = vornhost::Words(get("DNS"));
     lease.domain = get("DOMAINNAME");
     lease.seconds = static_cast<std::uint32_t>(std::strtoul(get("LIFETIME").c_str(), nullptr, 10));
     wish.lease = lease;
@@ -108,7 +99,7 @@ void ReadState(const HostView& host, Wish& wish)
     if (wish.dhcp4) {
         ReadLease(host, index, wish);
     }
-    const auto values = ValuesOf(host.Text(kRunFolder + ("links/" + index)).value_or(""));
+    const auto values = StateValues(host.Text(kRunFolder + ("links/" + index)).value_or(""));
     if (const auto duid = values.find("DHCP6_CLIENT_DUID"); duid != values.end()) {
         wish.identity.duid = DuidOf(duid->second);
     }

@@ -16,16 +16,6 @@ namespace {
 using Take = std::function<bool(const std::string& value, Wish& wish)>;
 using Takes = std::map<std::string, Take>;
 
-std::vector<std::string> WordsOf(const std::string& text)
-{
-    std::istringstream stream(text);
-    std::vector<std::string> words;
-    for (std::string word; stream >> word;) {
-        words.push_back(word);
-    }
-    return words;
-}
-
 std::optional<bool> YesOrNo(const std::string& value)
 {
     const std::string word = vornhost::Lower(value);
@@ -104,7 +94,7 @@ bool TakeDns(const std::string& value, Wish& wish)
     if (value.empty()) {
         wish.dns.clear();
     }
-    for (std::string server : WordsOf(value)) {
+    for (std::string server : vornhost::Words(value)) {
         server.resize(std::min(server.find_first_of("#%"), server.size()));
         wish.dns.push_back(server);
     }
@@ -116,7 +106,7 @@ bool TakeDomains(const std::string& value, Wish& wish)
     if (value.empty()) {
         wish.search.clear();
     }
-    for (const std::string& domain : WordsOf(value)) {
+    for (const std::string& domain : vornhost::Words(value)) {
         if (domain.starts_with('~')) {
             wish.remarks.push_back("the routing domain " + Quoted(domain) +
                                    " of its resolver has no like and is left out");

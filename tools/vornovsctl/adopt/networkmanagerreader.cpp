@@ -17,7 +17,7 @@ using Values = std::map<std::string, std::string>;
 constexpr unsigned kDefaultEthernetMetric = 100;
 
 /** Lines "key:value"; a key may be numbered, "DHCP4.OPTION[2]". */
-Values ValuesOf(const std::string& text)
+Values ProfileValues(const std::string& text)
 {
     Values values;
     std::istringstream stream(text);
@@ -47,7 +47,7 @@ std::vector<std::string> FieldsOf(const std::string& line)
 }
 
 /** "a, b" or "a; b" or "a,b". */
-std::vector<std::string> ListOf(std::string text)
+std::vector<std::string> ProfileList(std::string text)
 {
     std::replace(text.begin(), text.end(), ';', ',');
     std::istringstream stream(text);
@@ -142,20 +142,20 @@ private:
     {
         const std::string family = ipv6 ? "ipv6." : "ipv4.";
         ReadMethod(ipv6);
-        for (const std::string& address : ListOf(Get(family + "addresses"))) {
+        for (const std::string& address : ProfileList(Get(family + "addresses"))) {
             (ipv6 ? m_wish.addresses6 : m_wish.addresses4).push_back(address);
         }
         (ipv6 ? m_wish.gateway6 : m_wish.gateway4) = Get(family + "gateway");
         if (const auto metric = vornhost::ToNumber(Get(family + "route-metric"), 0, UINT32_MAX)) {
             (ipv6 ? m_wish.metric6 : m_wish.metric4) = metric;
         }
-        for (const std::string& server : ListOf(Get(family + "dns"))) {
+        for (const std::string& server : ProfileList(Get(family + "dns"))) {
             m_wish.dns.push_back(server);
         }
-        for (const std::string& domain : ListOf(Get(family + "dns-search"))) {
+        for (const std::string& domain : ProfileList(Get(family + "dns-search"))) {
             m_wish.search.push_back(domain);
         }
-        for (const std::string& route : ListOf(Get(family + "routes"))) {
+        for (const std::string& route : ProfileList(Get(family + "routes"))) {
             ReadRoute(family + "routes", route);
         }
         ReadPolicy(family, ipv6);
@@ -276,7 +276,7 @@ void ReadOptions(const HostView& host, Wish& wish)
     const auto text =
         host.run({"nmcli", "-t", "-f", "DHCP4.OPTION,DHCP6.OPTION", "device", "show", wish.name});
     Values options;
-    for (const auto& [key, value] : ValuesOf(text.value_or(""))) {
+    for (const auto& [key, value] : ProfileValues(text.value_or(""))) {
         const std::size_t sign = value.find(" = ");
         if (sign != std::string::npos) {
             options[key.substr(0, 5) + '.' + value.substr(0, sign)] = value.substr(sign + 3);
@@ -348,7 +348,7 @@ Wish ReadNetworkManager(const HostView& host, const std::string& name, const std
         wish.obstacles.push_back("NetworkManager does not tell of its profile " + uuid);
         return wish;
     }
-    ProfileReader(ValuesOf(*text), wish).Read();
+    ProfileReader(ProfileValues(*text), wish).Read();
     // It gives default routes a metric even where nobody asks for one.
     if (!wish.metric4 && (wish.dhcp4 || !wish.gateway4.empty())) {
         wish.metric4 = kDefaultEthernetMetric;

@@ -2,6 +2,7 @@
 
 #include "adopt/ifupdownreader.h"
 #include "adopt/inifile.h"
+#include "hands.h"
 
 #include <algorithm>
 #include <array>
@@ -16,7 +17,6 @@ constexpr char kNetworkFolder[] = "/etc/systemd/network/";
 constexpr char kNetdevDropIn[] = "/etc/systemd/network/%.d/00-vornovs.conf";
 // Read last, so that it can add to what others say.
 constexpr char kKeyfilePath[] = "/etc/NetworkManager/conf.d/zz-vornovs.conf";
-constexpr unsigned kReadable = 0644;
 
 // Otherwise it may write what was commented out anew.
 constexpr char kCloudPath[] = "/etc/cloud/cloud.cfg.d/99-vornovs-network.cfg";
@@ -121,7 +121,7 @@ void Settle(const SilencingFile& file, const std::set<std::string>& names, Hands
             hands.RemoveEmptyFolder(FolderOf(file.path));
         }
     } else if (!now || now->text != *wanted) {
-        hands.Write(file.path, *wanted, file.before ? file.before->mode : kReadable);
+        hands.Write(file.path, *wanted, file.before ? file.before->mode : kReadableMode);
     }
 }
 

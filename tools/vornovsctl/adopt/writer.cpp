@@ -1,6 +1,7 @@
 #include "adopt/writer.h"
 
 #include <support/interfacefile.h>
+#include <support/interfacevalues.h>
 #include <support/keyvaluefile.h>
 
 namespace vornovsctl {
@@ -60,15 +61,6 @@ private:
         }
     }
 
-    static std::string Joined(const std::vector<std::string>& words)
-    {
-        std::string text;
-        for (const std::string& word : words) {
-            text += (text.empty() ? "" : " ") + word;
-        }
-        return text;
-    }
-
     void WriteKind()
     {
         if (m_wish.kind == WishKind::kBond) {
@@ -122,7 +114,7 @@ private:
             Set("IPV6INIT", "yes");
             Set("IPV6ADDR", m_wish.addresses6.front());
             SetQuoted("IPV6ADDR_SECONDARIES",
-                      Joined({m_wish.addresses6.begin() + 1, m_wish.addresses6.end()}));
+                      vornhost::Joined({m_wish.addresses6.begin() + 1, m_wish.addresses6.end()}));
         }
         SetIf("IPV6_DEFAULTGW", m_wish.gateway6);
         // The kernel's own default needs no word, but a client would choose another one.
@@ -157,7 +149,7 @@ private:
         for (const std::string& server : m_wish.dns) {
             Set("DNS" + std::to_string(++count), server);
         }
-        SetQuoted("DOMAIN", Joined(m_wish.search));
+        SetQuoted("DOMAIN", vornhost::Joined(m_wish.search));
     }
 
     void WriteRoutes()

@@ -43,7 +43,7 @@ std::string Id(const char* sort, const std::string& name)
     return '"' + Escaped(std::string(sort) + ' ' + name) + '"';
 }
 
-std::string Words(std::initializer_list<std::string> words)
+std::string InOneLine(std::initializer_list<std::string> words)
 {
     std::string text;
     for (const std::string& word : words) {
@@ -97,9 +97,10 @@ private:
 
     static std::vector<std::string> LinesOf(const Device& device)
     {
-        std::vector<std::string> lines{Words({LinkWord(device), SpeedWord(device)}), device.mac};
+        std::vector<std::string> lines{InOneLine({LinkWord(device), SpeedWord(device)}),
+                                       device.mac};
         if (device.bond) {
-            lines.push_back(Words({device.bond->mode, LacpWords(*device.bond)}));
+            lines.push_back(InOneLine({device.bond->mode, LacpWords(*device.bond)}));
         }
         lines.insert(lines.end(), device.addresses.begin(), device.addresses.end());
         for (const DefaultRoute& route : device.routes) {
@@ -172,7 +173,7 @@ private:
             return;
         }
         const std::string id = Id("bond", port.name);
-        AddNode(id, Label({"bond " + port.name, Words({port.mode, LacpWords(port)})}));
+        AddNode(id, Label({"bond " + port.name, InOneLine({port.mode, LacpWords(port)})}));
         AddEdge(bridge, id, edge);
         for (const Member& member : port.members) {
             AddMember(id, port, member, member.name == port.active ? "active" : "");

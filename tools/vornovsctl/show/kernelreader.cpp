@@ -28,7 +28,7 @@ std::optional<int> ReadSpeed(const std::string& folder)
     return file >> speed && speed > 0 ? std::optional<int>(speed) : std::nullopt;
 }
 
-std::optional<LinuxBond> ReadBond(const std::string& folder)
+std::optional<LinuxBond> ReadLinuxBond(const std::string& folder)
 {
     LinuxBond bond;
     bond.mode = FirstWord(folder + "/mode");
@@ -112,7 +112,7 @@ std::vector<DefaultRoute> RoutesOf(int index, const std::vector<vornhost::Route>
 
 DeviceFacts ReadDeviceFacts(const std::string& folder)
 {
-    return {ReadSpeed(folder), ReadBond(folder + "/bonding")};
+    return {ReadSpeed(folder), ReadLinuxBond(folder + "/bonding")};
 }
 
 KernelAnswer AskKernel()

@@ -15,7 +15,7 @@ constexpr unsigned kWholeAddress4 = 32;
 constexpr unsigned kWholeAddress6 = 128;
 constexpr unsigned kHalfAddress6 = 64;
 constexpr std::uint32_t kEver = UINT32_MAX;
-constexpr std::uint32_t kKernelMetric6 = 256;
+constexpr std::uint32_t kKernelPrefixMetric = 256;
 
 bool Has(const vornhost::Address& address, std::uint32_t flag)
 {
@@ -87,7 +87,7 @@ vornhost::Route KernelRouteOf(const vornhost::Address& address)
     route.prefixLength = address.prefixLength;
     route.source = address.family == AF_INET ? address.local : "";
     route.priority =
-        address.family == AF_INET6 && address.metric == 0 ? kKernelMetric6 : address.metric;
+        address.family == AF_INET6 && address.metric == 0 ? kKernelPrefixMetric : address.metric;
     route.nextHops.push_back({address.index, "", 0, 1, false});
     return route;
 }

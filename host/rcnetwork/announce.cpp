@@ -11,6 +11,7 @@
 #include <linux/if_packet.h>
 #include <net/ethernet.h>
 #include <net/if.h>
+#include <netinet/icmp6.h>
 #include <sys/ioctl.h>
 #include <sys/socket.h>
 
@@ -56,6 +57,28 @@ bool Announce(const std::string& interface)
     std::fill_n(everybody.sll_addr, ETH_ALEN, 0xff);
     return sendto(link.Get(), &frame, sizeof frame, 0, reinterpret_cast<sockaddr*>(&everybody),
                   sizeof everybody) == static_cast<ssize_t>(sizeof frame);
+}
+
+bool SolicitRouters(const std::string& interface)
+{
+    // One of any hop limit but the greatest comes from another segment.
+    constexpr int kMostHops = 255;
+    const Descriptor link(socket(AF_INET6, SOCK_RAW | SOCK_CLOEXEC, IPPROTO_ICMPV6));
+    const int index = static_cast<int>(if_nametoindex(interface.c_str()));
+    if (!link || index == 0 ||
+        setsockopt(link.Get(), IPPROTO_IPV6, IPV6_MULTICAST_IF, &index, sizeof index) != 0 ||
+        setsockopt(link.Get(), IPPROTO_IPV6, IPV6_MULTICAST_HOPS, &kMostHops, sizeof kMostHops) !=
+            0) {
+        return false;
+    }
+    nd_router_solicit message{};
+    message.nd_rs_type = ND_ROUTER_SOLICIT;
+    sockaddr_in6 routers{};
+    routers.sin6_family = AF_INET6;
+    routers.sin6_scope_id = static_cast<std::uint32_t>(index);
+    (void)inet_pton(AF_INET6, "ff02::2", &routers.sin6_addr);
+    return sendto(link.Get(), &message, sizeof message, 0, reinterpret_cast<sockaddr*>(&routers),
+                  sizeof routers) == static_cast<ssize_t>(sizeof message);
 }
 
 } // namespace vornhost

@@ -87,10 +87,12 @@ host_has_routes()
     [ "$(ways_out | wc -l)" -ge "$(wc -l <"$lab_out/managed-routes")" ]
 }
 
-# The name servers and search domains of the host, whoever wrote them.
+# The name servers and search domains of the host, whoever wrote them; a domain is a search list of
+# one.
 resolver_settings()
 {
-    { grep -E '^(nameserver|search|domain) ' /etc/resolv.conf || true; } | sed 's/ *$//' | sort
+    { grep -E '^(nameserver|search|domain) ' /etc/resolv.conf || true; } |
+        sed -e 's/ *$//' -e 's/^domain /search /' | sort -u
 }
 
 # Who the servers take the host for. ifupdown's client of IPv6 does not say the host's name; ours

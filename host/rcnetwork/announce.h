@@ -9,8 +9,9 @@
 namespace vornhost {
 
 /**
- * Sends one frame from the interface to everybody on its segment: switches learn from its sender
- * where to send what is for it, whatever protocol its traffic is of.
+ * Sends frames from the interface to everybody on its segment: switches learn from their sender
+ * where to send what is for it, whatever protocol its traffic is of, and neighbours learn the link
+ * address of each address in use, which may be another one than before.
  * @return  false when that was not possible; errno says why.
  */
 bool Announce(const std::string& interface);

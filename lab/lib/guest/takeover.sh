@@ -238,6 +238,10 @@ expect_given_back()
     for folder in "$1" "managed-$1"; do
         routes_when "$1" <"$lab_out/snapshots/$folder/routes" >"$lab_out/routes"
         cp "$lab_out/routes" "$lab_out/snapshots/$folder/routes"
+        if [ "$1" = released ]; then
+            # A port whose IPv6 was on in between can count its VLAN twice as one who listens.
+            sed -i 's/ users [0-9]*$//' "$lab_out/snapshots/$folder/groups"
+        fi
     done
     expect_unchanged "managed-$1" "$1"
     packages_units >"$lab_out/got-units"

@@ -52,6 +52,7 @@ struct Steps {
     std::vector<std::string> join;
     BatchParts move; ///< Follows the ports.
     std::vector<std::string> announce;
+    std::vector<std::string> hearRouters;
     std::vector<std::string> removeBridges;
     BatchParts tidy; ///< What no traffic waits for.
     std::vector<std::string> readyAfter;

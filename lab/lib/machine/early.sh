@@ -8,7 +8,7 @@ mkdir -p /run/lock /lab/out
 
 # shellcheck source=../guest/main.sh
 . /lab/main.sh
-modprobe -a virtio_net veth bridge bonding 8021q
+modprobe -a virtio_pci virtio_net veth bridge bonding 8021q
 hostname debian
 ip link set lo up
 # The clock goes on where it was when the machine was shut down.

@@ -8,7 +8,7 @@ host_files()
 {
     find / -xdev \( -path /lab -o -path /var/log -o -path /var/cache -o -path /var/lib/dpkg \
         -o -path /var/lib/apt -o -path /var/lib/systemd -o -path /var/backups -o -path /root \
-        -o -path /tmp -o -path /var/tmp \) -prune -o -printf '%M %u:%g %y %p %l\n' |
+        -o -path /tmp -o -path /var/tmp -o -name __pycache__ \) -prune -o -printf '%M %u:%g %y %p %l\n' |
         grep -v -e ' /etc/ld.so.cache' -e ' /etc/apt/sources.list.d/vornovs.list' \
             -e ' /etc/openvswitch' -e ' /var/lib/openvswitch' -e ' /etc/\.resolv' | sort
 }
@@ -108,6 +108,7 @@ phase_start()
 
 install_as_readme_says()
 {
+    host_files >"$lab_out/files-fresh"
     expect_equal "README's first command" scripts/package "$(readme_commands | head -n 1)"
     snapshot_network before
     resolver_settings >"$lab_out/resolver-before"
@@ -118,14 +119,23 @@ install_as_readme_says()
     expect_same_text "the name servers" "$lab_out/resolver-before" "$lab_out/resolver-installed"
     expect_no_unit_of_ours
     expect_equal "interfaces' files" "" "$(ls -A /etc/sysconfig/network-scripts)"
-    # What the host is to be again when ours are purged: what Debian's packages, which came along,
-    # have brought, and nothing else.
-    dpkg-query -L libvornovs1 vornovs-host vornovs-tools | sort -u >"$lab_out/files-ours"
-    host_files | awk -v ours="$lab_out/files-ours" \
-        'BEGIN { while ((getline name < ours) > 0) is[name] = 1 } !($4 in is)' \
-        >"$lab_out/files-before"
+    remember_files_of_others
     host_units | grep -v ' vornovs' >"$lab_out/units-before"
     remember_managed
+}
+
+# What the host is to be again when ours are purged: what was there, and what Debian's packages, which
+# came along, have brought.
+remember_files_of_others()
+{
+    dpkg-query -L libvornovs1 vornovs-host vornovs-tools >"$lab_out/files-ours"
+    host_files | awk -v ours="$lab_out/files-ours" -v fresh="$lab_out/files-fresh" '
+        BEGIN {
+            while ((getline name < ours) > 0) is_ours[name] = 1
+            while ((getline < fresh) > 0) was_there[$4] = 1
+        }
+        (!($4 in is_ours) || $4 in was_there) && $4 !~ "^/etc/rc.[.]d/.*vornovs"' \
+        >"$lab_out/files-before"
 }
 
 adopt_as_readme_says()

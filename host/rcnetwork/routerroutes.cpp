@@ -11,8 +11,6 @@ namespace vornhost {
 namespace {
 
 constexpr std::uint32_t kUsualMetric = 1024;
-constexpr char kRouterMetric[] = "ipv6.conf.ra_defrtr_metric";
-constexpr char kHearsRouters[] = "ipv6.conf.accept_ra";
 
 std::string SettingOf(const LiveState& live, const std::string& interface, const char* setting)
 {
@@ -65,7 +63,7 @@ bool RoutePlanner::IsOfRouter(const Unit& unit, const Route& route) const
            unit.file != nullptr && unit.addWanted && unit.file->ipv6 &&
            unit.file->autoconf != false && !unit.file->ClientHearsRouters() &&
            SettingOf(m_inputs.live, m_inputs.live.NameOf(route.nextHops.front().index),
-                     kHearsRouters) != "0";
+                     kAcceptRouters) != "0";
 }
 
 /**

@@ -17,7 +17,7 @@ namespace vornhost {
 namespace {
 
 // A router answers within half a second, and not more often than every three to everybody.
-constexpr std::chrono::seconds kPatience{4};
+constexpr std::chrono::seconds kRouterPatience{4};
 constexpr std::chrono::seconds kBetweenQuestions{1};
 constexpr std::chrono::milliseconds kBetweenGlances{20};
 
@@ -49,7 +49,7 @@ std::vector<RouterRoute> HearRouters(std::vector<RouterRoute> routes)
     const auto begin = std::chrono::steady_clock::now();
     auto question = begin;
     std::vector<Route> live;
-    for (auto now = begin; now < begin + kPatience; now = std::chrono::steady_clock::now()) {
+    for (auto now = begin; now < begin + kRouterPatience; now = std::chrono::steady_clock::now()) {
         live = ReadRoutes().value_or(std::vector<Route>());
         if (std::all_of(routes.begin(), routes.end(),
                         [&](const RouterRoute& route) { return IsMade(route, live); })) {

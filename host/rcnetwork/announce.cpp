@@ -164,4 +164,24 @@ bool Announce(const std::string& interface)
     return told;
 }
 
+bool SolicitRouters(const std::string& interface)
+{
+    const Descriptor link(socket(AF_INET6, SOCK_RAW | SOCK_CLOEXEC, IPPROTO_ICMPV6));
+    const int index = static_cast<int>(if_nametoindex(interface.c_str()));
+    if (!link || index == 0 ||
+        setsockopt(link.Get(), IPPROTO_IPV6, IPV6_MULTICAST_IF, &index, sizeof index) != 0 ||
+        setsockopt(link.Get(), IPPROTO_IPV6, IPV6_MULTICAST_HOPS, &kHopsOfNeighbours,
+                   sizeof kHopsOfNeighbours) != 0) {
+        return false;
+    }
+    nd_router_solicit message{};
+    message.nd_rs_type = ND_ROUTER_SOLICIT;
+    sockaddr_in6 routers{};
+    routers.sin6_family = AF_INET6;
+    routers.sin6_scope_id = static_cast<std::uint32_t>(index);
+    (void)inet_pton(AF_INET6, "ff02::2", &routers.sin6_addr);
+    return sendto(link.Get(), &message, sizeof message, 0, reinterpret_cast<sockaddr*>(&routers),
+                  sizeof routers) == static_cast<ssize_t>(sizeof message);
+}
+
 } // namespace vornhost

@@ -1,5 +1,5 @@
 /**
- * Tells the network outside where a link address and those above it are to be found from now on.
+ * What an interface says to the network outside once it stands there.
  */
 #ifndef VORNHOST_RCNETWORK_ANNOUNCE_H
 #define VORNHOST_RCNETWORK_ANNOUNCE_H
@@ -15,6 +15,12 @@ namespace vornhost {
  * @return  false when that was not possible; errno says why.
  */
 bool Announce(const std::string& interface);
+
+/**
+ * Asks the routers on the interface's segment to tell of themselves at once.
+ * @return  as above.
+ */
+bool SolicitRouters(const std::string& interface);
 
 } // namespace vornhost
 

@@ -4,6 +4,7 @@
 #include "clientcontrol.h"
 #include "inputs.h"
 #include "readiness.h"
+#include "routers.h"
 
 #include "support/process.h"
 #include "support/service.h"
@@ -89,6 +90,7 @@ private:
     bool WaitForBridges(const Stage& stage);
     bool WriteSettings(const Stage& stage);
     void AnnounceAll(const Stage& stage);
+    void HearAll(const Stage& stage);
     void SetCards(const Stage& stage);
     void TellResolver(const Stage& stage);
     bool ManageClients(const Stage& stage);
@@ -231,6 +233,23 @@ void Applier::AnnounceAll(const Stage& stage)
     }
 }
 
+/** One that is not heard yet leaves what stands in for its route until that runs out. */
+void Applier::HearAll(const Stage& stage)
+{
+    std::vector<RouterRoute> routes;
+    for (const std::string& line : stage.lines) {
+        const auto words = Words(line);
+        routes.push_back(
+            {words.at(0), static_cast<std::uint32_t>(std::stoul(words.at(1))), words.at(2)});
+    }
+    for (const RouterRoute& route : HearRouters(routes)) {
+        ProcessResult result;
+        (void)Program({kIpTool, "-6", "route", "del", "default", "via", route.gateway, "dev",
+                       route.interface, "metric", std::to_string(route.metric + 1)},
+                      kToolDeadline, "", result);
+    }
+}
+
 /** What a card refuses is said and passed over: the host is reachable without it. */
 void Applier::SetCards(const Stage& stage)
 {
@@ -330,6 +349,9 @@ bool Applier::Run(const Stage& stage)
         return RunBatch(stage);
     case StageKind::kAnnounce:
         AnnounceAll(stage);
+        return true;
+    case StageKind::kRouters:
+        HearAll(stage);
         return true;
     case StageKind::kCards:
         SetCards(stage);

@@ -59,9 +59,6 @@ void AddHostName(const FileClient& client, ClientOptions& options)
     } else if (!client.hostName->empty()) {
         options.push_back("hostname " + *client.hostName);
     }
-    if (!client.hostName6) {
-        options.emplace_back("fqdn disable"); // which is how it is told to servers of IPv6 only
-    }
 }
 
 void AddIdentity(const FileClient& client, const ClientPlace& place, ClientOptions& options)

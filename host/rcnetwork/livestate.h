@@ -13,6 +13,13 @@
 
 namespace vornhost {
 
+// Settings of an interface, by their names in LiveState.
+constexpr char kAddressMode[] = "ipv6.conf.addr_gen_mode";
+constexpr char kAddressModeNone[] = "1";
+constexpr char kAcceptRouters[] = "ipv6.conf.accept_ra";
+constexpr char kDisableIpv6[] = "ipv6.conf.disable_ipv6";
+constexpr char kRouterMetric[] = "ipv6.conf.ra_defrtr_metric";
+
 /** Settings of one interface by name: "ipv4.conf.rp_filter", "ipv6.neigh.retrans_time_ms"... */
 using Settings = std::map<std::string, std::string>;
 

@@ -19,7 +19,7 @@ namespace {
 
 using Clock = std::chrono::steady_clock;
 
-constexpr std::chrono::seconds kPatience{15};
+constexpr std::chrono::seconds kOnlinePatience{15};
 constexpr std::chrono::milliseconds kBetweenAnswers{250};
 constexpr std::uint32_t kNotYet = IFA_F_TENTATIVE | IFA_F_DADFAILED;
 
@@ -172,7 +172,7 @@ bool WaitUntilOnline()
             online = LookWhatAnswers(*files, *live);
         }
         const auto waited = Clock::now() - begin;
-        const bool done = files && live && IsEnough(online, waited < kPatience);
+        const bool done = files && live && IsEnough(online, waited < kOnlinePatience);
         if (done || waited >= limit) {
             for (const NotOnline& missing : online.missing) {
                 Say({done ? Severity::kWarning : Severity::kError,

@@ -94,6 +94,7 @@ void AddStages(const Steps& steps, Plan& plan)
     AddStage(plan, StageKind::kBatch, "put in order", steps.order.Lines());
     AddStage(plan, StageKind::kSettings, "settings after", steps.settingsAfter);
     AddStage(plan, StageKind::kBatch, "finish", steps.finish.Lines());
+    AddStage(plan, StageKind::kRouters, "hear routers", Once(steps.hearRouters));
     AddStage(plan, StageKind::kResolver, "resolver", steps.resolver);
     AddStage(plan, StageKind::kReady, "wait for partners", steps.negotiate);
     AddStage(plan, StageKind::kClients, "start clients", steps.startClients);

@@ -72,6 +72,7 @@ enum class StageKind {
     kSettings, ///< "INTERFACE SETTING VALUE"
     kBatch,    ///< Lines of one "ip -batch".
     kAnnounce, ///< "INTERFACE" whose place the network outside is told.
+    kRouters,  ///< "INTERFACE METRIC GATEWAY" of a route that is the kernel's to make again.
     kCards,    ///< "INTERFACE OPTION SETTING...", of ethtool.
     kResolver, ///< "tell NAME server ADDRESS... domain DOMAIN..." or "forget NAME".
     kClients,  ///< "end NAME", "drop NAME" or "start NAME of NAME,NAME: OPTION; OPTION".

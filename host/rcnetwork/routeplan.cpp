@@ -173,21 +173,6 @@ bool RoutePlanner::IsRecorded(const Unit& unit, const Route& route) const
     return has(unit.name) || std::any_of(unit.absorbed.begin(), unit.absorbed.end(), has);
 }
 
-/** Where it does not, routes to routers are the kernel's or of somebody before us. */
-bool RoutePlanner::ClientHeardRouters(const Unit& unit) const
-{
-    for (const std::string& name : {unit.carrier, unit.name, unit.bridge}) {
-        const auto client = m_inputs.clients.find(name);
-        if (client != m_inputs.clients.end()) {
-            const ClientOptions& options = client->second.options;
-            return std::none_of(options.begin(), options.end(), [](const std::string& option) {
-                return option == kOnlyIPv4 || option == "noipv6rs";
-            });
-        }
-    }
-    return true;
-}
-
 /** Whether a client of this unit made the route that is not to run any more. */
 bool RoutePlanner::IsLeftByClient(const Unit& unit, const Route& route) const
 {
@@ -292,6 +277,10 @@ void RoutePlanner::CarryRoute(const Unit& unit, const Route& route)
         RemoveRoute(route);
         return;
     }
+    if (IsOfRouter(unit, route)) {
+        CarryRouterRoute(unit, route);
+        return;
+    }
     // A replacement never leaves a moment without the route, but takes the first one of its slot.
     const bool alone = IsAlone(route);
     Put(PartsOf(unit), route,
@@ -327,6 +316,7 @@ void RoutePlanner::PlanLiveRoute(const Route& route)
     } else if (source != nullptr) {
         CarryRoute(*source, route);
     } else {
+        TidyRouterRoute(*unit, route);
         RestoreRoute(route);
     }
 }

@@ -38,6 +38,10 @@ private:
     BatchParts& PartsOf(const Unit& unit) const;
     void PlanLiveRoute(const Route& route);
     void CarryRoute(const Unit& unit, const Route& route);
+    std::uint32_t RouterMetric(const Unit& unit, const Route& route) const;
+    bool IsOfRouter(const Unit& unit, const Route& route) const;
+    void CarryRouterRoute(const Unit& unit, const Route& route);
+    void TidyRouterRoute(const Unit& unit, const Route& route);
     void RemoveRoute(const Route& route);
     void RestoreRoute(const Route& route);
     bool IsFlushed(const Route& route) const;

@@ -9,7 +9,6 @@ namespace vornhost {
 namespace {
 
 constexpr char kAutoconf[] = "ipv6.conf.autoconf";
-constexpr char kRouterMetric[] = "ipv6.conf.ra_defrtr_metric";
 constexpr char kTemporary[] = "ipv6.conf.use_tempaddr";
 constexpr unsigned kLinkLocalLength = 64;
 

@@ -13,11 +13,6 @@
 
 namespace vornhost {
 
-constexpr char kAddressMode[] = "ipv6.conf.addr_gen_mode";
-constexpr char kAddressModeNone[] = "1";
-constexpr char kAcceptRouters[] = "ipv6.conf.accept_ra";
-constexpr char kDisableIpv6[] = "ipv6.conf.disable_ipv6";
-
 /** One "ip -batch", in the order in which its parts run. */
 struct BatchParts {
     std::vector<std::string> links;
@@ -52,6 +47,7 @@ struct Steps {
     std::vector<std::string> join;
     BatchParts move; ///< Follows the ports.
     std::vector<std::string> announce;
+    std::vector<std::string> hearRouters;
     std::vector<std::string> removeBridges;
     BatchParts tidy; ///< What no traffic waits for.
     std::vector<std::string> readyAfter;

@@ -197,11 +197,6 @@ void InterfaceParser::ReadClientIdentity()
     } else if (!hostName.empty()) {
         Refuse("DHCP_HOSTNAME", "not the name of a host");
     }
-    if (const std::string name = Value("DHCPV6_HOSTNAME"); Lower(name) == "none") {
-        client.hostName6 = false;
-    } else if (!name.empty()) {
-        Refuse("DHCPV6_HOSTNAME", "not none");
-    }
     client.duid = Hex("DHCPV6_DUID", 3, kMostDuidBytes);
     if (std::string iaid = Hex("DHCP_IAID", 4, 4); !iaid.empty()) {
         std::erase(iaid, ':');

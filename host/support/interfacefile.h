@@ -45,7 +45,6 @@ struct FileClient {
     std::optional<bool> dhcp6;           ///< IPv6 addresses from a server; nothing: as routers say.
     std::optional<std::string> id;       ///< Hex with colons; empty: none is sent.
     std::optional<std::string> hostName; ///< Empty: none is sent; nothing: the host's.
-    bool hostName6 = true;               ///< Whether a server of IPv6 is told it, too.
     std::string duid;                    ///< Hex with colons; empty: the one that the host keeps.
     std::optional<std::uint32_t> iaid;
     bool nameServers = true;  ///< Whether servers and routers say who resolves names...

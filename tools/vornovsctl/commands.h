@@ -28,6 +28,7 @@ Answer Unregister(const Context& context);
 Answer Status(const Context& context);
 Answer Reset(const Context& context);
 Answer Show(const Context& context);
+Answer Check(const Context& context);
 Answer Adopt(const Context& context);
 Answer Release(const Context& context);
 

@@ -74,6 +74,7 @@ const std::vector<CommandRow> kCommands{
      Unregister},
     {"", "status", kAboutStatus, kStatusMore, {}, kNone, kReads, kForRoot, Status},
     {"", "show", kAboutShow, kShowMore, {}, kFormat, kReads, kForAnyone, Show},
+    {"", "check", kAboutCheck, kCheckMore, {}, kNone, kReads, kForRoot, Check},
     {"", "adopt", kAboutAdopt, kAdoptMore, {kTakenInterfaces}, kDryRun, kChanges, kForRoot, Adopt},
     {"",
      "release",

@@ -126,6 +126,17 @@ constexpr char kShowMore[] =
     "  vornovsctl show\n"
     "  vornovsctl show --format dot | dot -Tsvg > host.svg";
 
+constexpr char kAboutCheck[] = "Look for what does not fit together";
+
+constexpr char kCheckMore[] =
+    "Compares the clients' list, the interfaces' files, the switch and the kernel, as after a\n"
+    "power cut or a client that was killed. Starts nothing and changes nothing. The exit status\n"
+    "tells the class of the costliest finding, see vornovsctl(8). While a client changes the\n"
+    "network, its middle is seen.\n"
+    "\n"
+    "Example:\n"
+    "  vornovsctl check";
+
 constexpr char kAboutInterfaceList[] = "List the switch's bridges";
 
 constexpr char kInterfaceListMore[] =

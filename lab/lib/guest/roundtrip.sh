@@ -14,12 +14,14 @@ round_trip()
     timed Register vornovsctl register alpha
     expect_registered alpha
     expect_on_switch
+    expect_success vornovsctl check
     probes_finish Register "$limit"
     expect_lock_free
 
     if [ $# -gt 0 ]; then
         "$@"
         expect_on_switch
+        expect_success vornovsctl check
     fi
 
     step "Unregister"
@@ -28,6 +30,7 @@ round_trip()
     expect_registered
     probes_finish UnRegister "$limit"
     expect_plain
+    expect_success vornovsctl check
     expect_lock_free
 }
 

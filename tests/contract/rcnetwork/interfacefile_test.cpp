@@ -99,13 +99,11 @@ TEST(ParseInterfaceFile, ReadsAsWhomAServerKnowsTheHost)
 TEST(ParseInterfaceFile, SendsNeitherIdNorNameWhereNoneIsAskedFor)
 {
     const auto file =
-        ParseInterfaceFile("eth0", "BOOTPROTO=dhcp\nDHCP_CLIENT_ID=none\nDHCP_HOSTNAME=none\n"
-                                   "DHCPV6_HOSTNAME=none\n")
+        ParseInterfaceFile("eth0", "BOOTPROTO=dhcp\nDHCP_CLIENT_ID=none\nDHCP_HOSTNAME=none\n")
             .file;
 
     EXPECT_THAT(file.client.id, Optional(std::string()));
     EXPECT_THAT(file.client.hostName, Optional(std::string()));
-    EXPECT_FALSE(file.client.hostName6);
     EXPECT_EQ(ParseInterfaceFile("eth0", "BOOTPROTO=dhcp\n").file.client.id, std::nullopt);
     EXPECT_EQ(ParseInterfaceFile("eth0", "BOOTPROTO=dhcp\n").file.client.hostName, std::nullopt);
 }
@@ -352,7 +350,6 @@ INSTANTIATE_TEST_SUITE_P(
         Refused{"Iaid", "DHCP_IAID=12345\n",
                 "DHCP_IAID=12345: not 4 to 4 bytes in hexadecimal digits"},
         Refused{"HostName", "DHCP_HOSTNAME=\"a b\"\n", "DHCP_HOSTNAME=a b: not the name of a host"},
-        Refused{"HostName6", "DHCPV6_HOSTNAME=nas\n", "DHCPV6_HOSTNAME=nas: not none"},
         Refused{"NameServer", "DNS1=dns.example\n", "DNS1=dns.example: not an address"},
         Refused{"SearchDomain", "DOMAIN=\"a.example ;b\"\n",
                 "DOMAIN=a.example ;b: \";b\" is not a domain"},

@@ -58,6 +58,7 @@ TEST_F(CommandLine, ResetWantsToBeMeant)
 const std::vector<std::vector<std::string>> kForRoot{
     {"register", "lab"},
     {"unregister", "lab"},
+    {"check"},
     {"status"},
     {"adopt"},
     {"release"},
@@ -88,8 +89,8 @@ const std::vector<std::vector<std::string>> kForAnyone{
 
 std::string WordsOf(const std::vector<std::string>& commandLine)
 {
-    constexpr std::array kSingle{"register", "unregister", "status", "reset",
-                                 "show",     "adopt",      "release"};
+    constexpr std::array kSingle{"register", "unregister", "status", "check",
+                                 "reset",    "show",       "adopt",  "release"};
     const bool single =
         std::find(kSingle.begin(), kSingle.end(), commandLine.front()) != kSingle.end();
     return single ? commandLine.front() : commandLine[0] + ' ' + commandLine[1];

@@ -181,7 +181,7 @@ DhcpIdentity DhclientIdentity(const std::vector<std::string>& words,
         identity.clientId = "ff:" + mac.substr(mac.size() - 11) + ':' + duid;
     }
     identity.hostName = "none";
-    identity.hostName6 = false;
+    identity.hostName6 = "none";
     for (const std::string& statement : StatementsOf(configuration)) {
         if (const auto id = After(statement, "send dhcp-client-identifier ")) {
             const std::string value = id->starts_with("= ") ? id->substr(2) : *id;
@@ -192,7 +192,7 @@ DhcpIdentity DhclientIdentity(const std::vector<std::string>& words,
                 identity.clientId = "01:" + mac;
             }
         } else if (statement.starts_with("send fqdn.")) {
-            identity.hostName6 = true;
+            identity.hostName6.reset();
         } else if (const auto name = After(statement, "send host-name ")) {
             const std::string value = name->starts_with("= ") ? name->substr(2) : *name;
             identity.hostName.reset();

@@ -81,7 +81,11 @@ private:
             if (!state.iaid.empty()) {
                 m_wish.identity.iaid = state.iaid;
             }
-            m_wish.identity.hostName6 = identity.hostName6;
+            if (!m_wish.dhcp4) {
+                m_wish.identity.hostName = identity.hostName6;
+            } else if (identity.hostName6 && !identity.hostName) {
+                m_wish.remarks.emplace_back("servers of IPv6 will be told the host's name as well");
+            }
             return;
         }
         m_wish.identity.clientId = identity.clientId;

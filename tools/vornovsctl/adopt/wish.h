@@ -24,11 +24,11 @@ enum class WishKind { kSingle, kBond, kVlan };
 
 /** How the client presents itself to the servers; what is not set is the client's own choice. */
 struct DhcpIdentity {
-    std::optional<std::string> clientId; /**< hex with colons, or "none" */
-    std::optional<std::string> hostName; /**< or "none" */
-    bool hostName6 = true;               /**< whether servers of IPv6 are told it, too */
-    std::optional<std::string> duid;     /**< hex with colons */
-    std::optional<std::string> iaid;     /**< eight hex digits */
+    std::optional<std::string> clientId;  /**< hex with colons, or "none" */
+    std::optional<std::string> hostName;  /**< or "none" */
+    std::optional<std::string> hostName6; /**< the same for a client that does IPv6 alone */
+    std::optional<std::string> duid;      /**< hex with colons */
+    std::optional<std::string> iaid;      /**< eight hex digits */
 
     bool operator==(const DhcpIdentity&) const = default;
 };

@@ -134,11 +134,8 @@ private:
         const DhcpIdentity& identity = m_wish.identity;
         if (m_wish.dhcp4) {
             SetIf("DHCP_CLIENT_ID", identity.clientId.value_or(""));
-            SetIf("DHCP_HOSTNAME", identity.hostName.value_or(""));
         }
-        if (!identity.hostName6) {
-            Set("DHCPV6_HOSTNAME", "none");
-        }
+        SetIf("DHCP_HOSTNAME", identity.hostName.value_or(""));
         SetIf("DHCPV6_DUID", identity.duid.value_or(""));
         SetIf("DHCP_IAID", identity.iaid.value_or(""));
         SetIf("PEERROUTES", m_wish.peerRoutes);

@@ -289,11 +289,19 @@ TEST(Ifupdown, ItsClientTellsServersOfIpv6NoNameUnlessItIsAskedTo)
     host.AddLink("eth0", kMac0);
     host.Write("/etc/network/interfaces", "auto eth0\niface eth0 inet6 dhcp\n");
 
-    EXPECT_THAT(TextOf(OnlyWish(host)), HasSubstr("DHCPV6_HOSTNAME=none\n"));
+    EXPECT_THAT(TextOf(OnlyWish(host)), HasSubstr("DHCP_HOSTNAME=none\n"));
 
     host.Write("/etc/dhcp/dhclient.conf", "send fqdn.fqdn = gethostname();\n");
 
-    EXPECT_THAT(TextOf(OnlyWish(host)), Not(HasSubstr("DHCPV6_HOSTNAME")));
+    EXPECT_THAT(TextOf(OnlyWish(host)), Not(HasSubstr("DHCP_HOSTNAME")));
+
+    host.Write("/etc/dhcp/dhclient.conf", "send host-name = gethostname();\n");
+    host.Write("/etc/network/interfaces",
+               "auto eth0\niface eth0 inet dhcp\niface eth0 inet6 dhcp\n");
+
+    EXPECT_THAT(TextOf(OnlyWish(host)), Not(HasSubstr("DHCP_HOSTNAME")));
+    EXPECT_THAT(OnlyWish(host).remarks,
+                ElementsAre("servers of IPv6 will be told the host's name as well"));
 }
 
 TEST(Ifupdown, FixedAddressesRoutesAndCommandsAreCarriedOver)

@@ -1,0 +1,219 @@
+#include "halfstates.h"
+
+#include "wording.h"
+
+#include <support/interfacename.h>
+
+#include <algorithm>
+#include <iterator>
+
+namespace vornovsctl {
+
+namespace {
+
+constexpr int kFirstExitStatus = 10;
+constexpr char kRegistrations[] = "registrations";
+
+bool IsLinkLocal(const std::string& address)
+{
+    return address.starts_with("fe80:");
+}
+
+bool HasBridgeName(const std::string& name)
+{
+    return !InterfaceOf(name).empty();
+}
+
+class Finder {
+public:
+    explicit Finder(const HostTruths& truths) : m_truths(truths), m_host(truths.host) {}
+
+    std::vector<HalfState> Find()
+    {
+        for (const Bridge& bridge : Bridges()) {
+            LookAtBridge(bridge);
+        }
+        for (const FileTruth& file : m_truths.files) {
+            LookAtFile(file);
+        }
+        LookAtClients();
+        for (const std::string& path : m_truths.strays) {
+            Add(HalfStateClass::kStrayFile, path, "is left over from a writer that was killed");
+        }
+        std::stable_sort(
+            m_found.begin(), m_found.end(),
+            [](const HalfState& one, const HalfState& other) { return one.kind < other.kind; });
+        return std::move(m_found);
+    }
+
+private:
+    void Add(HalfStateClass kind, const std::string& subject, const std::string& text)
+    {
+        m_found.push_back({kind, subject, text});
+    }
+
+    /** The bridges that stand for interfaces; other programs have their own. */
+    std::vector<Bridge> Bridges() const
+    {
+        std::vector<Bridge> bridges;
+        const auto all = m_host.bridges.value_or(std::vector<Bridge>());
+        std::copy_if(all.begin(), all.end(), std::back_inserter(bridges),
+                     [](const Bridge& bridge) { return HasBridgeName(bridge.name); });
+        return bridges;
+    }
+
+    /** Whether the switch answered, or does not run and so has nothing. */
+    bool IsSwitchKnown() const { return !m_host.switchRuns || m_host.bridges.has_value(); }
+
+    bool HasBridge(const std::string& name) const
+    {
+        const auto bridges = m_host.bridges.value_or(std::vector<Bridge>());
+        return std::any_of(bridges.begin(), bridges.end(),
+                           [&](const Bridge& bridge) { return bridge.name == name; });
+    }
+
+    void LookAtBridge(const Bridge& bridge)
+    {
+        const std::string interface = InterfaceOf(bridge.name);
+        bool reachesTheWire = false;
+        for (const Port& port : bridge.ports) {
+            if (port.wire || port.name == interface) {
+                reachesTheWire = true;
+                LookAtWire(bridge, port);
+            }
+            CompareTag(port.name, port.tag);
+        }
+        CompareTag(bridge.name, bridge.tag);
+        const FileTruth* file = m_truths.FindFile(bridge.name);
+        if (reachesTheWire && file == nullptr) {
+            Add(HalfStateClass::kBridgeWithoutFile, bridge.name,
+                "is a bridge of the switch without a file; a start of the network takes it away");
+        }
+    }
+
+    void LookAtWire(const Bridge& bridge, const Port& port)
+    {
+        for (const Member& member : port.members) {
+            const Device* device = m_host.Find(member.name);
+            for (const std::string& address :
+                 device == nullptr ? std::vector<std::string>() : device->addresses) {
+                if (!IsLinkLocal(address)) {
+                    Add(HalfStateClass::kAddressBelowBridge, member.name,
+                        "has the address " + address + ", which does not answer below the bridge " +
+                            bridge.name);
+                }
+            }
+        }
+        if (port.bond && port.members.size() < 2) {
+            Add(HalfStateClass::kBondOfOne, port.name,
+                "is a bond of the switch with " + Count(port.members.size()));
+        }
+    }
+
+    static std::string Count(std::size_t members)
+    {
+        return members == 0 ? "no member" : "a single member";
+    }
+
+    void CompareTag(const std::string& port, std::optional<int> tag)
+    {
+        const FileTruth* file = m_truths.FindFile(port);
+        if (file != nullptr && !file->tag.empty() && file->tag != std::to_string(tag.value_or(0)) &&
+            (tag || file->tag != "0")) {
+            Add(HalfStateClass::kLostTag, port,
+                "has the VLAN tag " + file->tag + " in its file and " +
+                    (tag ? std::to_string(*tag) : "none") + " in the switch");
+        }
+    }
+
+    void LookAtFile(const FileTruth& file)
+    {
+        const std::string& name = file.Name();
+        const bool ofBridge = HasBridgeName(name);
+        const bool copied = ofBridge ? file.type != "OVS" || file.device != name
+                                     : file.device == BridgeOf(name) ||
+                                           (file.type == "OVS" && file.content.slaveList.empty());
+        const bool foreign = !file.device.empty() && file.device != name && m_host.Find(name);
+        if (copied || foreign) {
+            Add(HalfStateClass::kUnfinishedFile, name,
+                "has a file that describes " +
+                    (file.device.empty() || file.device == name
+                         ? std::string(ofBridge ? "no bridge" : "a bridge")
+                         : Quoted(file.device)));
+            return;
+        }
+        if (!file.IsBridges() || file.content.slave || !file.content.onBoot) {
+            return;
+        }
+        if (IsSwitchKnown() && !HasBridge(name)) {
+            Add(HalfStateClass::kBridgeFileWithoutBridge, name,
+                m_host.switchRuns ? "has a file, and the switch has no such bridge"
+                                  : "has a bridge's file, and the switch does not run");
+        }
+        if (file.content.slaveList.size() == 1 && !HasBridge(name)) {
+            Add(HalfStateClass::kBondOfOne, InterfaceOf(name), "is a bond with a single member");
+        }
+    }
+
+    void LookAtClients()
+    {
+        if (!m_host.clients) {
+            return;
+        }
+        const bool bridgeFiles =
+            std::any_of(m_truths.files.begin(), m_truths.files.end(),
+                        [](const FileTruth& file) { return file.IsBridges(); });
+        const bool onSwitch = bridgeFiles || !Bridges().empty();
+        const bool emptied = m_host.takenOff && !m_host.takenOff->empty();
+        if (m_host.clients->empty() && onSwitch) {
+            Add(HalfStateClass::kOnSwitchButUnregistered, kRegistrations,
+                "name nobody, and interfaces are on the switch");
+        } else if (!m_host.clients->empty() && !onSwitch && !emptied && IsSwitchKnown()) {
+            Add(HalfStateClass::kRegisteredButPlain, kRegistrations,
+                "name " + List(*m_host.clients) + ", and no interface is on the switch");
+        }
+    }
+
+    const HostTruths& m_truths;
+    const HostModel& m_host;
+    std::vector<HalfState> m_found;
+};
+
+} // namespace
+
+int ExitStatusOf(HalfStateClass kind)
+{
+    return kFirstExitStatus + static_cast<int>(kind);
+}
+
+const char* WordOf(HalfStateClass kind)
+{
+    switch (kind) {
+    case HalfStateClass::kAddressBelowBridge:
+        return "address-below-bridge";
+    case HalfStateClass::kBridgeFileWithoutBridge:
+        return "bridge-file-without-bridge";
+    case HalfStateClass::kUnfinishedFile:
+        return "unfinished-file";
+    case HalfStateClass::kBridgeWithoutFile:
+        return "bridge-without-file";
+    case HalfStateClass::kRegisteredButPlain:
+        return "registered-but-plain";
+    case HalfStateClass::kOnSwitchButUnregistered:
+        return "on-switch-but-unregistered";
+    case HalfStateClass::kBondOfOne:
+        return "bond-of-one";
+    case HalfStateClass::kLostTag:
+        return "lost-tag";
+    case HalfStateClass::kStrayFile:
+        return "stray-file";
+    }
+    return "";
+}
+
+std::vector<HalfState> FindHalfStates(const HostTruths& truths)
+{
+    return Finder(truths).Find();
+}
+
+} // namespace vornovsctl

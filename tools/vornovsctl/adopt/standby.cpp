@@ -97,6 +97,17 @@ std::string Length(const vornhost::Address& address)
     return '/' + std::to_string(address.prefixLength);
 }
 
+std::string TextOf(const StoodInAddress& entry)
+{
+    return entry.address.local + Length(entry.address) + " dev " + entry.device;
+}
+
+/** The same address of IPv4 with another length, beside which the former one can be anew. */
+std::string SubstituteOf(const StoodInAddress& entry)
+{
+    return entry.address.local + "/32 dev " + entry.device;
+}
+
 std::string Lifetime(std::uint32_t seconds)
 {
     return seconds == kEver ? "forever" : std::to_string(seconds);
@@ -114,7 +125,7 @@ std::string ChangeOf(const StoodInAddress& entry, bool forEver)
     const bool bare = entry.manager == Manager::kIfupdown;
     const bool own = entry.manager == Manager::kNetworkd && !Has(address, IFA_F_TEMPORARY) &&
                      address.prefixLength == kHalfAddress6;
-    return "address change " + address.local + Length(address) + " dev " + entry.device +
+    return "address change " + TextOf(entry) +
            (address.scope == RT_SCOPE_LINK ? " scope link" : "") + (bare ? "" : " noprefixroute") +
            (own ? " mngtmpaddr" : "") +
            Lifetimes(forEver ? kEver : address.validSeconds,
@@ -259,11 +270,8 @@ void PutUp(const Standby& standby, Hands& hands)
                 continue;
             }
             if (family == AF_INET) {
-                // The same address with another length, beside which the former one can be anew.
-                before += "address replace " + address.local + "/32 dev " + entry.device +
-                          " noprefixroute\n";
-                after += "address del " + address.local + Length(address) + " dev " + entry.device +
-                         '\n';
+                before += "address replace " + SubstituteOf(entry) + " noprefixroute\n";
+                after += "address del " + TextOf(entry) + '\n';
             } else {
                 after += ChangeOf(entry, entry.manager == Manager::kNetworkd);
             }
@@ -291,15 +299,14 @@ void TakeDown(const Standby& standby, const HostView& now, Hands& hands)
         }
         for (const StoodInAddress& entry : standby.addresses) {
             const vornhost::Address& address = entry.address;
-            const std::string substitute = address.local + "/32 dev " + entry.device;
             const bool there = IsThere(entry, now);
             if (address.family != family || (there && family == AF_INET6)) {
                 continue;
             }
             if (there) {
-                lines += "address del " + substitute + '\n';
+                lines += "address del " + SubstituteOf(entry) + '\n';
             } else if (family == AF_INET) {
-                lines += "address change " + substitute + " noprefixroute" +
+                lines += "address change " + SubstituteOf(entry) + " noprefixroute" +
                          Lifetimes(address.validSeconds, address.preferredSeconds);
             } else {
                 lines += ChangeOf(entry, false);

@@ -15,6 +15,7 @@ constexpr unsigned kWholeAddress4 = 32;
 constexpr unsigned kWholeAddress6 = 128;
 constexpr unsigned kHalfAddress6 = 64;
 constexpr std::uint32_t kEver = UINT32_MAX;
+constexpr char kNoRoute[] = " noprefixroute";
 constexpr std::uint32_t kKernelPrefixMetric = 256;
 
 bool Has(const vornhost::Address& address, std::uint32_t flag)
@@ -126,7 +127,7 @@ std::string ChangeOf(const StoodInAddress& entry, bool forEver)
     const bool own = entry.manager == Manager::kNetworkd && !Has(address, IFA_F_TEMPORARY) &&
                      address.prefixLength == kHalfAddress6;
     return "address change " + TextOf(entry) +
-           (address.scope == RT_SCOPE_LINK ? " scope link" : "") + (bare ? "" : " noprefixroute") +
+           (address.scope == RT_SCOPE_LINK ? " scope link" : "") + (bare ? "" : kNoRoute) +
            (own ? " mngtmpaddr" : "") +
            Lifetimes(forEver ? kEver : address.validSeconds,
                      forEver ? kEver : address.preferredSeconds);
@@ -270,13 +271,14 @@ void PutUp(const Standby& standby, Hands& hands)
                 continue;
             }
             if (family == AF_INET) {
-                before += "address replace " + SubstituteOf(entry) + " noprefixroute\n";
+                before.append("address replace ").append(SubstituteOf(entry)).append(kNoRoute) +=
+                    '\n';
                 after += "address del " + TextOf(entry) + '\n';
             } else {
                 after += ChangeOf(entry, entry.manager == Manager::kNetworkd);
             }
         }
-        RunBatch(family, before + RouteLines(standby, family) + after, hands);
+        RunBatch(family, before.append(RouteLines(standby, family)).append(after), hands);
     }
 }
 
@@ -306,8 +308,8 @@ void TakeDown(const Standby& standby, const HostView& now, Hands& hands)
             if (there) {
                 lines += "address del " + SubstituteOf(entry) + '\n';
             } else if (family == AF_INET) {
-                lines += "address change " + SubstituteOf(entry) + " noprefixroute" +
-                         Lifetimes(address.validSeconds, address.preferredSeconds);
+                lines.append("address change ").append(SubstituteOf(entry)).append(kNoRoute);
+                lines += Lifetimes(address.validSeconds, address.preferredSeconds);
             } else {
                 lines += ChangeOf(entry, false);
             }

@@ -52,7 +52,8 @@ void RestoreKernelSettings(const HostView& host, const AdoptionRecord& record,
         for (const auto& [path, value] : interface.settings) {
             const std::string now = ValueOf(host, path);
             if (!now.empty() && now != value) {
-                (void)hands.Run({"sysctl", "-q", "-w", path + '=' + value});
+                (void)hands.Run(
+                    {"sysctl", "-q", "-w", std::string(path).append("=").append(value)});
             }
         }
     }

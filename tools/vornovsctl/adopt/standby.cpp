@@ -15,6 +15,7 @@ constexpr unsigned kWholeAddress4 = 32;
 constexpr unsigned kWholeAddress6 = 128;
 constexpr unsigned kHalfAddress6 = 64;
 constexpr std::uint32_t kEver = UINT32_MAX;
+constexpr char kNoRoute[] = " noprefixroute";
 constexpr std::uint32_t kKernelPrefixMetric = 256;
 
 bool Has(const vornhost::Address& address, std::uint32_t flag)
@@ -97,6 +98,17 @@ std::string Length(const vornhost::Address& address)
     return '/' + std::to_string(address.prefixLength);
 }
 
+std::string TextOf(const StoodInAddress& entry)
+{
+    return entry.address.local + Length(entry.address) + " dev " + entry.device;
+}
+
+/** The same address of IPv4 with another length, beside which the former one can be anew. */
+std::string SubstituteOf(const StoodInAddress& entry)
+{
+    return entry.address.local + "/32 dev " + entry.device;
+}
+
 std::string Lifetime(std::uint32_t seconds)
 {
     return seconds == kEver ? "forever" : std::to_string(seconds);
@@ -114,8 +126,8 @@ std::string ChangeOf(const StoodInAddress& entry, bool forEver)
     const bool bare = entry.manager == Manager::kIfupdown;
     const bool own = entry.manager == Manager::kNetworkd && !Has(address, IFA_F_TEMPORARY) &&
                      address.prefixLength == kHalfAddress6;
-    return "address change " + address.local + Length(address) + " dev " + entry.device +
-           (address.scope == RT_SCOPE_LINK ? " scope link" : "") + (bare ? "" : " noprefixroute") +
+    return "address change " + TextOf(entry) +
+           (address.scope == RT_SCOPE_LINK ? " scope link" : "") + (bare ? "" : kNoRoute) +
            (own ? " mngtmpaddr" : "") +
            Lifetimes(forEver ? kEver : address.validSeconds,
                      forEver ? kEver : address.preferredSeconds);
@@ -259,16 +271,14 @@ void PutUp(const Standby& standby, Hands& hands)
                 continue;
             }
             if (family == AF_INET) {
-                // The same address with another length, beside which the former one can be anew.
-                before += "address replace " + address.local + "/32 dev " + entry.device +
-                          " noprefixroute\n";
-                after += "address del " + address.local + Length(address) + " dev " + entry.device +
-                         '\n';
+                before.append("address replace ").append(SubstituteOf(entry)).append(kNoRoute) +=
+                    '\n';
+                after += "address del " + TextOf(entry) + '\n';
             } else {
                 after += ChangeOf(entry, entry.manager == Manager::kNetworkd);
             }
         }
-        RunBatch(family, before + RouteLines(standby, family) + after, hands);
+        RunBatch(family, before.append(RouteLines(standby, family)).append(after), hands);
     }
 }
 
@@ -291,16 +301,15 @@ void TakeDown(const Standby& standby, const HostView& now, Hands& hands)
         }
         for (const StoodInAddress& entry : standby.addresses) {
             const vornhost::Address& address = entry.address;
-            const std::string substitute = address.local + "/32 dev " + entry.device;
             const bool there = IsThere(entry, now);
             if (address.family != family || (there && family == AF_INET6)) {
                 continue;
             }
             if (there) {
-                lines += "address del " + substitute + '\n';
+                lines += "address del " + SubstituteOf(entry) + '\n';
             } else if (family == AF_INET) {
-                lines += "address change " + substitute + " noprefixroute" +
-                         Lifetimes(address.validSeconds, address.preferredSeconds);
+                lines.append("address change ").append(SubstituteOf(entry)).append(kNoRoute);
+                lines += Lifetimes(address.validSeconds, address.preferredSeconds);
             } else {
                 lines += ChangeOf(entry, false);
             }

@@ -186,6 +186,33 @@ std::string RouteLines(const Standby& standby, int family)
     return lines;
 }
 
+/**
+ * The kernel leaves a route that it made of a router's word, though the address that came with it
+ * does without; one that was made of an address alone is gone by now.
+ */
+std::string KernelRemovals(const Standby& standby)
+{
+    std::string lines;
+    for (const StoodInRoute& entry : standby.routes) {
+        if (entry.route.family == AF_INET6 && entry.route.protocol == RTPROT_KERNEL &&
+            !entry.shared) {
+            lines += RemovalOf(entry);
+        }
+    }
+    return lines;
+}
+
+/** Whether the kernel's route of an address is that of another one, too, which keeps it. */
+bool IsShared(const vornhost::Address& address, const HostView& host, Manager manager)
+{
+    const auto& all = host.live.addresses;
+    return std::any_of(all.begin(), all.end(), [&](const vornhost::Address& other) {
+        return other.index == address.index && other.family == address.family &&
+               other.prefixLength == address.prefixLength && !Has(other, IFA_F_NOPREFIXROUTE) &&
+               !IsStoodInFor(other, manager) && NetworkOf(other) == NetworkOf(address);
+    });
+}
+
 void RunBatch(int family, const std::string& lines, Hands& hands)
 {
     if (!lines.empty()) {
@@ -247,14 +274,15 @@ Standby StandbyFor(const HostView& host, const std::map<std::string, Manager>& m
         standby.addresses.push_back({address, name, managerOf(name)});
         const bool bare = address.family == AF_INET6 && managerOf(name) == Manager::kIfupdown;
         if (!Has(address, IFA_F_NOPREFIXROUTE) && !bare) {
-            standby.routes.push_back({KernelRouteOf(address), name});
+            standby.routes.push_back(
+                {KernelRouteOf(address), name, IsShared(address, host, managerOf(name))});
         }
     }
     for (const vornhost::Route& route : host.live.routes) {
         const std::string name =
             route.nextHops.empty() ? "" : host.NameOf(route.nextHops.front().index);
         if (IsStoodInFor(route, managerOf(name))) {
-            standby.routes.push_back({route, name});
+            standby.routes.push_back({route, name, false});
         }
     }
     return standby;
@@ -277,6 +305,9 @@ void PutUp(const Standby& standby, Hands& hands)
             } else {
                 after += ChangeOf(entry, entry.manager == Manager::kNetworkd);
             }
+        }
+        if (family == AF_INET6) {
+            after += KernelRemovals(standby);
         }
         RunBatch(family, before.append(RouteLines(standby, family)).append(after), hands);
     }

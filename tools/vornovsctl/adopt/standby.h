@@ -26,6 +26,7 @@ struct StoodInAddress {
 struct StoodInRoute {
     vornhost::Route route;
     std::string device;
+    bool shared = false; /**< with an address that stays */
 };
 
 struct Standby {

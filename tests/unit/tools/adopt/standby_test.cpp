@@ -135,10 +135,30 @@ TEST_F(StandbyTest, HasTheRoutesThatTheKernelMadeOfAddresses)
                             "address change 2001:db8::10/64 dev eth0 noprefixroute"
                             " valid_lft forever preferred_lft forever\n"
                             "address change fe80::10/64 dev eth0 scope link noprefixroute"
-                            " valid_lft forever preferred_lft forever\n"));
+                            " valid_lft forever preferred_lft forever\n"
+                            "route del 2001:db8::/64 dev eth0 table 254 proto 2 metric 256\n"
+                            "route del fe80::/64 dev eth0 table 254 proto 2 metric 256\n"));
     EXPECT_TRUE(IsReplaced(standby, m_host.view));
     m_host.view.live.addresses.front().prefixLength = 32;
     EXPECT_FALSE(IsReplaced(standby, m_host.view));
+}
+
+TEST_F(StandbyTest, LeavesTheKernelsRouteOfAnAddressThatStays)
+{
+    m_host.view.live.routes.clear();
+    m_host.view.live.addresses.clear();
+    Leased("2001:db8::1:2", 64);
+    m_host.view.live.addresses.back().flags = 0;
+    m_host.AddAddress("eth0", "2001:db8::10", 64);
+
+    PutUp(StandbyFor(m_host.view, {{"eth0", Manager::kNetworkd}}), m_hands);
+
+    EXPECT_THAT(m_hands.runs,
+                ElementsAre("-6\n"
+                            "route replace 2001:db8::/64 dev eth0 table 254 proto static"
+                            " metric 257\n"
+                            "address change 2001:db8::1:2/64 dev eth0 noprefixroute mngtmpaddr"
+                            " valid_lft forever preferred_lft forever\n"));
 }
 
 TEST_F(StandbyTest, LeavesToTheKernelWhatRoutersTell)

@@ -77,7 +77,7 @@ Belongings WaitForManagers(const AdoptionRecord& record, const LooseEnds& ends,
          waited += kBetweenGlances) {
         std::this_thread::sleep_for(kBetweenGlances);
     }
-    const Belongings missing = WaitFor(before, names);
+    Belongings missing = WaitFor(before, names);
     TieUp(ends, HostView::Now(), hands);
     return missing;
 }

@@ -44,14 +44,14 @@ bool IsListReplacement(std::string_view name)
 
 void ReadConfiguration(HostTruths& truths)
 {
-    const std::string folder = vornhost::kConfigurationFolder;
+    const fs::path folder = vornhost::kConfigurationFolder;
     const auto names = NamesIn(vornhost::kConfigurationFolder);
     if (!names) {
-        truths.host.unread.push_back(folder + " cannot be read");
+        truths.host.unread.push_back(folder.string() + " cannot be read");
         return;
     }
     for (const std::string& name : *names) {
-        const std::string path = folder + '/' + name;
+        const std::string path = folder / name;
         const std::string interface = vornhost::InterfaceOfFileName(name);
         if (name.starts_with(kReplacement)) {
             truths.strays.push_back(path);

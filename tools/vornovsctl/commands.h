@@ -29,6 +29,7 @@ Answer Status(const Context& context);
 Answer Reset(const Context& context);
 Answer Show(const Context& context);
 Answer Check(const Context& context);
+Answer Repair(const Context& context);
 Answer Adopt(const Context& context);
 Answer Release(const Context& context);
 

@@ -75,6 +75,7 @@ const std::vector<CommandRow> kCommands{
     {"", "status", kAboutStatus, kStatusMore, {}, kNone, kReads, kForRoot, Status},
     {"", "show", kAboutShow, kShowMore, {}, kFormat, kReads, kForAnyone, Show},
     {"", "check", kAboutCheck, kCheckMore, {}, kNone, kReads, kForRoot, Check},
+    {"", "repair", kAboutRepair, kRepairMore, {}, kDryRun, kChanges, kForRoot, Repair},
     {"", "adopt", kAboutAdopt, kAdoptMore, {kTakenInterfaces}, kDryRun, kChanges, kForRoot, Adopt},
     {"",
      "release",

@@ -137,6 +137,18 @@ constexpr char kCheckMore[] =
     "Example:\n"
     "  vornovsctl check";
 
+constexpr char kAboutRepair[] = "Mend what check finds";
+
+constexpr char kRepairMore[] =
+    "Makes the live network what the files say and, where a conversion was cut short, takes the\n"
+    "whole host through one: to the switch when clients are registered, off it otherwise. Clients\n"
+    "that were registered are registered in the end. Says first what it does, and can be "
+    "repeated.\n"
+    "\n"
+    "Examples:\n"
+    "  vornovsctl repair --dry-run\n"
+    "  vornovsctl repair";
+
 constexpr char kAboutInterfaceList[] = "List the switch's bridges";
 
 constexpr char kInterfaceListMore[] =

@@ -19,7 +19,7 @@ for ((number = stride; number <= last; number += stride)); do
     killed_at "$number" vornovsctl unregister alpha
     step "Killed before step $number, $(step_name)"
     expect_safe_after_kill
-    bring_home >"$lab_out/way-home" 2>&1
+    mend >"$lab_out/way-home" 2>&1
     expect_registered
     expect_plain "after-$number"
 done

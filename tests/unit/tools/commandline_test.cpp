@@ -59,6 +59,7 @@ const std::vector<std::vector<std::string>> kForRoot{
     {"register", "lab"},
     {"unregister", "lab"},
     {"check"},
+    {"repair"},
     {"status"},
     {"adopt"},
     {"release"},
@@ -89,7 +90,7 @@ const std::vector<std::vector<std::string>> kForAnyone{
 
 std::string WordsOf(const std::vector<std::string>& commandLine)
 {
-    constexpr std::array kSingle{"register", "unregister", "status", "check",
+    constexpr std::array kSingle{"register", "unregister", "status", "check",  "repair",
                                  "reset",    "show",       "adopt",  "release"};
     const bool single =
         std::find(kSingle.begin(), kSingle.end(), commandLine.front()) != kSingle.end();

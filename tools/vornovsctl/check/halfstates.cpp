@@ -165,9 +165,13 @@ private:
                         [](const FileTruth& file) { return file.IsBridges(); });
         const bool onSwitch = bridgeFiles || !Bridges().empty();
         const bool emptied = m_host.takenOff && !m_host.takenOff->empty();
-        if (m_host.clients->empty() && onSwitch) {
+        const bool cutShort = m_host.clients->contains(kRepairClient);
+        if (onSwitch && m_host.clients->empty()) {
             Add(HalfStateClass::kOnSwitchButUnregistered, kRegistrations,
                 "name nobody, and interfaces are on the switch");
+        } else if (onSwitch && cutShort) {
+            Add(HalfStateClass::kOnSwitchButUnregistered, kRegistrations,
+                "name a repair that was cut short");
         } else if (!m_host.clients->empty() && !onSwitch && !emptied && IsSwitchKnown()) {
             Add(HalfStateClass::kRegisteredButPlain, kRegistrations,
                 "name " + List(*m_host.clients) + ", and no interface is on the switch");

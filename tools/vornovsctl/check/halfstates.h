@@ -12,6 +12,9 @@
 
 namespace vornovsctl {
 
+/** The client as which a repair goes to the switch and back when nobody else is registered. */
+constexpr char kRepairClient[] = "vornovsctl-repair";
+
 /** Classes of half states; those that cost the most come first. */
 enum class HalfStateClass {
     kAddressBelowBridge,      /**< a port of the switch has addresses, which do not answer */

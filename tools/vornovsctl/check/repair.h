@@ -1,0 +1,42 @@
+/**
+ * What takes a host out of its half states: the network program makes the live network what the
+ * files say, and a whole conversion by the library finishes the files of one that was cut short.
+ */
+#ifndef VORNOVSCTL_CHECK_REPAIR_H
+#define VORNOVSCTL_CHECK_REPAIR_H
+
+#include "halfstates.h"
+
+#include <string>
+#include <vector>
+
+namespace vornovsctl {
+
+struct RepairStep {
+    enum class Kind {
+        kStartNetwork, /**< the network program takes the files for what is meant */
+        kUnregister,   /**< a client, whose name is in "subject" */
+        kRegister,     /**< the same */
+        kRemoveFile,   /**< a stray one */
+    };
+    Kind kind;
+    std::string subject;
+
+    bool operator==(const RepairStep&) const = default;
+};
+
+/**
+ * Plans the way to the nearest whole state: on the switch while somebody is registered, off it
+ * otherwise. Clients that were registered are registered at its end.
+ */
+std::vector<RepairStep> PlanRepair(const HostTruths& truths, const std::vector<HalfState>& found);
+
+/** The step in words. */
+std::string TextOf(const RepairStep& step);
+
+/** Takes a step; whether it helped is to be looked at. Waits some seconds for files of writers. */
+void Take(const RepairStep& step);
+
+} // namespace vornovsctl
+
+#endif

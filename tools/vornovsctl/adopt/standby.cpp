@@ -39,7 +39,8 @@ bool IsStoodInFor(const vornhost::Address& address, Manager manager)
     const bool isGlobal = address.scope == RT_SCOPE_UNIVERSE;
     switch (manager) {
     case Manager::kNetworkd:
-        return isGlobal && IsDynamic(address);
+        // A temporary one is the kernel's, which makes a new one of the address that stays.
+        return isGlobal && IsDynamic(address) && !Has(address, IFA_F_TEMPORARY);
     case Manager::kNetworkManager:
         return (isGlobal || isLocal) && !Has(address, IFA_F_NOPREFIXROUTE | IFA_F_TEMPORARY);
     case Manager::kIfupdown:

@@ -94,7 +94,7 @@ private:
         Remember(plan);
         // Whatever fails, clients that were taken out are to be registered again.
         for (const RepairStep& step : plan) {
-            Take(step);
+            TakeStep(step);
         }
         Look();
     }

@@ -18,7 +18,7 @@ namespace fs = std::filesystem;
 
 // A writer has its file for some milliseconds; one that is older has none.
 constexpr std::chrono::seconds kStrayAge{5};
-constexpr std::chrono::milliseconds kBetweenGlances{100};
+constexpr std::chrono::milliseconds kBetweenLooks{100};
 
 bool Has(const std::vector<HalfState>& found, std::initializer_list<HalfStateClass> kinds)
 {
@@ -48,7 +48,7 @@ void AddConversions(Names clients, std::vector<RepairStep>& plan)
 void RemoveStray(const std::string& path)
 {
     std::error_code error;
-    for (;; std::this_thread::sleep_for(kBetweenGlances)) {
+    for (;; std::this_thread::sleep_for(kBetweenLooks)) {
         const auto written = fs::last_write_time(path, error);
         if (error || fs::file_time_type::clock::now() - written >= kStrayAge) {
             fs::remove(path, error);
@@ -93,7 +93,7 @@ std::string TextOf(const RepairStep& step)
     return "";
 }
 
-void Take(const RepairStep& step)
+void TakeStep(const RepairStep& step)
 {
     switch (step.kind) {
     case RepairStep::Kind::kStartNetwork:

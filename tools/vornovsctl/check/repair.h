@@ -35,7 +35,7 @@ std::vector<RepairStep> PlanRepair(const HostTruths& truths, const std::vector<H
 std::string TextOf(const RepairStep& step);
 
 /** Takes a step; whether it helped is to be looked at. Waits some seconds for files of writers. */
-void Take(const RepairStep& step);
+void TakeStep(const RepairStep& step);
 
 } // namespace vornovsctl
 

@@ -6,6 +6,7 @@
 #include "readiness.h"
 #include "routers.h"
 
+#include "support/interfacevalues.h"
 #include "support/process.h"
 #include "support/service.h"
 
@@ -30,16 +31,6 @@ constexpr char kBondingLoaded[] = "/sys/class/net/bonding_masters";
 constexpr std::chrono::seconds kToolDeadline{15};
 constexpr std::chrono::seconds kBridgeDeadline{8};
 constexpr std::chrono::milliseconds kBridgePoll{10};
-
-std::vector<std::string> Words(const std::string& line)
-{
-    std::istringstream stream(line);
-    std::vector<std::string> words;
-    for (std::string word; stream >> word;) {
-        words.push_back(word);
-    }
-    return words;
-}
 
 /** What a program said, on one line of the log. */
 std::string OneLine(std::string text)

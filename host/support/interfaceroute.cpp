@@ -17,16 +17,6 @@ namespace {
 constexpr unsigned kIPv6Metric = 1024;
 constexpr char kDefault[] = "default";
 
-std::vector<std::string> Words(const std::string& text)
-{
-    std::istringstream stream(text);
-    std::vector<std::string> words;
-    for (std::string word; stream >> word;) {
-        words.push_back(word);
-    }
-    return words;
-}
-
 int FamilyOf(const std::string& address)
 {
     return address.find(':') == std::string::npos ? AF_INET : AF_INET6;

@@ -49,7 +49,7 @@ HostTruths OnTheSwitch()
     AddFile(truths, "ovs_bond1",
             "DEVICE=ovs_bond1\nTYPE=OVS\nPRIMARY=bond1\nSLAVE_LIST=\"eth4 eth5\"\n");
     AddFile(truths, "ovs_eth0", "DEVICE=ovs_eth0\nTYPE=OVS\nPRIMARY=eth0\nOVS_VLAN_ID=10\n");
-    AddFile(truths, "eth0", "DEVICE=eth0\nBRIDGE=ovs_eth0\n");
+    AddFile(truths, "eth0", "DEVICE=eth0\nBRIDGE=ovs_eth0\nOVS_VLAN_ID=10\n");
     AddFile(truths, "tap0", "DEVICE=tap0\nOVS_VLAN_ID=20\n");
     return truths;
 }

@@ -80,9 +80,11 @@ private:
             if (port.wire || port.name == interface) {
                 reachesTheWire = true;
                 LookAtWire(bridge, port);
+            } else {
+                CompareTag(port.name, port.tag);
             }
-            CompareTag(port.name, port.tag);
         }
+        // Towards the wire frames are tagged; the tag of the plain file is the bridge's own.
         CompareTag(bridge.name, bridge.tag);
         const FileTruth* file = m_truths.FindFile(bridge.name);
         if (reachesTheWire && file == nullptr) {

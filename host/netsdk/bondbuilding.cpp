@@ -33,17 +33,7 @@ bool IsWhole(const BondPlan& plan, const FileStates& files)
 std::optional<std::vector<GatewayState>>
 GatewaysForBond(const BondPlan& plan, const std::optional<RememberedBond>& memory)
 {
-    if (memory) {
-        // The bond's own are there: the caller has brought them back from its bridge. The bridge
-        // that was given some is gone.
-        auto former = memory->state.gateways;
-        for (GatewayState& state : former) {
-            if (state.interface.starts_with(kBridgePrefix)) {
-                state.gateway.reset();
-            }
-        }
-        return former;
-    }
+    // The bond's own are there when the caller has brought them back from its bridge.
     auto bonds = ReadGatewayStates({plan.name});
     auto carriers = ReadGatewayStates({plan.slaves[0]});
     if (!bonds || !carriers) {
@@ -54,6 +44,15 @@ GatewaysForBond(const BondPlan& plan, const std::optional<RememberedBond>& memor
         GatewayState& carrier = (*carriers)[family];
         bond.gateway = bond.gateway ? bond.gateway : carrier.gateway;
         carrier.gateway.reset();
+    }
+    if (memory) {
+        carriers = memory->state.gateways;
+        for (GatewayState& state : *carriers) {
+            // The bridge that was given some is gone.
+            if (state.interface.starts_with(kBridgePrefix)) {
+                state.gateway.reset();
+            }
+        }
     }
     bonds->insert(bonds->end(), carriers->begin(), carriers->end());
     return bonds;

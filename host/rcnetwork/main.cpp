@@ -1,4 +1,5 @@
 #include "automatic.h"
+#include "conversion.h"
 #include "hold.h"
 #include "online.h"
 #include "reconcile.h"
@@ -22,8 +23,8 @@ namespace {
 
 constexpr int kUsageError = 2;
 constexpr char kBondVerb[] = "set-ovs-bond";
-/** Of the hook program that is told of conversions: "begin" or "end". */
-constexpr char kHandoverVerb[] = "handover";
+/** Of the hook program that is told of conversions: "create", "delete" or "done". */
+constexpr char kConversionVerb[] = "conversion";
 
 /** Of the tool that gives interfaces back to another manager. */
 constexpr char kLeaveVerb[] = "leave";
@@ -52,10 +53,14 @@ struct VerbForm {
 };
 
 constexpr std::array kVerbs = {
-    VerbForm{"start", Words::kInterfaces, false},     VerbForm{"stop", Words::kInterfaces, false},
-    VerbForm{kLeaveVerb, Words::kInterfaces, false},  VerbForm{kOnlineVerb, Words::kNone, true},
-    VerbForm{kBondVerb, Words::kInterface, false},    VerbForm{kHandoverVerb, Words::kText, false},
-    VerbForm{kHolderVerb, Words::kText, true},        VerbForm{kRetryVerb, Words::kNone, true},
+    VerbForm{"start", Words::kInterfaces, false},
+    VerbForm{"stop", Words::kInterfaces, false},
+    VerbForm{kLeaveVerb, Words::kInterfaces, false},
+    VerbForm{kOnlineVerb, Words::kNone, true},
+    VerbForm{kBondVerb, Words::kInterface, false},
+    VerbForm{kConversionVerb, Words::kText, false},
+    VerbForm{kHolderVerb, Words::kText, true},
+    VerbForm{kRetryVerb, Words::kNone, true},
     VerbForm{kAppearedVerb, Words::kInterface, true},
 };
 
@@ -116,7 +121,7 @@ bool ParseCommandLine(int count, char** arguments, CommandLine& line)
     return line.word.empty() == (isPlain || words == Words::kNone) && (isPlain || !line.dryRun) &&
            (!line.boot || line.verb == "start") &&
            (line.verb != kLeaveVerb || (!line.request.names.empty() && !line.dryRun)) &&
-           (line.verb != kHandoverVerb || line.word == "begin" || line.word == "end");
+           (line.verb != kConversionVerb || FindStage(line.word));
 }
 
 bool RunHolder(const std::string& token)
@@ -165,8 +170,8 @@ bool RunLocked(const CommandLine& line)
     if (line.verb == kBondVerb) {
         return SetSwitchBond(line.word);
     }
-    if (line.verb == kHandoverVerb) {
-        return BeginHandover(line.word == "begin");
+    if (line.verb == kConversionVerb) {
+        return MindConversion(*FindStage(line.word));
     }
     return line.request.verb == Verb::kStop ? Stop(line.request) : Start(line.request);
 }

@@ -30,12 +30,6 @@ std::set<std::string> ConcernedBy(const Request& request);
 bool KeepTags();
 
 /**
- * Writes down what a conversion back to plain networking is about to take away from the switch, or
- * forgets it. @return  false when that failed, which was said.
- */
-bool BeginHandover(bool back);
-
-/**
  * Brings the options of a bond on the switch to what its file says, while it goes on to work.
  * @return  whether they are so now; what is not was said.
  */

@@ -10,7 +10,6 @@
 
 #include "support/atomicfile.h"
 #include "support/runlock.h"
-#include "support/servicemanager.h"
 
 #include <cerrno>
 #include <cstring>
@@ -59,7 +58,7 @@ bool Start(const Request& request)
     const std::set<std::string> concerned = ConcernedBy(request);
     const bool held = IsHeld();
     // What ends a client's whole service ends this run, too, and a hold is what survives that.
-    if (!held && IsPartOfConversion() && SystemdRuns()) {
+    if (!held && IsPartOfConversion()) {
         (void)BeginHold(request);
     }
     const bool done = Reconcile(request);

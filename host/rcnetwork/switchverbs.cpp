@@ -14,14 +14,6 @@
 namespace vornhost {
 namespace {
 
-const SwitchPort* BondOn(const SwitchBridge& bridge)
-{
-    const auto found =
-        std::find_if(bridge.ports.begin(), bridge.ports.end(),
-                     [](const SwitchPort& port) { return port.bond && port.marked; });
-    return found == bridge.ports.end() ? nullptr : &*found;
-}
-
 bool Refuse(const std::string& text)
 {
     Say({Severity::kError, text});
@@ -73,39 +65,6 @@ bool KeepTags()
     return stage.lines.empty() || Apply(stage);
 }
 
-bool BeginHandover(bool back)
-{
-    Handover handover;
-    const auto inputs = back ? Read() : std::nullopt;
-    if (back && !inputs) {
-        return false;
-    }
-    for (const SwitchBridge& bridge :
-         back ? inputs->switchState.bridges : std::vector<SwitchBridge>()) {
-        const SwitchPort* own = bridge.FindPort(bridge.name);
-        const SwitchPort* bond = BondOn(bridge);
-        if (!bridge.marked) {
-            continue;
-        }
-        const std::string name = PlainOf(bridge.name);
-        std::vector<std::string> members;
-        if (bond != nullptr) {
-            members = Kinship(*inputs).LiveMembersOf(name);
-            const auto mode = bond->columns.find("lacp");
-            const bool lacp = mode != bond->columns.end() && mode->second != "off";
-            handover.bonds[name] = {members, bridge.hwaddr, lacp};
-        }
-        if (own != nullptr && own->tag) {
-            handover.tags[name] = *own->tag;
-            if (!members.empty()) {
-                handover.tags[members.front()] = *own->tag;
-            }
-        }
-    }
-    return SaveHandover(handover) ||
-           Refuse(std::string("cannot write ") + kHandoverPath + ": " + std::strerror(errno));
-}
-
 bool SetSwitchBond(const std::string& bridge)
 {
     const auto inputs = Read();
@@ -118,10 +77,10 @@ bool SetSwitchBond(const std::string& bridge)
         return Refuse("ifcfg-" + bridge + " is not the file of a bond on the switch");
     }
     const SwitchBridge* live = inputs->switchState.Find(bridge);
-    if (!inputs->switchState.running || live == nullptr || BondOn(*live) == nullptr) {
+    if (!inputs->switchState.running || live == nullptr || live->FindBond() == nullptr) {
         return Refuse(bridge + " is not on the switch, or no bond there");
     }
-    const SwitchPort& port = *BondOn(*live);
+    const SwitchPort& port = *live->FindBond();
     const auto former = inputs->formerBonds.find(PlainOf(bridge));
     const bool same =
         former != inputs->formerBonds.end() && former->second.bond.HasSlaves(file->slaveList);

@@ -218,6 +218,14 @@ const SwitchPort* SwitchBridge::FindPort(const std::string& port) const
     return found == ports.end() ? nullptr : &*found;
 }
 
+const SwitchPort* SwitchBridge::FindBond() const
+{
+    const auto found = std::find_if(ports.begin(), ports.end(), [](const SwitchPort& port) {
+        return port.bond && port.marked;
+    });
+    return found == ports.end() ? nullptr : &*found;
+}
+
 const SwitchPort* FindUplink(const SwitchBridge& bridge, const std::string& primary)
 {
     const SwitchPort* marked = nullptr;

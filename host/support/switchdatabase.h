@@ -66,6 +66,8 @@ struct SwitchBridge {
 
     bool operator==(const SwitchBridge&) const = default;
     const SwitchPort* FindPort(const std::string& port) const;
+    /** @return  the bond that the network program made there, null when there is none. */
+    const SwitchPort* FindBond() const;
 };
 
 /**

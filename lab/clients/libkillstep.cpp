@@ -1,9 +1,11 @@
 // Kills the program that it is loaded into (LD_PRELOAD) right before a chosen step of the library.
 //
 // A step is a call of one of the platform's functions below, counted from 1. KILL_AT is the number
-// of the step (0: none), KILL_LOG a file that receives the name of every step before it is taken.
+// of the step (0: none), KILL_LOG a file that receives a line for every step before it is taken:
+// its number, its name, and the milliseconds since the machine was started.
 #include <csignal>
 #include <cstdlib>
+#include <ctime>
 #include <dlfcn.h>
 #include <fcntl.h>
 #include <string>
@@ -34,7 +36,10 @@ void Note(const std::string& line)
 extern "C" void* LabStep(const char* name)
 {
     ++g_steps;
-    Note(std::to_string(g_steps) + " " + name + "\n");
+    timespec now{};
+    (void)::clock_gettime(CLOCK_BOOTTIME, &now);
+    const long milliseconds = now.tv_sec * 1000 + now.tv_nsec / 1'000'000;
+    Note(std::to_string(g_steps) + " " + name + " " + std::to_string(milliseconds) + "\n");
     const char* const killAt = std::getenv("KILL_AT");
     if (killAt != nullptr && std::atoi(killAt) == g_steps) {
         ::raise(SIGKILL);

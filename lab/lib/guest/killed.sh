@@ -31,7 +31,7 @@ steps_taken()
 # The name of the step before which a client was killed.
 step_name()
 {
-    tail -n 1 "$lab_steps" | sed -e 's/^[0-9]* //' -e 's/.*ExecHook.*/ExecHook/'
+    tail -n 1 "$lab_steps" | sed -e 's/^[0-9]* //' -e 's/ .*//' -e 's/.*ExecHook.*/ExecHook/'
 }
 
 # What must hold as soon as nothing runs for a killed client any more.
@@ -103,4 +103,27 @@ killed_during()
     rm "$lab_out/gate-$verb"
     wait_until 30 client_is_gone
     remove_gate
+}
+
+# killed_with_all_after SECONDS COMMAND...: runs a client and kills it so long after its beginning,
+# and with it every program that works for it; not what waits in the background for its end.
+killed_with_all_after()
+{
+    local seconds="$1" client pid
+    shift
+    "$@" >"$lab_out/client-output" 2>&1 &
+    client=$!
+    pause "$seconds"
+    for pid in "$client" $(processes_named vornrun) $(processes_named rc.network); do
+        if ! works_in_background "$pid"; then
+            kill -KILL "$pid" 2>/dev/null || true # it may have ended by now
+        fi
+    done
+    wait "$client" 2>/dev/null || true
+}
+
+# True for a process of the network program that waits for the end of a conversion.
+works_in_background()
+{
+    tr '\0' ' ' <"/proc/$1/cmdline" 2>/dev/null | grep -Eq '^[^ ]*rc\.network (holder|retry) '
 }

@@ -30,6 +30,10 @@
 . /lab/roundtrip.sh
 # shellcheck source=killed.sh
 . /lab/killed.sh
+# shellcheck source=points.sh
+. /lab/points.sh
+# shellcheck source=powercut.sh
+. /lab/powercut.sh
 
 # lab_main case|here: what the guest is for. The small machine's outside world is made here; the
 # other's is there since before its first program.
@@ -79,7 +83,7 @@ lab_run_case()
         set -eEu -o pipefail
         trap 'report_ended_at "$?" "${BASH_SOURCE[0]}" "$LINENO" "$BASH_COMMAND"' ERR
         [ ! -e "$lab_out/failure" ] || exit 1
-        if machine_has_systemd; then
+        if machine_has_disk; then
             # shellcheck source=/dev/null
             . /lab/case/run.sh
             phase_run

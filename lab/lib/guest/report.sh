@@ -7,6 +7,12 @@ machine_has_systemd()
     [ -d /lab/machine ]
 }
 
+# True where a disk keeps what a case left before a reboot.
+machine_has_disk()
+{
+    machine_has_systemd || [ -e /lab/case/disk ]
+}
+
 # sampled EVERY ALL: prints the first unless everything is asked for, which is the second.
 sampled()
 {
@@ -17,9 +23,17 @@ sampled()
     fi
 }
 
+# points FEW MANY: prints how many points to spread: as many as were asked for, FEW in a sample.
+points()
+{
+    local asked
+    asked="$(sed -n 's/.* lab\.points=\([0-9]*\).*/\1/p' /proc/cmdline)"
+    echo "${asked:-$(sampled "$1" "$2")}"
+}
+
 # On the disk where there is one: what a case left before a reboot is there after it.
 lab_out=/run/lab
-if machine_has_systemd; then
+if machine_has_disk; then
     lab_out=/lab/out
 fi
 

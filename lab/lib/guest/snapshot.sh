@@ -6,6 +6,7 @@ snapshot()
 {
     local folder="$lab_out/snapshots/$1"
     wait_until 10 addresses_settled
+    wait_until 10 vlans_settled
     rm -rf "$folder"
     mkdir -p "$folder"
     snapshot_links >"$folder/links"
@@ -34,6 +35,12 @@ snapshot_network()
 addresses_settled()
 {
     [ -z "$(ip -6 -oneline address show tentative)" ]
+}
+
+# The kernel tells up to a second later that a VLAN made anew is up.
+vlans_settled()
+{
+    [ -z "$(ip -oneline link show type vlan | grep ' state UNKNOWN ')" ]
 }
 
 # Numbers of interfaces and aggregates change when a device is made anew, failures of a cable are

@@ -53,8 +53,8 @@ topology_build()
         esac
     done </lab/topology/topology
 
-    # A machine that has a disk got them once, with its manager.
-    if [ -d /lab/topology/host ] && ! machine_has_systemd; then
+    # A machine that has a disk gets them once, one with systemd with its manager.
+    if [ -d /lab/topology/host ] && ! machine_has_systemd && [ ! -e /lab/state/boots ]; then
         cp -a /lab/topology/host/. /
     fi
 }

@@ -12,13 +12,15 @@ lab_case_machine()
     fi
 }
 
-# The disk that a case begins with: fresh or ready; empty for a machine without.
+# The disk that a case begins with: fresh, ready or empty; nothing for a machine without.
 lab_case_disk()
 {
     if [[ -e $lab_source/cases/$1/fresh ]]; then
         echo fresh
     elif [[ $(lab_case_machine "$1") == systemd ]]; then
         echo ready
+    elif [[ -e $lab_source/cases/$1/disk ]]; then
+        echo empty
     fi
 }
 
@@ -53,7 +55,8 @@ lab_case_deadline()
     fi
 }
 
-# Words for the guests' kernel line: lab.daily has long cases take samples.
+# Words for the guests' kernel line: lab.daily has long cases take samples, lab.points=N has those
+# that spread kills and power cuts over a conversion spread so many.
 lab_words=''
 
 # Runs one case and leaves in its results folder: console, report, syslog, figures, verdict and
@@ -82,13 +85,14 @@ lab_run_case()
 # Runs a case's guest, again after each reboot that the case asked for.
 lab_run_guest()
 {
-    local name=$1 machine=$2 topology=$3 results=$lab_results/$1 lines deadline left boots=0
+    local name=$1 machine=$2 topology=$3 results=$lab_results/$1 disk lines deadline left boots=0
     # The deadline is of this machine's time: it ends a guest whose own clock may stand still.
     deadline=$(($(date +%s) + $(lab_case_deadline "$name")))
     lab_make_guest_image "$results/guest.cpio" "$machine" "$topology" \
         "$lab_source/cases/$name" ''
-    if [[ $machine == systemd ]]; then
-        lab_make_guest_disk "$results/disk" "$(lab_case_disk "$name")"
+    disk=$(lab_case_disk "$name")
+    if [[ -n $disk ]]; then
+        lab_make_guest_disk "$results/disk" "$disk"
     fi
     mapfile -t lines < <(lab_line "$results/console"; lab_line "$results/report";
         lab_line "$results/results.tar")

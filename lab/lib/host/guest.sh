@@ -9,22 +9,31 @@ lab_qemu_arguments()
     printf '%s\n' -machine pc,accel=tcg,usb=off -cpu Nehalem,+rdrand -smp 1 \
         -icount shift=0,sleep=off,align=off -rtc base=2030-01-01,clock=vm -seed 1 \
         -nodefaults -display none -no-reboot -no-user-config -monitor none
+    local memory=768
     if [[ $1 == systemd ]]; then
-        printf '%s\n' -m 1024,slots=1,maxmem=4G -machine nvdimm=on \
+        memory=1024
+    fi
+    if [[ -f $2 ]]; then
+        printf '%s\n' -m "$memory,slots=1,maxmem=4G" -machine nvdimm=on \
             -object "memory-backend-file,id=disk,mem-path=$2,size=$(stat -c %s "$2"),share=on" \
             -device nvdimm,memdev=disk
     else
-        printf '%s\n' -m 768
+        printf '%s\n' -m "$memory"
     fi
 }
 
 # lab_make_guest_disk FILE KIND: a disk of the guest's own, like the one that it begins with, fresh
-# or ready. To the guest it is memory: for an answer of a real disk's it would have to wait while its
+# or ready, or an empty one. To the guest it is memory: for an answer of a real disk's it would have to wait while its
 # clock jumps ahead, by minutes when this machine is busy.
 lab_make_guest_disk()
 {
     local base=lab_disk_$2
-    cp --sparse=always "${!base}" "$1"
+    if [[ $2 == empty ]]; then
+        rm -f "$1"
+        mke2fs -q -t ext4 -m 0 -E lazy_itable_init=1,lazy_journal_init=1 "$1" 128M
+    else
+        cp --sparse=always "${!base}" "$1"
+    fi
 }
 
 # Cards for the topology's virtio ports: each is connected to one of the outside's through a hub.
@@ -70,7 +79,7 @@ lab_line()
 }
 
 # A guest on this terminal: $1 machine, $2 topology, $3 case folder or empty, $4 network manager or
-# empty, $5 its disk, fresh or ready. A guest with a disk is started again when it restarts.
+# empty, $5 its disk: fresh, ready, empty, or none. A guest with a disk is started again when it restarts.
 lab_stay()
 {
     local folder lines
@@ -78,14 +87,14 @@ lab_stay()
     # shellcheck disable=SC2064 # the folder's name as it is now
     trap "rm -rf '$folder'" EXIT
     lab_make_guest_image "$folder/image" "$1" "$2" "$3" "$4"
-    if [[ $1 == systemd ]]; then
+    if [[ -n $5 ]]; then
         lab_make_guest_disk "$folder/disk" "$5"
     fi
     mapfile -t lines < <(lab_line "$folder/report")
     while true; do
         (lab_start_guest 0 "$1" "$2" "$folder/image" "$folder/disk" lab.here -serial mon:stdio \
             "${lines[@]}" -serial null) || true
-        if [[ $1 != systemd ]] || grep -q '^lab-left' "$folder/report"; then
+        if [[ -z $5 ]] || grep -q '^lab-left' "$folder/report"; then
             return
         fi
     done

@@ -18,7 +18,7 @@ lab_programs=(
 
 # What the kernel needs for the lab, in any order: what they need in turn is found below.
 lab_modules=(openvswitch bonding 8021q bridge dummy veth virtio_net virtio_pci)
-lab_loader_modules=(nfit nd_pmem ext4)
+lab_disk_modules=(nfit nd_pmem ext4)
 
 lab_busybox()
 {
@@ -97,7 +97,7 @@ lab_make_loader()
     local root=$1
     mkdir -p "$root"/{bin,dev,proc,sys,root}
     cp "$lab_debian/bin/busybox" "$root/bin/"
-    lab_install_modules "$root/modules" "${lab_loader_modules[@]}"
+    lab_install_modules "$root/modules" "${lab_disk_modules[@]}"
 }
 
 lab_make_system()
@@ -148,6 +148,7 @@ lab_make_system()
     : >"$root/etc/resolv.conf"
     printf 'appliance\n' >"$root/etc/hostname"
     lab_install_modules "$root/lab/modules" "${lab_modules[@]}"
+    lab_install_modules "$root/lab/disk-modules" "${lab_disk_modules[@]}"
 }
 
 # What the repository installs, and the libraries of Debian's that it needs.

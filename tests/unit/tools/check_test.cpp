@@ -197,6 +197,31 @@ TEST(HalfStates, ATagOfAFileIsInTheSwitch)
     EXPECT_THAT(FindHalfStates(truths), IsEmpty());
 }
 
+TEST(HalfStates, WhatAConversionTookApartIsSomewhereAgain)
+{
+    HostTruths truths = Plain();
+    truths.converted = {{{"bond7", {"802.3ad", {"eth1", "eth2"}}}}, {{"eth3", 30}, {"bond7", 5}}};
+    EXPECT_THAT(
+        FindHalfStates(truths),
+        ElementsAre(HalfState{kLostBond, "bond7",
+                              "is a bond that a conversion which was cut short has taken apart"},
+                    HalfState{kLostVlan, "eth3",
+                              "had the VLAN 30, which a conversion that was cut short has taken "
+                              "from it"},
+                    HalfState{kLostVlan, "bond7",
+                              "had the VLAN 5, which a conversion that was cut short has taken "
+                              "from it"}));
+
+    AddFile(truths, "bond7", "DEVICE=bond7\nBONDING_OPTS=\"mode=802.3ad\"\n");
+    AddFile(truths, "eth3.30", "DEVICE=eth3.30\nVLAN=yes\nPHYSDEV=eth3\n");
+    AddFile(truths, "bond7.5", "DEVICE=bond7.5\nVLAN=yes\nPHYSDEV=bond7\n");
+    EXPECT_THAT(FindHalfStates(truths), IsEmpty()) << "they are the kernel's again";
+
+    truths = OnTheSwitch();
+    truths.converted = {{{"bond0", {"802.3ad", {"eth1", "eth2"}}}}, {{"eth0", 10}}};
+    EXPECT_THAT(FindHalfStates(truths), IsEmpty()) << "they are the switch's";
+}
+
 class Check : public unit::OnAHost {
 protected:
     Check()
@@ -292,6 +317,25 @@ TEST(PlanRepair, StartsTheNetworkAndConvertsWhatWasCutShort)
     EXPECT_THAT(plan(truths), ElementsAre(vornovsctl::RepairStep{Kind::kRemoveFile, "/a"}));
 }
 
+TEST(PlanRepair, BuildsWhatWasTakenApartWhileNothingIsOnTheSwitch)
+{
+    using Kind = vornovsctl::RepairStep::Kind;
+    using Step = vornovsctl::RepairStep;
+    const vornhost::ConvertedBond bond{"802.3ad", {"eth1", "eth2"}};
+    HostTruths truths = Plain();
+    truths.converted = {{{"bond7", bond}}, {{"bond7", 5}}};
+    EXPECT_THAT(PlanRepair(truths, FindHalfStates(truths)),
+                ElementsAre(Step{Kind::kStartNetwork, ""}, Step{Kind::kBuildBond, "bond7", bond},
+                            Step{Kind::kMakeVlan, "bond7", {}, 5}));
+
+    truths.host.clients = {"apps", "vornovsctl-repair"};
+    EXPECT_THAT(PlanRepair(truths, FindHalfStates(truths)),
+                ElementsAre(Step{Kind::kStartNetwork, ""},
+                            Step{Kind::kUnregister, "vornovsctl-repair"},
+                            Step{Kind::kUnregister, "apps"}, Step{Kind::kBuildBond, "bond7", bond},
+                            Step{Kind::kMakeVlan, "bond7", {}, 5}, Step{Kind::kRegister, "apps"}));
+}
+
 class Repair : public Check {
 protected:
     static constexpr char kStray[] = "/etc/sysconfig/network-scripts/.vornovs-a1B2c3";
@@ -363,6 +407,48 @@ TEST_F(Repair, KeepsClientsRegistered)
     EXPECT_EQ(Ctl({"repair"}).exitStatus, 0);
     EXPECT_EQ(Host().clients, (std::set<std::string>{"apps", "vms"}));
     EXPECT_TRUE(std::filesystem::exists("/etc/sysconfig/network-scripts/ifcfg-ovs_eth0"));
+}
+
+TEST_F(Repair, BuildsABondAndMakesAVlanUnderTheLibrarysLock)
+{
+    WriteInterfaceFile("eth0", "DEVICE=eth0\n");
+    Host().devices = {"eth0"};
+    ASSERT_TRUE(
+        (vornhost::ConversionRecord{{{"bond0", {"802.3ad", {"eth1", "eth2"}}}}, {{"eth0", 30}}}
+             .Save()));
+    Host().act = [](unit::FakeHost& host) {
+        if (host.calls.back().starts_with("VORNNetLinkAggrSet")) {
+            WriteInterfaceFile("bond0", "DEVICE=bond0\nBONDING_OPTS=\"mode=802.3ad\"\n");
+        } else if (host.calls.back().starts_with("VLIBNetVlanCreate")) {
+            WriteInterfaceFile("eth0.30", "DEVICE=eth0.30\nVLAN=yes\nPHYSDEV=eth0\n");
+        }
+        return 0;
+    };
+    EXPECT_EQ(Ctl({"repair"}),
+              unit::Done("bond0 is a bond that a conversion which was cut short has taken apart.\n"
+                         "eth0 had the VLAN 30, which a conversion that was cut short has taken "
+                         "from it.\n"
+                         "To do:\n"
+                         "  make the live network what the files say\n"
+                         "  build bond0 of eth1, eth2 again\n"
+                         "  make the VLAN 30 of eth0 again\n"
+                         "Everything fits together.\n"));
+    const std::string lock = "VLIBCFileLockTimeByFile /tmp/ovs_config.lock 1 5";
+    const std::string unlock = "VLIBCFileUnlockByFile 7";
+    EXPECT_THAT(Host().calls,
+                ElementsAre("StartNetwork", lock, "VORNNetLinkAggrSet 2 bond0 eth1 eth2", unlock,
+                            lock, "VLIBNetVlanCreate eth0 30", unlock));
+    EXPECT_TRUE(vornhost::ConversionRecord{}.Save());
+}
+
+TEST_F(Repair, BuildsNothingWhileSomebodyElseHasTheLock)
+{
+    ASSERT_TRUE(
+        (vornhost::ConversionRecord{{{"bond0", {"802.3ad", {"eth1", "eth2"}}}}, {}}.Save()));
+    Host().lockResult = -1;
+    EXPECT_EQ(Ctl({"repair"}).exitStatus, 18);
+    EXPECT_THAT(Host().calls, testing::Not(testing::Contains(testing::StartsWith("VORNNet"))));
+    EXPECT_TRUE(vornhost::ConversionRecord{}.Save());
 }
 
 TEST_F(Repair, TellsWhatItCouldNotMend)

@@ -8,6 +8,9 @@
 #include <fstream>
 #include <sys/syscall.h>
 #include <unistd.h>
+#include <vornplatform/core.h>
+#include <vornplatform/netsdk.h>
+#include <vornplatform/sdk.h>
 
 namespace unit {
 
@@ -77,6 +80,43 @@ void PlayUser(std::optional<unsigned> user)
 extern "C" uid_t geteuid() noexcept
 {
     return unit::User().value_or(static_cast<unsigned>(syscall(SYS_geteuid)));
+}
+
+int VLIBCFileLockTimeByFile(const char* path, int mode, int seconds, int* handle)
+{
+    *handle = 7;
+    unit::Host().calls.push_back(unit::WithNames(
+        "VLIBCFileLockTimeByFile", {path, std::to_string(mode), std::to_string(seconds)}));
+    return unit::Host().lockResult;
+}
+
+int VLIBCFileUnlockByFile(int handle)
+{
+    unit::Host().calls.push_back("VLIBCFileUnlockByFile " + std::to_string(handle));
+    return 0;
+}
+
+int VORNNetLinkAggrOptSlsaveAdd(VORNLINKAGGROPT* opt, const char* slave)
+{
+    std::string(slave).copy(opt->rgszSlave[opt->nSlave++], VORN_NAME_SIZE - 1);
+    return 0;
+}
+
+int VORNNetLinkAggrSet(const VORNLINKAGGROPT* opt)
+{
+    const std::vector<std::string> slaves(opt->rgszSlave, opt->rgszSlave + opt->nSlave);
+    return unit::Act(unit::WithNames(
+        "VORNNetLinkAggrSet " + std::to_string(opt->mode) + ' ' + opt->szMaster, slaves));
+}
+
+int VORNNetIFGetIPConfig(const char* name, VORNNETIPCONFIG* /*ipConfig*/)
+{
+    return unit::Host().devices.contains(name) ? 0 : -1;
+}
+
+int VLIBNetVlanCreate(const char* parent, int vlanId, const VORNNETIPCONFIG* /*ipConfig*/)
+{
+    return unit::Act(unit::WithNames("VLIBNetVlanCreate", {parent, std::to_string(vlanId)}));
 }
 
 namespace VORN::OVS {

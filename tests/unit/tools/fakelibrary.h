@@ -29,6 +29,7 @@ struct FakeHost {
     std::map<std::string, FakeBond> bonds;
     std::map<std::string, int> tags; /**< of the switch's ports; 0: no tag */
     int freeNameResult = 0;
+    int lockResult = 0;
 
     /** What the bridges carry: ports by bridge. The database does not answer without it. */
     std::optional<std::map<std::string, std::set<std::string>>> ports;

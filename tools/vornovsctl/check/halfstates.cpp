@@ -37,6 +37,7 @@ public:
             LookAtFile(file);
         }
         LookAtClients();
+        LookAtRecord();
         for (const std::string& path : m_truths.strays) {
             Add(HalfStateClass::kStrayFile, path, "is left over from a writer that was killed");
         }
@@ -65,12 +66,19 @@ private:
     /** Whether the switch answered, or does not run and so has nothing. */
     bool IsSwitchKnown() const { return !m_host.switchRuns || m_host.bridges.has_value(); }
 
-    bool HasBridge(const std::string& name) const
+    const Bridge* FindBridge(const std::string& name) const
     {
-        const auto bridges = m_host.bridges.value_or(std::vector<Bridge>());
-        return std::any_of(bridges.begin(), bridges.end(),
-                           [&](const Bridge& bridge) { return bridge.name == name; });
+        if (m_host.bridges) {
+            for (const Bridge& bridge : *m_host.bridges) {
+                if (bridge.name == name) {
+                    return &bridge;
+                }
+            }
+        }
+        return nullptr;
     }
+
+    bool HasBridge(const std::string& name) const { return FindBridge(name) != nullptr; }
 
     void LookAtBridge(const Bridge& bridge)
     {
@@ -180,6 +188,52 @@ private:
         }
     }
 
+    void LookAtRecord()
+    {
+        for (const auto& [name, bond] : m_truths.converted.bonds) {
+            if (IsSwitchKnown() && !HasBond(name)) {
+                Add(HalfStateClass::kLostBond, name,
+                    "is a bond that a conversion which was cut short has taken apart");
+            }
+        }
+        for (const vornhost::FileVlan& vlan : m_truths.converted.vlans) {
+            if (IsSwitchKnown() && !HasVlan(vlan)) {
+                Add(HalfStateClass::kLostVlan, vlan.parent,
+                    "had the VLAN " + std::to_string(vlan.id) +
+                        ", which a conversion that was cut short has taken from it");
+            }
+        }
+    }
+
+    /** Whether there is such a bond: of the kernel, of the switch, or in the files of either. */
+    bool HasBond(const std::string& name) const
+    {
+        const Device* device = m_host.Find(name);
+        const FileTruth* plain = m_truths.FindFile(name);
+        const FileTruth* bridge = m_truths.FindFile(BridgeOf(name));
+        const Bridge* live = FindBridge(BridgeOf(name));
+        return (device != nullptr && device->bond) || (plain != nullptr && plain->content.bond) ||
+               (bridge != nullptr && !bridge->content.slaveList.empty()) ||
+               (live != nullptr && std::any_of(live->ports.begin(), live->ports.end(),
+                                               [](const Port& port) { return port.bond; }));
+    }
+
+    /** The same for a VLAN. */
+    bool HasVlan(const vornhost::FileVlan& vlan) const
+    {
+        const int id = static_cast<int>(vlan.id);
+        const std::string name = BridgeOf(vlan.parent);
+        const FileTruth* file = m_truths.FindFile(name);
+        const Bridge* bridge = FindBridge(name);
+        return (file != nullptr && file->tag == std::to_string(id)) ||
+               (bridge != nullptr && bridge->tag == id) ||
+               std::any_of(m_truths.files.begin(), m_truths.files.end(),
+                           [&](const FileTruth& each) { return each.content.vlan == vlan; }) ||
+               std::any_of(m_host.devices.begin(), m_host.devices.end(), [&](const Device& each) {
+                   return each.vlan == id && (each.parent == vlan.parent || each.parent == name);
+               });
+    }
+
     const HostTruths& m_truths;
     const HostModel& m_host;
     std::vector<HalfState> m_found;
@@ -211,6 +265,10 @@ const char* WordOf(HalfStateClass kind)
         return "bond-of-one";
     case HalfStateClass::kLostTag:
         return "lost-tag";
+    case HalfStateClass::kLostBond:
+        return "lost-bond";
+    case HalfStateClass::kLostVlan:
+        return "lost-vlan";
     case HalfStateClass::kStrayFile:
         return "stray-file";
     }

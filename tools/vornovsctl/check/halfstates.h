@@ -25,6 +25,8 @@ enum class HalfStateClass {
     kOnSwitchButUnregistered, /**< nobody is registered, and something is on the switch */
     kBondOfOne,               /**< a bond with a single member, or with none */
     kLostTag,                 /**< a tag that is in the file and not in the switch */
+    kLostBond,                /**< a bond that a conversion took apart and did not build again */
+    kLostVlan,                /**< the same for a VLAN */
     kStrayFile,               /**< what a writer left that was killed */
 };
 
@@ -36,7 +38,7 @@ struct HalfState {
     bool operator==(const HalfState&) const = default;
 };
 
-/** The exit status that tells of the class: 10 to 18. */
+/** The exit status that tells of the class: 10 to 20. */
 int ExitStatusOf(HalfStateClass kind);
 
 /** The class as one word. */

@@ -6,6 +6,7 @@
 #include <filesystem>
 #include <string_view>
 #include <system_error>
+#include <utility>
 
 namespace vornovsctl {
 
@@ -97,6 +98,11 @@ HostTruths ReadTruths()
     truths.host = ReadHost();
     ReadConfiguration(truths);
     ReadLists(truths);
+    if (auto record = vornhost::ConversionRecord::Load()) {
+        truths.converted = std::move(*record);
+    } else {
+        truths.host.unread.push_back(std::string(vornhost::kConversionPath) + " cannot be read");
+    }
     return truths;
 }
 

@@ -1,12 +1,13 @@
 /**
  * The four places that say how the host's network is: the library's lists, the interfaces' files,
- * the switch and the kernel.
+ * the switch and the kernel; and what a conversion that was cut short has left behind.
  */
 #ifndef VORNOVSCTL_CHECK_HOSTTRUTHS_H
 #define VORNOVSCTL_CHECK_HOSTTRUTHS_H
 
 #include "show/hostmodel.h"
 
+#include <support/conversionrecord.h>
 #include <support/interfacefile.h>
 #include <support/keyvaluefile.h>
 
@@ -29,7 +30,8 @@ struct FileTruth {
 struct HostTruths {
     HostModel host; /**< the lists, the switch and the kernel */
     std::vector<FileTruth> files;
-    std::vector<std::string> strays; /**< paths of what a writer left that was killed */
+    std::vector<std::string> strays;      /**< paths of what a writer left that was killed */
+    vornhost::ConversionRecord converted; /**< by a conversion that has not ended */
 
     const FileTruth* FindFile(const std::string& name) const;
 };

@@ -2,6 +2,7 @@
 
 #include "wording.h"
 
+#include <support/interfacevalues.h>
 #include <vornovs/vornovs.h>
 
 #include <algorithm>
@@ -9,6 +10,9 @@
 #include <filesystem>
 #include <system_error>
 #include <thread>
+#include <vornplatform/core.h>
+#include <vornplatform/netsdk.h>
+#include <vornplatform/sdk.h>
 
 namespace vornovsctl {
 
@@ -27,9 +31,10 @@ bool Has(const std::vector<HalfState>& found, std::initializer_list<HalfStateCla
     });
 }
 
-/** Every client goes and comes back, so that the library converts the whole host both ways. */
-void AddConversions(Names clients, std::vector<RepairStep>& plan)
+/** Takes the host off the switch: every client goes. */
+void AddWayOff(const HostTruths& truths, std::vector<RepairStep>& plan)
 {
+    Names clients = truths.host.clients.value_or(Names());
     const bool begun = clients.erase(kRepairClient) > 0;
     if (clients.empty() && !begun) {
         plan.push_back({RepairStep::Kind::kRegister, kRepairClient});
@@ -37,10 +42,85 @@ void AddConversions(Names clients, std::vector<RepairStep>& plan)
     if (clients.empty() || begun) {
         plan.push_back({RepairStep::Kind::kUnregister, kRepairClient});
     }
-    for (const auto kind : {RepairStep::Kind::kUnregister, RepairStep::Kind::kRegister}) {
-        for (const std::string& client : clients) {
-            plan.push_back({kind, client});
+    for (const std::string& client : clients) {
+        plan.push_back({RepairStep::Kind::kUnregister, client});
+    }
+}
+
+/** A VLAN may stand on a bond. */
+void AddLost(const HostTruths& truths, const std::vector<HalfState>& found,
+             std::vector<RepairStep>& plan)
+{
+    for (const HalfState& each : found) {
+        if (each.kind == HalfStateClass::kLostBond) {
+            plan.push_back({RepairStep::Kind::kBuildBond, each.subject,
+                            truths.converted.bonds.at(each.subject)});
         }
+    }
+    for (const vornhost::FileVlan& vlan : truths.converted.vlans) {
+        const bool lost = std::any_of(found.begin(), found.end(), [&](const HalfState& each) {
+            return each.kind == HalfStateClass::kLostVlan && each.subject == vlan.parent;
+        });
+        if (lost) {
+            plan.push_back({RepairStep::Kind::kMakeVlan, vlan.parent, {}, vlan.id});
+        }
+    }
+}
+
+void AddWayBack(const HostTruths& truths, std::vector<RepairStep>& plan)
+{
+    for (const std::string& client : truths.host.clients.value_or(Names())) {
+        if (client != kRepairClient) {
+            plan.push_back({RepairStep::Kind::kRegister, client});
+        }
+    }
+}
+
+/** The library's own lock: nobody converts the host meanwhile. */
+class ConfigurationLock {
+public:
+    ConfigurationLock()
+    {
+        if (VLIBCFileLockTimeByFile("/tmp/ovs_config.lock", 1, kLockSeconds, &m_handle) < 0) {
+            m_handle = -1;
+        }
+    }
+    ~ConfigurationLock()
+    {
+        if (m_handle != -1) {
+            (void)VLIBCFileUnlockByFile(m_handle);
+        }
+    }
+    ConfigurationLock(const ConfigurationLock&) = delete;
+    ConfigurationLock& operator=(const ConfigurationLock&) = delete;
+    explicit operator bool() const { return m_handle != -1; }
+
+private:
+    static constexpr int kLockSeconds = 5;
+    int m_handle = -1;
+};
+
+/** The platform remembers the rest of what the bond was. */
+void BuildBond(const std::string& name, const vornhost::ConvertedBond& bond)
+{
+    VORNLINKAGGROPT record{};
+    name.copy(record.szMaster, VORN_NAME_SIZE - 1);
+    record.mode = VORN::OVS::StrToMode(bond.mode.c_str());
+    for (const std::string& slave : bond.slaves) {
+        (void)VORNNetLinkAggrOptSlsaveAdd(&record, slave.c_str());
+    }
+    const ConfigurationLock lock;
+    if (lock && record.mode != VORN_LINK_AGGR_NONE) {
+        (void)VORNNetLinkAggrSet(&record);
+    }
+}
+
+void MakeVlan(const std::string& parent, unsigned id)
+{
+    VORNNETIPCONFIG ipConfig{};
+    const ConfigurationLock lock;
+    if (lock && VORNNetIFGetIPConfig(parent.c_str(), &ipConfig) >= 0) {
+        (void)VLIBNetVlanCreate(parent.c_str(), static_cast<int>(id), &ipConfig);
     }
 }
 
@@ -68,9 +148,16 @@ std::vector<RepairStep> PlanRepair(const HostTruths& truths, const std::vector<H
     if (!strayOnly) {
         plan.push_back({RepairStep::Kind::kStartNetwork, ""});
     }
+    const bool lost = Has(found, {HalfStateClass::kLostBond, HalfStateClass::kLostVlan});
+    const bool registered = truths.host.clients && !truths.host.clients->empty();
     if (Has(found, {HalfStateClass::kUnfinishedFile, HalfStateClass::kRegisteredButPlain,
-                    HalfStateClass::kOnSwitchButUnregistered})) {
-        AddConversions(truths.host.clients.value_or(Names()), plan);
+                    HalfStateClass::kOnSwitchButUnregistered}) ||
+        (lost && registered)) {
+        AddWayOff(truths, plan);
+        AddLost(truths, found, plan);
+        AddWayBack(truths, plan);
+    } else if (lost) {
+        AddLost(truths, found, plan);
     }
     for (const std::string& path : truths.strays) {
         plan.push_back({RepairStep::Kind::kRemoveFile, path});
@@ -85,6 +172,11 @@ std::string TextOf(const RepairStep& step)
         return "make the live network what the files say";
     case RepairStep::Kind::kUnregister:
         return "unregister " + Quoted(step.subject);
+    case RepairStep::Kind::kBuildBond:
+        return "build " + step.subject + " of " + vornhost::Joined(step.bond.slaves, ", ") +
+               " again";
+    case RepairStep::Kind::kMakeVlan:
+        return "make the VLAN " + std::to_string(step.vlan) + " of " + step.subject + " again";
     case RepairStep::Kind::kRegister:
         return "register " + Quoted(step.subject);
     case RepairStep::Kind::kRemoveFile:
@@ -101,6 +193,12 @@ void TakeStep(const RepairStep& step)
         break;
     case RepairStep::Kind::kUnregister:
         (void)VORN::OVS::UnRegister(step.subject, {});
+        break;
+    case RepairStep::Kind::kBuildBond:
+        BuildBond(step.subject, step.bond);
+        break;
+    case RepairStep::Kind::kMakeVlan:
+        MakeVlan(step.subject, step.vlan);
         break;
     case RepairStep::Kind::kRegister:
         (void)VORN::OVS::Register(step.subject, {});

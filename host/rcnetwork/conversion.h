@@ -1,0 +1,38 @@
+/**
+ * What the network program does around a conversion of the host to the switch or back.
+ */
+#ifndef VORNHOST_RCNETWORK_CONVERSION_H
+#define VORNHOST_RCNETWORK_CONVERSION_H
+
+#include "plan.h"
+
+#include "support/conversionrecord.h"
+
+#include <optional>
+#include <string>
+
+namespace vornhost {
+
+enum class ConversionStage {
+    kToSwitch, ///< A conversion to the switch begins: "create".
+    kToPlain,  ///< One to plain networking begins: "delete".
+    kDone      ///< It has ended as it should.
+};
+
+/** @return  nothing when there is no stage of that name. */
+std::optional<ConversionStage> FindStage(const std::string& name);
+
+/**
+ * Writes down at the beginning what a conversion is going to take apart: for its own programs what
+ * the switch holds, and for whoever mends the host if it is cut short its bonds and VLANs. Of these
+ * only what the host has lost is left at the end. The caller holds the lock of the network.
+ * @return  false when that failed, which was said.
+ */
+bool MindConversion(ConversionStage stage);
+
+/** @return  the bonds and VLANs that the host has now, on the switch or off it. */
+ConversionRecord BondsAndVlansOf(const Inputs& inputs);
+
+} // namespace vornhost
+
+#endif

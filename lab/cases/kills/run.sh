@@ -1,0 +1,26 @@
+# shellcheck shell=bash disable=SC2154,SC2034 # variables of the guest's other files
+
+worst=0
+
+# Nothing of the network program waits or works any more.
+network_rests()
+{
+    no_process_named rc.network
+}
+
+count="$(points 10 40)"
+remember_plain
+points_spread "$count"
+while points_next; do
+    points_prepare
+    step "Killed $point_seconds s after the beginning of $point_verb"
+    killed_with_all_after "$point_seconds" vornovsctl "$point_verb" alpha
+    expect_reachable 120
+    wait_until 120 network_rests
+    worst=$((reachable_after > worst ? reachable_after : worst))
+    expect_reachable 1
+    expect_safe_after_kill
+    expect_way_home killed
+done
+figure "kills" "$count" times
+figure "reachable" "$worst" "hundredths of a second after a kill at most"

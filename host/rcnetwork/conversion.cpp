@@ -65,18 +65,8 @@ bool MindRecord(const Inputs& inputs, ConversionStage stage)
         return true; // the host is reset: whatever goes then is meant to go
     }
     const auto former = ConversionRecord::Load();
-    ConversionRecord record = BondsAndVlansOf(inputs);
-    if (stage == ConversionStage::kDone) {
-        ConversionRecord lost = former.value_or(ConversionRecord{});
-        std::erase_if(lost.bonds,
-                      [&](const auto& entry) { return record.bonds.contains(entry.first); });
-        std::erase_if(lost.vlans,
-                      [&](const FileVlan& vlan) { return Contains(record.vlans, vlan); });
-        record = std::move(lost);
-    } else if (former) {
-        // A conversion that was cut short has taken these apart, and nobody has built them again.
-        record.Add(*former);
-    }
+    const ConversionRecord record =
+        RecordAt(stage, BondsAndVlansOf(inputs), former.value_or(ConversionRecord{}));
     return record == former || record.Save();
 }
 
@@ -118,6 +108,19 @@ bool MindConversion(ConversionStage stage)
     }
     const bool back = stage == ConversionStage::kToPlain;
     return Check(SaveHandover(back ? HandoverOf(*inputs) : Handover{}), kHandoverPath) && recorded;
+}
+
+ConversionRecord RecordAt(ConversionStage stage, ConversionRecord now,
+                          const ConversionRecord& former)
+{
+    if (stage != ConversionStage::kDone) {
+        now.Add(former);
+        return now;
+    }
+    ConversionRecord lost = former;
+    std::erase_if(lost.bonds, [&](const auto& entry) { return now.bonds.contains(entry.first); });
+    std::erase_if(lost.vlans, [&](const FileVlan& vlan) { return Contains(now.vlans, vlan); });
+    return lost;
 }
 
 ConversionRecord BondsAndVlansOf(const Inputs& inputs)

@@ -33,6 +33,14 @@ bool MindConversion(ConversionStage stage);
 /** @return  the bonds and VLANs that the host has now, on the switch or off it. */
 ConversionRecord BondsAndVlansOf(const Inputs& inputs);
 
+/**
+ * Tells what is to be on disk at a stage: at the beginning all that the host has, with what an
+ * earlier conversion that was cut short took apart and nobody has built again; at the end only what
+ * the host has lost.
+ */
+ConversionRecord RecordAt(ConversionStage stage, ConversionRecord now,
+                          const ConversionRecord& former);
+
 } // namespace vornhost
 
 #endif

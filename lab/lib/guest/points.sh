@@ -1,4 +1,4 @@
-# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
+# shellcheck shell=bash disable=SC2154,SC2034 # variables of the guest's other files
 # Points that are spread over a registration and a withdrawal.
 
 lab_points="$lab_out/points"

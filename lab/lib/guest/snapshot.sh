@@ -40,7 +40,7 @@ addresses_settled()
 # The kernel tells up to a second later that a VLAN made anew is up.
 vlans_settled()
 {
-    [ -z "$(ip -oneline link show type vlan | grep ' state UNKNOWN ')" ]
+    ! ip -oneline link show type vlan | grep -q ' state UNKNOWN '
 }
 
 # Numbers of interfaces and aggregates change when a device is made anew, failures of a cable are

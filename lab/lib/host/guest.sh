@@ -30,7 +30,7 @@ lab_make_guest_disk()
     local base=lab_disk_$2
     if [[ $2 == empty ]]; then
         rm -f "$1"
-        mke2fs -q -t ext4 -m 0 -E lazy_itable_init=1,lazy_journal_init=1 "$1" 128M
+        mke2fs -q -t ext4 -m 0 -E lazy_itable_init=1,lazy_journal_init=1 "$1" 128M >/dev/null
     else
         cp --sparse=always "${!base}" "$1"
     fi

@@ -213,6 +213,8 @@ TEST(HalfStates, WhatAConversionTookApartIsSomewhereAgain)
                               "from it"}));
 
     AddFile(truths, "bond7", "DEVICE=bond7\nBONDING_OPTS=\"mode=802.3ad\"\n");
+    EXPECT_EQ(FindHalfStates(truths).front().kind, kLostBond) << "a bond without members is none";
+    AddFile(truths, "eth1", "DEVICE=eth1\nSLAVE=yes\nMASTER=bond7\n");
     AddFile(truths, "eth3.30", "DEVICE=eth3.30\nVLAN=yes\nPHYSDEV=eth3\n");
     AddFile(truths, "bond7.5", "DEVICE=bond7.5\nVLAN=yes\nPHYSDEV=bond7\n");
     EXPECT_THAT(FindHalfStates(truths), IsEmpty()) << "they are the kernel's again";
@@ -418,7 +420,7 @@ TEST_F(Repair, BuildsABondAndMakesAVlanUnderTheLibrarysLock)
              .Save()));
     Host().act = [](unit::FakeHost& host) {
         if (host.calls.back().starts_with("VORNNetLinkAggrSet")) {
-            WriteInterfaceFile("bond0", "DEVICE=bond0\nBONDING_OPTS=\"mode=802.3ad\"\n");
+            WriteInterfaceFile("eth1", "DEVICE=eth1\nSLAVE=yes\nMASTER=bond0\n");
         } else if (host.calls.back().starts_with("VLIBNetVlanCreate")) {
             WriteInterfaceFile("eth0.30", "DEVICE=eth0.30\nVLAN=yes\nPHYSDEV=eth0\n");
         }

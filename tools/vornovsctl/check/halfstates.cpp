@@ -209,10 +209,13 @@ private:
     bool HasBond(const std::string& name) const
     {
         const Device* device = m_host.Find(name);
-        const FileTruth* plain = m_truths.FindFile(name);
+        // A bond's own file may outlive what made members of the others.
+        const bool plain =
+            std::any_of(m_truths.files.begin(), m_truths.files.end(),
+                        [&](const FileTruth& file) { return file.content.master == name; });
         const FileTruth* bridge = m_truths.FindFile(BridgeOf(name));
         const Bridge* live = FindBridge(BridgeOf(name));
-        return (device != nullptr && device->bond) || (plain != nullptr && plain->content.bond) ||
+        return (device != nullptr && device->bond) || plain ||
                (bridge != nullptr && !bridge->content.slaveList.empty()) ||
                (live != nullptr && std::any_of(live->ports.begin(), live->ports.end(),
                                                [](const Port& port) { return port.bond; }));

@@ -179,6 +179,25 @@ bool ForgetJson(const char* kind, const std::string& name)
     return ::unlink(PathOf(kind, name).c_str()) == 0 || errno == ENOENT;
 }
 
+/** Every record of a kind, sorted by name. */
+template <typename Record>
+std::vector<Record> LoadRecords(const char* kind)
+{
+    std::vector<Record> records;
+    std::error_code ignored; // no folder: nothing is remembered
+    for (const auto& entry : std::filesystem::directory_iterator(FolderOf(kind), ignored)) {
+        auto record = entry.path().extension() == kEnding
+                          ? Record::Load(entry.path().stem().string())
+                          : std::nullopt;
+        if (record) {
+            records.push_back(std::move(*record));
+        }
+    }
+    std::sort(records.begin(), records.end(),
+              [](const auto& one, const auto& other) { return one.name < other.name; });
+    return records;
+}
+
 } // namespace
 
 bool RememberedBond::HasSlaves(std::vector<std::string> others) const
@@ -201,6 +220,11 @@ std::optional<RememberedBond> RememberedBond::Load(const std::string& name)
         bond.state = ToState(object);
         return bond;
     });
+}
+
+std::vector<RememberedBond> RememberedBond::LoadAll()
+{
+    return LoadRecords<RememberedBond>(kBonds);
 }
 
 bool RememberedBond::Save() const
@@ -231,21 +255,15 @@ std::optional<RememberedVlan> RememberedVlan::Load(const std::string& name)
     });
 }
 
+std::vector<RememberedVlan> RememberedVlan::LoadAll()
+{
+    return LoadRecords<RememberedVlan>(kVlans);
+}
+
 std::vector<RememberedVlan> RememberedVlan::LoadOfParent(const std::string& parent)
 {
-    std::vector<RememberedVlan> vlans;
-    std::error_code ignored; // no folder: nothing is remembered
-    for (const auto& entry : std::filesystem::directory_iterator(FolderOf(kVlans), ignored)) {
-        if (entry.path().extension() != kEnding) {
-            continue;
-        }
-        auto vlan = Load(entry.path().stem().string());
-        if (vlan && vlan->parent == parent) {
-            vlans.push_back(std::move(*vlan));
-        }
-    }
-    std::sort(vlans.begin(), vlans.end(),
-              [](const auto& one, const auto& other) { return one.name < other.name; });
+    auto vlans = LoadAll();
+    std::erase_if(vlans, [&](const RememberedVlan& vlan) { return vlan.parent != parent; });
     return vlans;
 }
 

@@ -67,6 +67,9 @@ struct RememberedBond {
     /** @return  nothing when nothing is remembered or it cannot be read. */
     static std::optional<RememberedBond> Load(const std::string& name);
 
+    /** @return  every bond that is remembered, sorted by name. */
+    static std::vector<RememberedBond> LoadAll();
+
     /** Replaces what is remembered. @return  false: it could not be written (errno says why). */
     bool Save() const;
 
@@ -86,7 +89,10 @@ struct RememberedVlan {
     /** @return  nothing when nothing is remembered or it cannot be read. */
     static std::optional<RememberedVlan> Load(const std::string& name);
 
-    /** @return  every VLAN that is remembered of a parent, sorted by name. */
+    /** @return  every VLAN that is remembered, sorted by name. */
+    static std::vector<RememberedVlan> LoadAll();
+
+    /** @return  those of a parent. */
     static std::vector<RememberedVlan> LoadOfParent(const std::string& parent);
 
     /** Replaces what is remembered. @return  false: it could not be written (errno says why). */

@@ -15,10 +15,14 @@ std::string TagDeviceName(int parentIndex, unsigned vlanId)
 
 bool IsTagDevice(const Link& link)
 {
-    const auto number = link.name.find_first_not_of("0123456789", sizeof kPrefix - 1);
-    return link.kind == "vlan" && link.name.rfind(kPrefix, 0) == 0 && number != std::string::npos &&
-           number > sizeof kPrefix - 1 &&
-           link.name.substr(number) == "." + std::to_string(link.vlanId);
+    return link.kind == "vlan" && IsTagDeviceName(link.name, link.vlanId);
+}
+
+bool IsTagDeviceName(const std::string& name, int vlanId)
+{
+    const auto number = name.find_first_not_of("0123456789", sizeof kPrefix - 1);
+    return name.rfind(kPrefix, 0) == 0 && number != std::string::npos &&
+           number > sizeof kPrefix - 1 && name.substr(number) == "." + std::to_string(vlanId);
 }
 
 } // namespace vornhost

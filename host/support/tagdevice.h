@@ -20,6 +20,9 @@ std::string TagDeviceName(int parentIndex, unsigned vlanId);
  */
 bool IsTagDevice(const Link& link);
 
+/** The same for a VLAN's interface of that name. */
+bool IsTagDeviceName(const std::string& name, int vlanId);
+
 } // namespace vornhost
 
 #endif

@@ -119,7 +119,7 @@ killed_with_all_after()
             kill -KILL "$pid" 2>/dev/null || true # it may have ended by now
         fi
     done
-    wait "$client" 2>/dev/null || true
+    { wait "$client" || true; } 2>/dev/null # the shell tells of the kill
 }
 
 # True for a process of the network program that waits for the end of a conversion.

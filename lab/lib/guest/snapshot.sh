@@ -104,13 +104,36 @@ snapshot_sysctls()
 }
 
 # Every option of every bond, and the slaves in their order.
+# The members of a bond in the order in which they joined, or in that of their names when
+# $lab_members_in_any_order is set: what finishes another's work joins first what carries nothing.
+bonds_in_order()
+{
+    if [ -z "${lab_members_in_any_order:-}" ]; then
+        cat
+    else
+        awk -F : '/\/(slaves|queue_id):/ {
+            line = $0
+            sub(/^[^:]*:/, "", line)
+            count = split(line, words, " ")
+            for (i = 2; i <= count; i++)
+                for (j = i; j > 1 && words[j] < words[j - 1]; j--) {
+                    word = words[j]; words[j] = words[j - 1]; words[j - 1] = word
+                }
+            printf "%s:", $1
+            for (i = 1; i <= count; i++) printf "%s%s", words[i], i < count ? " " : "\n"
+            next
+        }
+        { print }'
+    fi
+}
+
 snapshot_bonds()
 {
     local folder
     for folder in /sys/class/net/*/bonding; do
         [ -d "$folder" ] || continue
         grep -rs . "$folder" | sed -e "s|^/sys/class/net/||" -e '/\/ad_aggregator:/d'
-    done | sort
+    done | bonds_in_order | sort
 }
 
 snapshot_switch()

@@ -203,24 +203,35 @@ TEST(HalfStates, WhatAConversionTookApartIsSomewhereAgain)
     truths.converted = {{{"bond7", {"802.3ad", {"eth1", "eth2"}}}}, {{"eth3", 30}, {"bond7", 5}}};
     EXPECT_THAT(
         FindHalfStates(truths),
-        ElementsAre(HalfState{kLostBond, "bond7",
-                              "is a bond that a conversion which was cut short has taken apart"},
-                    HalfState{kLostVlan, "eth3",
-                              "had the VLAN 30, which a conversion that was cut short has taken "
-                              "from it"},
-                    HalfState{kLostVlan, "bond7",
-                              "had the VLAN 5, which a conversion that was cut short has taken "
-                              "from it"}));
+        ElementsAre(
+            HalfState{kUnfinishedBond, "bond7",
+                      "is a bond that a conversion which was cut short has taken apart"},
+            HalfState{kUnfinishedVlan, "eth3",
+                      "has had the VLAN 30, which a conversion that was cut short has taken "
+                      "from it"},
+            HalfState{kUnfinishedVlan, "bond7",
+                      "has had the VLAN 5, which a conversion that was cut short has taken "
+                      "from it"}));
 
     AddFile(truths, "bond7", "DEVICE=bond7\nBONDING_OPTS=\"mode=802.3ad\"\n");
-    EXPECT_EQ(FindHalfStates(truths).front().kind, kLostBond) << "a bond without members is none";
+    EXPECT_EQ(FindHalfStates(truths).front().kind, kUnfinishedBond)
+        << "a bond without members is none";
     AddFile(truths, "eth1", "DEVICE=eth1\nSLAVE=yes\nMASTER=bond7\n");
     AddFile(truths, "eth3.30", "DEVICE=eth3.30\nVLAN=yes\nPHYSDEV=eth3\n");
     AddFile(truths, "bond7.5", "DEVICE=bond7.5\nVLAN=yes\nPHYSDEV=bond7\n");
     EXPECT_THAT(FindHalfStates(truths), IsEmpty()) << "they are the kernel's again";
 
+    truths.remembered = truths.converted;
+    EXPECT_THAT(
+        FindHalfStates(truths),
+        ElementsAre(
+            HalfState{kUnfinishedBond, "bond7", "is a bond that is built only half"},
+            HalfState{kUnfinishedVlan, "eth3", "has had the VLAN 30, which is made only half"},
+            HalfState{kUnfinishedVlan, "bond7", "has had the VLAN 5, which is made only half"}));
+
     truths = OnTheSwitch();
     truths.converted = {{{"bond0", {"802.3ad", {"eth1", "eth2"}}}}, {{"eth0", 10}}};
+    truths.remembered = truths.converted;
     EXPECT_THAT(FindHalfStates(truths), IsEmpty()) << "they are the switch's";
 }
 
@@ -426,15 +437,16 @@ TEST_F(Repair, BuildsABondAndMakesAVlanUnderTheLibrarysLock)
         }
         return 0;
     };
-    EXPECT_EQ(Ctl({"repair"}),
-              unit::Done("bond0 is a bond that a conversion which was cut short has taken apart.\n"
-                         "eth0 had the VLAN 30, which a conversion that was cut short has taken "
-                         "from it.\n"
-                         "To do:\n"
-                         "  make the live network what the files say\n"
-                         "  build bond0 of eth1, eth2 again\n"
-                         "  make the VLAN 30 of eth0 again\n"
-                         "Everything fits together.\n"));
+    EXPECT_EQ(
+        Ctl({"repair"}),
+        unit::Done("bond0 is a bond that a conversion which was cut short has taken apart.\n"
+                   "eth0 has had the VLAN 30, which a conversion that was cut short has taken "
+                   "from it.\n"
+                   "To do:\n"
+                   "  make the live network what the files say\n"
+                   "  build bond0 of eth1, eth2 again\n"
+                   "  make the VLAN 30 of eth0 again\n"
+                   "Everything fits together.\n"));
     const std::string lock = "VLIBCFileLockTimeByFile /tmp/ovs_config.lock 1 5";
     const std::string unlock = "VLIBCFileUnlockByFile 7";
     EXPECT_THAT(Host().calls,

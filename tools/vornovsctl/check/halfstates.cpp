@@ -3,6 +3,7 @@
 #include "wording.h"
 
 #include <support/interfacename.h>
+#include <support/tagdevice.h>
 
 #include <algorithm>
 #include <iterator>
@@ -37,7 +38,7 @@ public:
             LookAtFile(file);
         }
         LookAtClients();
-        LookAtRecord();
+        LookAtRecords();
         for (const std::string& path : m_truths.strays) {
             Add(HalfStateClass::kStrayFile, path, "is left over from a writer that was killed");
         }
@@ -188,53 +189,76 @@ private:
         }
     }
 
-    void LookAtRecord()
+    void LookAtRecords()
     {
+        if (!IsSwitchKnown()) {
+            return;
+        }
         for (const auto& [name, bond] : m_truths.converted.bonds) {
-            if (IsSwitchKnown() && !HasBond(name)) {
-                Add(HalfStateClass::kLostBond, name,
+            if (!IsKernelsBond(name) && !IsSwitchsBond(name)) {
+                Add(HalfStateClass::kUnfinishedBond, name,
                     "is a bond that a conversion which was cut short has taken apart");
             }
         }
         for (const vornhost::FileVlan& vlan : m_truths.converted.vlans) {
-            if (IsSwitchKnown() && !HasVlan(vlan)) {
-                Add(HalfStateClass::kLostVlan, vlan.parent,
-                    "had the VLAN " + std::to_string(vlan.id) +
-                        ", which a conversion that was cut short has taken from it");
+            if (!IsKernelsVlan(vlan) && !IsSwitchsTag(vlan)) {
+                AddVlan(vlan, "which a conversion that was cut short has taken from it");
+            }
+        }
+        // What the kernel has again is remembered only until it is as it was.
+        for (const auto& [name, bond] : m_truths.remembered.bonds) {
+            if (IsKernelsBond(name) && !IsSwitchsBond(name)) {
+                Add(HalfStateClass::kUnfinishedBond, name, "is a bond that is built only half");
+            }
+        }
+        for (const vornhost::FileVlan& vlan : m_truths.remembered.vlans) {
+            if (IsKernelsVlan(vlan) && !IsSwitchsTag(vlan)) {
+                AddVlan(vlan, "which is made only half");
             }
         }
     }
 
-    /** Whether there is such a bond: of the kernel, of the switch, or in the files of either. */
-    bool HasBond(const std::string& name) const
+    void AddVlan(const vornhost::FileVlan& vlan, const std::string& text)
     {
-        const Device* device = m_host.Find(name);
-        // A bond's own file may outlive what made members of the others.
-        const bool plain =
-            std::any_of(m_truths.files.begin(), m_truths.files.end(),
-                        [&](const FileTruth& file) { return file.content.master == name; });
-        const FileTruth* bridge = m_truths.FindFile(BridgeOf(name));
-        const Bridge* live = FindBridge(BridgeOf(name));
-        return (device != nullptr && device->bond) || plain ||
-               (bridge != nullptr && !bridge->content.slaveList.empty()) ||
-               (live != nullptr && std::any_of(live->ports.begin(), live->ports.end(),
-                                               [](const Port& port) { return port.bond; }));
+        Add(HalfStateClass::kUnfinishedVlan, vlan.parent,
+            "has had the VLAN " + std::to_string(vlan.id) + ", " + text);
     }
 
-    /** The same for a VLAN. */
-    bool HasVlan(const vornhost::FileVlan& vlan) const
+    /** A bond's own file may outlive what made members of the others. */
+    bool IsKernelsBond(const std::string& name) const
+    {
+        const Device* device = m_host.Find(name);
+        return (device != nullptr && device->bond) ||
+               std::any_of(m_truths.files.begin(), m_truths.files.end(),
+                           [&](const FileTruth& file) { return file.content.master == name; });
+    }
+
+    bool IsSwitchsBond(const std::string& name) const
+    {
+        const FileTruth* file = m_truths.FindFile(BridgeOf(name));
+        const Bridge* bridge = FindBridge(BridgeOf(name));
+        return (file != nullptr && !file->content.slaveList.empty()) ||
+               (bridge != nullptr && std::any_of(bridge->ports.begin(), bridge->ports.end(),
+                                                 [](const Port& port) { return port.bond; }));
+    }
+
+    bool IsKernelsVlan(const vornhost::FileVlan& vlan) const
     {
         const int id = static_cast<int>(vlan.id);
-        const std::string name = BridgeOf(vlan.parent);
-        const FileTruth* file = m_truths.FindFile(name);
-        const Bridge* bridge = FindBridge(name);
-        return (file != nullptr && file->tag == std::to_string(id)) ||
-               (bridge != nullptr && bridge->tag == id) ||
-               std::any_of(m_truths.files.begin(), m_truths.files.end(),
+        return std::any_of(m_truths.files.begin(), m_truths.files.end(),
                            [&](const FileTruth& each) { return each.content.vlan == vlan; }) ||
                std::any_of(m_host.devices.begin(), m_host.devices.end(), [&](const Device& each) {
-                   return each.vlan == id && (each.parent == vlan.parent || each.parent == name);
+                   return each.vlan == id && !vornhost::IsTagDeviceName(each.name, id) &&
+                          (each.parent == vlan.parent || each.parent == BridgeOf(vlan.parent));
                });
+    }
+
+    bool IsSwitchsTag(const vornhost::FileVlan& vlan) const
+    {
+        const FileTruth* file = m_truths.FindFile(BridgeOf(vlan.parent));
+        const Bridge* bridge = FindBridge(BridgeOf(vlan.parent));
+        return (file != nullptr && file->tag == std::to_string(vlan.id)) ||
+               (bridge != nullptr && bridge->tag == static_cast<int>(vlan.id));
     }
 
     const HostTruths& m_truths;
@@ -268,10 +292,10 @@ const char* WordOf(HalfStateClass kind)
         return "bond-of-one";
     case HalfStateClass::kLostTag:
         return "lost-tag";
-    case HalfStateClass::kLostBond:
-        return "lost-bond";
-    case HalfStateClass::kLostVlan:
-        return "lost-vlan";
+    case HalfStateClass::kUnfinishedBond:
+        return "unfinished-bond";
+    case HalfStateClass::kUnfinishedVlan:
+        return "unfinished-vlan";
     case HalfStateClass::kStrayFile:
         return "stray-file";
     }

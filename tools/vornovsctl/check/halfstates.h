@@ -25,8 +25,8 @@ enum class HalfStateClass {
     kOnSwitchButUnregistered, /**< nobody is registered, and something is on the switch */
     kBondOfOne,               /**< a bond with a single member, or with none */
     kLostTag,                 /**< a tag that is in the file and not in the switch */
-    kLostBond,                /**< a bond that a conversion took apart and did not build again */
-    kLostVlan,                /**< the same for a VLAN */
+    kUnfinishedBond,          /**< a bond that was taken apart, or built again only half */
+    kUnfinishedVlan,          /**< the same for a VLAN */
     kStrayFile,               /**< what a writer left that was killed */
 };
 

@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <filesystem>
 #include <string_view>
+#include <support/remembered.h>
 #include <system_error>
 #include <utility>
 
@@ -98,6 +99,12 @@ HostTruths ReadTruths()
     truths.host = ReadHost();
     ReadConfiguration(truths);
     ReadLists(truths);
+    for (const vornhost::RememberedBond& bond : vornhost::RememberedBond::LoadAll()) {
+        truths.remembered.bonds[bond.name] = {bond.options.Get("mode"), bond.slaves};
+    }
+    for (const vornhost::RememberedVlan& vlan : vornhost::RememberedVlan::LoadAll()) {
+        truths.remembered.vlans.push_back({vlan.parent, static_cast<unsigned>(vlan.id)});
+    }
     if (auto record = vornhost::ConversionRecord::Load()) {
         truths.converted = std::move(*record);
     } else {

@@ -30,8 +30,9 @@ struct FileTruth {
 struct HostTruths {
     HostModel host; /**< the lists, the switch and the kernel */
     std::vector<FileTruth> files;
-    std::vector<std::string> strays;      /**< paths of what a writer left that was killed */
-    vornhost::ConversionRecord converted; /**< by a conversion that has not ended */
+    std::vector<std::string> strays;       /**< paths of what a writer left that was killed */
+    vornhost::ConversionRecord converted;  /**< by a conversion that has not ended */
+    vornhost::ConversionRecord remembered; /**< what is on the switch, as long as it is */
 
     const FileTruth* FindFile(const std::string& name) const;
 };

@@ -48,20 +48,23 @@ void AddWayOff(const HostTruths& truths, std::vector<RepairStep>& plan)
 }
 
 /** A VLAN may stand on a bond. */
-void AddLost(const HostTruths& truths, const std::vector<HalfState>& found,
-             std::vector<RepairStep>& plan)
+void AddUnfinished(const HostTruths& truths, const std::vector<HalfState>& found,
+                   std::vector<RepairStep>& plan)
 {
-    for (const HalfState& each : found) {
-        if (each.kind == HalfStateClass::kLostBond) {
-            plan.push_back({RepairStep::Kind::kBuildBond, each.subject,
-                            truths.converted.bonds.at(each.subject)});
+    const auto isFound = [&](HalfStateClass kind, const std::string& subject) {
+        return std::any_of(found.begin(), found.end(), [&](const HalfState& each) {
+            return each.kind == kind && each.subject == subject;
+        });
+    };
+    vornhost::ConversionRecord all = truths.converted;
+    all.Add(truths.remembered);
+    for (const auto& [name, bond] : all.bonds) {
+        if (isFound(HalfStateClass::kUnfinishedBond, name)) {
+            plan.push_back({RepairStep::Kind::kBuildBond, name, bond});
         }
     }
-    for (const vornhost::FileVlan& vlan : truths.converted.vlans) {
-        const bool lost = std::any_of(found.begin(), found.end(), [&](const HalfState& each) {
-            return each.kind == HalfStateClass::kLostVlan && each.subject == vlan.parent;
-        });
-        if (lost) {
+    for (const vornhost::FileVlan& vlan : all.vlans) {
+        if (isFound(HalfStateClass::kUnfinishedVlan, vlan.parent)) {
             plan.push_back({RepairStep::Kind::kMakeVlan, vlan.parent, {}, vlan.id});
         }
     }
@@ -148,16 +151,17 @@ std::vector<RepairStep> PlanRepair(const HostTruths& truths, const std::vector<H
     if (!strayOnly) {
         plan.push_back({RepairStep::Kind::kStartNetwork, ""});
     }
-    const bool lost = Has(found, {HalfStateClass::kLostBond, HalfStateClass::kLostVlan});
+    const bool unfinished =
+        Has(found, {HalfStateClass::kUnfinishedBond, HalfStateClass::kUnfinishedVlan});
     const bool registered = truths.host.clients && !truths.host.clients->empty();
     if (Has(found, {HalfStateClass::kUnfinishedFile, HalfStateClass::kRegisteredButPlain,
                     HalfStateClass::kOnSwitchButUnregistered}) ||
-        (lost && registered)) {
+        (unfinished && registered)) {
         AddWayOff(truths, plan);
-        AddLost(truths, found, plan);
+        AddUnfinished(truths, found, plan);
         AddWayBack(truths, plan);
-    } else if (lost) {
-        AddLost(truths, found, plan);
+    } else if (unfinished) {
+        AddUnfinished(truths, found, plan);
     }
     for (const std::string& path : truths.strays) {
         plan.push_back({RepairStep::Kind::kRemoveFile, path});

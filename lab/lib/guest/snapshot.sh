@@ -56,7 +56,8 @@ snapshot_links()
 }
 
 # Fleeting IPv6 addresses, one a line: temporary ones, which the kernel makes now and then, and those
-# that nobody uses any more; and the multicast groups that they are asked for by.
+# that nobody uses any more; and the multicast groups, of IPv6 and of the link, that they are asked
+# for by.
 fleeting()
 {
     ip -6 -oneline address show |
@@ -64,8 +65,10 @@ fleeting()
             sub("/.*", "", $4)
             print $4
             groups = split($4, group, ":")
-            printf "ff02::1:ff%s:%s\n", substr("0000" group[groups - 1], length(group[groups - 1]) + 3),
-                group[groups]
+            high = substr("0000" group[groups - 1], length(group[groups - 1]) + 3)
+            low = substr("0000" group[groups], length(group[groups]) + 1)
+            printf "ff02::1:ff%s:%s\n", high, group[groups]
+            printf "33:33:ff:%s:%s:%s\n", high, substr(low, 1, 2), substr(low, 3)
         }'
 }
 
@@ -103,7 +106,6 @@ snapshot_sysctls()
         sed -e '/\/ovs-system\//d' -e 's|^/proc/sys/||' | sort
 }
 
-# Every option of every bond, and the slaves in their order.
 # The members of a bond in the order in which they joined, or in that of their names when
 # $lab_members_in_any_order is set: what finishes another's work joins first what carries nothing.
 bonds_in_order()
@@ -127,6 +129,7 @@ bonds_in_order()
     fi
 }
 
+# Every option of every bond, and the slaves in their order.
 snapshot_bonds()
 {
     local folder

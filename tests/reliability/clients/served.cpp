@@ -113,7 +113,7 @@ void ExpectOwnSurroundings(Findings& findings)
 {
     const std::string expected = std::string(kProgramEnvironment) +
                                  "descriptor 0\ndescriptor 1\ndescriptor 2\n"
-                                 "SigBlk: 0\nSigIgn: 0\n/\nany size\n";
+                                 "SigBlk: 0\nSigIgn: 0\n/\nfiles of any size\nenough descriptors\n";
     for (const char* const mode : {"r", "rB"}) {
         const Answer answer = Read(mode, "witness", nullptr);
         findings.Expect(answer.text == expected,

@@ -2,7 +2,9 @@
 
 #include "host/host.h"
 
+#include <algorithm>
 #include <cerrno>
+#include <chrono>
 #include <csignal>
 #include <cstdlib>
 #include <filesystem>
@@ -72,13 +74,13 @@ void IgnoreAll()
     }
 }
 
-void SetLimit(rlim_t count)
+void SetLimit(__rlimit_resource_t resource, rlim_t value)
 {
     struct rlimit limit {};
-    Check(::getrlimit(RLIMIT_NOFILE, &limit) == 0, "getrlimit");
-    limit.rlim_cur = count;
-    limit.rlim_max = std::max(limit.rlim_max, count);
-    Check(::setrlimit(RLIMIT_NOFILE, &limit) == 0, "setrlimit");
+    Check(::getrlimit(resource, &limit) == 0, "getrlimit");
+    limit.rlim_cur = value;
+    limit.rlim_max = std::max(limit.rlim_max, value);
+    Check(::setrlimit(resource, &limit) == 0, "setrlimit");
 }
 
 void CloseStandard()
@@ -97,7 +99,7 @@ int OpenInheritable()
 void OpenMany()
 {
     constexpr int kMany = 10000;
-    SetLimit(kMany + 200);
+    SetLimit(RLIMIT_NOFILE, kMany + 200);
     int opened = 0;
     while (opened < kMany && OpenInheritable() >= 0) {
         ++opened;
@@ -123,6 +125,7 @@ void TakeHostileEnvironment()
     for (const char* const name : {"LD_PRELOAD", "LD_AUDIT"}) {
         Set(name, folder + "/planted.so");
     }
+    SetLimit(RLIMIT_FSIZE, 1 << 20);
     Set("IFS", "/");
     Set("OVS_CTL_TIMEOUT", "1");
     Set("LC_ALL", "de_DE.UTF-8");
@@ -187,7 +190,7 @@ bool PlantedRan()
 std::vector<int> LeaveDescriptors(int count)
 {
     constexpr int kLimit = 96;
-    SetLimit(kLimit);
+    SetLimit(RLIMIT_NOFILE, kLimit);
     std::vector<int> descriptors;
     for (int opened = 0; (opened = OpenInheritable()) >= 0;) {
         descriptors.push_back(opened);

@@ -17,7 +17,7 @@ std::vector<Trait> SignalTraits();
 /** What it does with its descriptors. The last has none left. */
 std::vector<Trait> DescriptorTraits();
 
-/** What stands in its environment. */
+/** What stands in its environment, and what it may use of the machine. */
 std::vector<Trait> EnvironmentTraits();
 
 /** Puts there what the hostile environment names. */

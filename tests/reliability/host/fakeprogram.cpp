@@ -95,7 +95,9 @@ int Witness()
     (void)std::puts(::getcwd(line, sizeof line));
     struct rlimit limit {};
     (void)::getrlimit(RLIMIT_FSIZE, &limit);
-    (void)std::puts(limit.rlim_cur == RLIM_INFINITY ? "any size" : "a limited size");
+    (void)std::puts(limit.rlim_cur == RLIM_INFINITY ? "files of any size" : "files too small");
+    (void)::getrlimit(RLIMIT_NOFILE, &limit);
+    (void)std::puts(limit.rlim_cur >= 1024 ? "enough descriptors" : "few descriptors");
     return 0;
 }
 

@@ -1,7 +1,7 @@
 // A client as large as the machine lets it be. What a sanitizer keeps of each page would be more
 // than the client itself.
 #ifndef __SANITIZE_ADDRESS__
-#include "clients/client.h"
+#include "host/client.h"
 #include "host/host.h"
 #include "support/figures.h"
 

@@ -4,7 +4,7 @@
 #ifndef VORNOVS_TESTS_RELIABILITY_CLIENTS_SERVED_H
 #define VORNOVS_TESTS_RELIABILITY_CLIENTS_SERVED_H
 
-#include "clients/client.h"
+#include "host/client.h"
 
 namespace reliability {
 

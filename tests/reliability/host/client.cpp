@@ -1,4 +1,4 @@
-#include "clients/client.h"
+#include "host/client.h"
 
 #include <algorithm>
 #include <array>
@@ -15,6 +15,7 @@
 #include <sys/resource.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
+#include <syslog.h>
 #include <unistd.h>
 
 namespace reliability {
@@ -107,7 +108,8 @@ void ExpectNoChild(Findings& findings)
 
 struct Findings::Page {
     size_t size;
-    std::array<char, kPageSize - sizeof(size_t)> text;
+    int result;
+    std::array<char, kPageSize - 2 * sizeof(size_t)> text;
 };
 
 Findings::Findings()
@@ -140,17 +142,29 @@ std::string Findings::Text() const
     return {m_page->text.data(), m_page->size};
 }
 
-std::string RunClient(const std::vector<Trait>& traits, const std::function<void(Findings&)>& body)
+void Findings::SetResult(int result)
 {
-    Findings findings;
+    m_page->result = result;
+}
+
+int Findings::Result() const
+{
+    return m_page->result;
+}
+
+void RunClient(const std::vector<Trait>& traits, const std::function<void(Findings&)>& body,
+               Findings& findings)
+{
     const pid_t client = ::fork();
     if (client == 0) {
         try {
+            (void)::alarm(kClientSeconds);
             for (const Trait& trait : traits) {
                 trait.take();
             }
             const Belongings before;
             body(findings);
+            ::closelog(); // the C library's own connection
             ExpectNoChild(findings);
             CompareBelongings(before, Belongings(), findings);
         } catch (const std::exception& error) {
@@ -162,6 +176,12 @@ std::string RunClient(const std::vector<Trait>& traits, const std::function<void
     while (::waitpid(client, &status, 0) < 0 && errno == EINTR) {
     }
     findings.Expect(status == 0, "the client died with status", std::to_string(status).c_str());
+}
+
+std::string RunClient(const std::vector<Trait>& traits, const std::function<void(Findings&)>& body)
+{
+    Findings findings;
+    RunClient(traits, body, findings);
     return findings.Text();
 }
 

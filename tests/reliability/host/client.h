@@ -1,8 +1,8 @@
 /**
  * A client of the platform in a process of its own, with whatever habits clients have.
  */
-#ifndef VORNOVS_TESTS_RELIABILITY_CLIENTS_CLIENT_H
-#define VORNOVS_TESTS_RELIABILITY_CLIENTS_CLIENT_H
+#ifndef VORNOVS_TESTS_RELIABILITY_HOST_CLIENT_H
+#define VORNOVS_TESTS_RELIABILITY_HOST_CLIENT_H
 
 #include <functional>
 #include <string>
@@ -28,10 +28,17 @@ public:
     void Expect(bool asItShouldBe, const char* words, const char* more = "");
     [[nodiscard]] std::string Text() const;
 
+    /** What the client was answered. */
+    void SetResult(int result);
+    [[nodiscard]] int Result() const;
+
 private:
     struct Page;
     Page* m_page; ///< shared with the client
 };
+
+/** What a client gets when it has taken longer than anything may. */
+constexpr unsigned kClientSeconds = 90;
 
 /**
  * Runs a client that takes these habits and then does what the body says. Its signals, their mask
@@ -39,6 +46,10 @@ private:
  * @return  what was found wrong, one line each; empty: nothing.
  */
 std::string RunClient(const std::vector<Trait>& traits, const std::function<void(Findings&)>& body);
+
+/** The same, for the answer's sake too. */
+void RunClient(const std::vector<Trait>& traits, const std::function<void(Findings&)>& body,
+               Findings& findings);
 
 } // namespace reliability
 

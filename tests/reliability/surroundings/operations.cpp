@@ -132,25 +132,27 @@ Files HostOnSwitch()
 
 const std::vector<Operation>& Operations()
 {
+    static const std::set<int> registering = {0, 1, -1};
+    static const std::set<int> changing = {0, -1};
+    static const auto chMode = [] {
+        return OVSBodChMode(VORN_LINK_AGGR_OVS_BALANCE_TCP, "ovs_bond0");
+    };
     static const std::vector<Operation> operations = {
-        {"Register", HostOnSwitch(), [] { return Register("client", {}); }, {0, -1}, 0},
-        {"UnRegister", HostOnSwitch(), ConvertBack, {0, -1}, 0},
-        {"Register, the first", PlainHost(), [] { return Register("client", {}); }, {0, -1}, 0},
-        {"AddInterface", HostOnSwitch(), [] { return AddInterface("eth1"); }, {0, -1}, 0},
-        {"AttachPort", HostOnSwitch(), [] { return AttachPort("ovs_eth0", "tap0"); }, {1, -1}, 1},
-        {"OVSVlanCreate",
+        {"Register", HostOnSwitch(), [] { return Register("client", {}); }, registering, 0},
+        {"UnRegister", HostOnSwitch(), ConvertBack, registering, 0},
+        {"Register, the first", PlainHost(), [] { return Register("client", {}); }, registering, 0},
+        {"AddInterface", HostOnSwitch(), [] { return AddInterface("eth1"); }, changing, 0},
+        {"AttachPort",
          HostOnSwitch(),
-         [] { return OVSVlanCreate("ovs_eth0", "7"); },
-         {0, -1},
+         [] { return AttachPort("ovs_eth0", "tap0"); },
+         {1, 0, -1},
+         1},
+        {"OVSVlanCreate", HostOnSwitch(), [] { return OVSVlanCreate("ovs_eth0", "7"); }, changing,
          0},
-        {"OVSVlanRemove", HostOnSwitch(), [] { return OVSVlanRemove("ovs_eth0"); }, {0, -1}, 0},
-        {"OVSBodChMode",
-         HostOnSwitch(),
-         [] { return OVSBodChMode(VORN_LINK_AGGR_OVS_BALANCE_TCP, "ovs_bond0"); },
-         {0, -1},
-         0},
-        {"OVSBondCreate", HostOnSwitch(), CreateBond, {0, -1}, 0},
-        {"OVSBondRemove", HostOnSwitch(), RemoveBond, {0, -1}, 0},
+        {"OVSVlanRemove", HostOnSwitch(), [] { return OVSVlanRemove("ovs_eth0"); }, changing, 0},
+        {"OVSBodChMode", HostOnSwitch(), chMode, changing, 0},
+        {"OVSBondCreate", HostOnSwitch(), CreateBond, changing, 0},
+        {"OVSBondRemove", HostOnSwitch(), RemoveBond, changing, 0},
         {"OVSSetDefault", HostOnSwitch(), SetDefault, {0}, 0},
     };
     return operations;

@@ -2,6 +2,7 @@
 #include "core/guard.h"
 #include "core/heldlocks.h"
 #include "core/program.h"
+#include "core/refusal.h"
 
 #include <cstdarg>
 #include <string>
@@ -19,6 +20,9 @@ using vornhost::RunnerReport;
 /** Runs a program for the client. @return 0, or -1 for whatever kept it from succeeding. */
 int Run(std::vector<std::string> argv, bool wait = true)
 {
+    if (vornhost::IsRefused(argv)) {
+        return -1;
+    }
     ProgramRequest request;
     request.argv = std::move(argv);
     request.detached = !wait;

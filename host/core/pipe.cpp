@@ -2,6 +2,7 @@
 #include "core/guard.h"
 #include "core/heldlocks.h"
 #include "core/program.h"
+#include "core/refusal.h"
 
 #include <cstdarg>
 #include <map>
@@ -155,6 +156,9 @@ FILE* VLIBCPopen(const char* path, const char* mode, ...)
     FILE* const stream = Guarded<FILE*>(nullptr, [&]() -> FILE* {
         const auto argv = vornhost::CollectArguments(path, arguments);
         const std::string_view how = mode;
+        if (vornhost::IsRefused(argv)) {
+            return nullptr;
+        }
         if (how == "rB" && ::faccessat(AT_FDCWD, path, X_OK, AT_EACCESS) == 0) {
             return OpenDirect(argv);
         }

@@ -21,6 +21,7 @@
 #include <fcntl.h>
 #include <linux/close_range.h>
 #include <sys/mman.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <syslog.h>
@@ -189,6 +190,33 @@ Descriptor MemoryFile(const Task& task)
     return Descriptor(::fcntl(memory.Get(), F_DUPFD_CLOEXEC, lowest));
 }
 
+/** Raises a limit of this process; beyond the hard one only with the privilege for that. */
+void Raise(__rlimit_resource_t resource, rlim_t value)
+{
+    struct rlimit limit {};
+    if (::getrlimit(resource, &limit) != 0) {
+        return;
+    }
+    const struct rlimit raised = {std::max(limit.rlim_cur, value), std::max(limit.rlim_max, value)};
+    if (::setrlimit(resource, &raised) != 0) {
+        limit.rlim_cur = std::min(raised.rlim_cur, limit.rlim_max);
+        (void)::setrlimit(resource, &limit);
+    }
+}
+
+/**
+ * What a client allows itself is not for what it starts: the network program writes files, and a
+ * switch that is started for it stays and serves everybody.
+ */
+void LeaveClientsLimits()
+{
+    constexpr rlim_t kDescriptors = 1024;
+    for (const auto resource : {RLIMIT_AS, RLIMIT_CPU, RLIMIT_DATA, RLIMIT_FSIZE}) {
+        Raise(resource, RLIM_INFINITY);
+    }
+    Raise(RLIMIT_NOFILE, kDescriptors);
+}
+
 void Run(const Task& task)
 {
     const Descriptor errors = MemoryFile(task);
@@ -221,6 +249,7 @@ int main(int argc, char** argv)
     const sigset_t all = FullSignalSet();
     (void)::sigprocmask(SIG_SETMASK, &all, nullptr);
     (void)::close_range(3, ~0U, CLOSE_RANGE_CLOEXEC);
+    LeaveClientsLimits();
     ::umask(022); // a client's own mask must not decide who can read or write what programs make
 
     const std::optional<Task> task = ParseArguments({argv, argv + argc});

@@ -2,12 +2,12 @@
 
 #include "atomicfile.h"
 #include "interfacename.h"
+#include "keyvaluefile.h"
 
 #include <algorithm>
 #include <arpa/inet.h>
 #include <cerrno>
 #include <charconv>
-#include <cstdio>
 #include <fcntl.h>
 #include <filesystem>
 #include <memory>
@@ -27,18 +27,11 @@ constexpr char kIPv6Word[] = "inet6";
 
 std::optional<std::string> ReadWholeFile(const std::string& path)
 {
-    const std::unique_ptr<std::FILE, int (*)(std::FILE*)> file(std::fopen(path.c_str(), "re"),
-                                                               &std::fclose);
+    const auto file = KeyValueFile::Load(path); // which no FIFO in its place holds up
     if (!file) {
         return errno == ENOENT ? std::optional<std::string>("") : std::nullopt;
     }
-
-    std::string text;
-    char part[4096];
-    while (const std::size_t count = std::fread(part, 1, sizeof(part), file.get())) {
-        text.append(part, count);
-    }
-    return std::ferror(file.get()) == 0 ? std::optional<std::string>(text) : std::nullopt;
+    return file->Text();
 }
 
 std::optional<unsigned> ParseMetric(const std::string& text)

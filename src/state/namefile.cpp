@@ -157,6 +157,14 @@ bool ReplaceByRename(const std::string& path, std::string_view text, const struc
     return true;
 }
 
+/** @return whether it may have no end, and holds no list in any case. */
+bool IsDevice(int descriptor)
+{
+    struct stat status {};
+    (void)::fstat(descriptor, &status);
+    return S_ISCHR(status.st_mode);
+}
+
 bool RemoveNames(const std::string& path)
 {
     // Truncated first: should the removal fail, what stays is an empty list.
@@ -179,7 +187,7 @@ bool MakeStateFolder()
 bool ReadNames(const std::string& path, std::set<std::string>& names)
 {
     const File file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
-    if (!file) {
+    if (!file || IsDevice(file.Get())) {
         return false;
     }
 

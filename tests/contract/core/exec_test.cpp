@@ -6,6 +6,7 @@
 #include <array>
 #include <chrono>
 #include <cstdlib>
+#include <filesystem>
 #include <string>
 #include <thread>
 #include <vector>
@@ -113,6 +114,53 @@ TEST(Exec, PassesTheArgumentsAsTheyAre)
     const std::array<const char*, 5> argv = {script.c_str(), "a b", "", "$HOME;*'\"", nullptr};
     EXPECT_EQ(VLIBCExecv(script.c_str(), argv.data(), 1), 0);
     EXPECT_EQ(ReadFile("/tmp/given"), expected);
+}
+
+TEST(Exec, TakesNoNameForTheBeginningOfAnotherCommandOfTheSwitch)
+{
+    harness::SystemLog log;
+    EXPECT_LT(VLIBCExec("/usr/bin/ovs-vsctl", "del-port", "eth0", "--", nullptr), 0);
+    EXPECT_NE(VLIBCExecl("/usr/bin/ovs-vsctl", kOptions, "set", "port", "--", "tag=1", nullptr), 0);
+    EXPECT_EQ(VLIBCPopen("/usr/bin/ovs-vsctl", "r", "get", "port", "--", "tag", nullptr), nullptr);
+    EXPECT_THAT(log.Lines(), testing::Each("4 /usr/bin/ovs-vsctl is not run: \"--\" is no name"));
+    EXPECT_EQ(log.Lines().size(), 3U);
+}
+
+struct NoFile {
+    const char* name;
+    void (*put)(const char* path);
+};
+
+class CopyOnTo : public testing::TestWithParam<NoFile> {};
+
+TEST_P(CopyOnTo, IsRefusedAndSoIsTheWayBack)
+{
+    scene::MakeFolder("/run/copies");
+    WriteFile("/run/copies/source", "text");
+    GetParam().put("/run/copies/target");
+    const auto begin = std::chrono::steady_clock::now();
+    EXPECT_LT(VLIBCExec("/bin/cp", "-f", "/run/copies/source", "/run/copies/target", nullptr), 0);
+    EXPECT_LT(VLIBCExec("/bin/cp", "-f", "/run/copies/target", "/run/copies/other", nullptr), 0);
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(10));
+    EXPECT_THAT(scene::Names("/run/copies"), ElementsAre("source", "target"));
+    std::filesystem::remove_all("/run/copies");
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    IsFrom, CopyOnTo,
+    testing::Values(NoFile{"AFolder", [](const char* path) { (void)::mkdir(path, 0755); }},
+                    NoFile{"AFifo", [](const char* path) { (void)::mkfifo(path, 0600); }},
+                    NoFile{"ADevice",
+                           [](const char* path) { (void)!::symlink("/dev/null", path); }}),
+    [](const auto& row) { return row.param.name; });
+
+TEST(Exec, CopiesFilesThroughLinks)
+{
+    WriteFile("/tmp/source", "text");
+    WriteFile("/tmp/target", "older");
+    (void)!::symlink("/tmp/target", "/tmp/link");
+    EXPECT_EQ(VLIBCExec("/bin/cp", "-f", "/tmp/source", "/tmp/link", nullptr), 0);
+    EXPECT_EQ(ReadFile("/tmp/target"), "text");
 }
 
 TEST(Exec, PassesAsManyArgumentsAsThereAre)

@@ -43,6 +43,15 @@ TEST_F(GatewayStoreTest, CannotBeLoadedFromAFolder)
     EXPECT_FALSE(GatewayStore::Load().has_value());
 }
 
+TEST_F(GatewayStoreTest, IsNotHeldUpByAFifoInTheFilesPlace)
+{
+    WriteFile(vornhost::kGatewayStorePath, "");
+    contract::Delete(vornhost::kGatewayStorePath);
+    ASSERT_EQ(mkfifo(vornhost::kGatewayStorePath, 0600), 0);
+
+    EXPECT_FALSE(GatewayStore::Load().has_value());
+}
+
 TEST_F(GatewayStoreTest, ReadsBothFamiliesAndMetrics)
 {
     WriteFile(vornhost::kGatewayStorePath, "eth0 inet 192.0.2.1\n"

@@ -91,6 +91,15 @@ TEST_P(SavedNames, DoNotWaitForAFifosReader)
     EXPECT_EQ(platform.Log(), GetParam().Refused(GetParam().addFails));
 }
 
+TEST_P(SavedNames, AreNotReadFromADeviceWithoutAnEnd)
+{
+    const RecordingPlatform platform;
+    fs::create_symlink("/dev/zero", GetParam().path);
+    EXPECT_EQ(VORN::OVS::OVSRegConf().LoadFromConfig(),
+              GetParam().path == unit::kRegistry ? -1 : 0);
+    EXPECT_EQ(VORN::OVS::OVSIfsConf(GetParam().path).LoadFromConfig(), -1);
+}
+
 TEST_P(SavedNames, AreRefusedByAFolderOfThatName)
 {
     RecordingPlatform platform;

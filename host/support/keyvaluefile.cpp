@@ -198,6 +198,9 @@ void KeyValueFile::Erase(const Line& line)
     // The file ended without a line break: what is its last line now does so too.
     const std::string_view last = std::string_view(m_text).substr(LastLine());
     const std::string keptBreak = ending.empty() || !last.ends_with("\r\n") ? "" : "\r";
+    if (Content(last).empty() && keptBreak.empty()) {
+        return; // an empty line is nothing but its line break
+    }
     m_text.resize(LastLine() + Content(last).size());
     m_text += keptBreak;
 }

@@ -204,6 +204,7 @@ INSTANTIATE_TEST_SUITE_P(
                     TextEdit{"AFileOfThatKeyAlone", "KEY=1\n", ""},
                     TextEdit{"AFileOfThatKeyAloneWithoutALineBreak", "KEY=1", ""},
                     TextEdit{"AFileWithTheKeyInAnOpenLastLine", "A=1\nKEY=1", "A=1"},
+                    TextEdit{"AFileWithAnEmptyLineBeforeThat", "A=1\n\nKEY=1", "A=1\n\n"},
                     TextEdit{"AFileOfCarriageReturns", "A=1\r\nKEY=1\r\n", "A=1\r\n"}),
     [](const auto& row) { return row.param.name; });
 

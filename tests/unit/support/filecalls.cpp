@@ -37,11 +37,22 @@ struct State {
 
 State* g_state = nullptr;
 
+/** Notes a call for List(). */
+template <typename Text>
+void Note(const Text& text)
+{
+    if (g_state != nullptr) {
+        const harness::HarnessAllocations guard;
+        g_state->calls.push_back(text());
+    }
+}
+
 bool Fails(const char* function)
 {
     if (g_state == nullptr) {
         return false;
     }
+    const harness::HarnessAllocations guard;
     const auto found = g_state->failures.find(function);
     if (found == g_state->failures.end()) {
         return false;
@@ -247,18 +258,14 @@ int lstat(const char* path, struct stat* status) noexcept
 int fsync(int descriptor)
 {
     const unit::Watched watched("fsync", [&] { return unit::PathOfDescriptor(descriptor); });
-    if (unit::g_state != nullptr) {
-        unit::g_state->calls.push_back("fsync " + unit::NameOfDescriptor(descriptor));
-    }
+    unit::Note([&] { return "fsync " + unit::NameOfDescriptor(descriptor); });
     return watched.Fails() || unit::Fails("fsync") ? -1 : Next<int (*)(int)>("fsync")(descriptor);
 }
 
 int rename(const char* from, const char* to) noexcept
 {
     const unit::Watched watched("rename", [&] { return std::string(from) + " " + to; });
-    if (unit::g_state != nullptr) {
-        unit::g_state->calls.push_back("rename " + unit::BaseName(from) + " " + unit::BaseName(to));
-    }
+    unit::Note([&] { return "rename " + unit::BaseName(from) + " " + unit::BaseName(to); });
     return watched.Fails() || unit::Fails("rename")
                ? -1
                : Next<int (*)(const char*, const char*)>("rename")(from, to);
@@ -267,9 +274,7 @@ int rename(const char* from, const char* to) noexcept
 int unlink(const char* path) noexcept
 {
     const unit::Watched watched("unlink", [&] { return path; });
-    if (unit::g_state != nullptr) {
-        unit::g_state->calls.push_back("unlink " + unit::BaseName(path));
-    }
+    unit::Note([&] { return "unlink " + unit::BaseName(path); });
     return watched.Fails() || unit::Fails("unlink") ? -1
                                                     : Next<int (*)(const char*)>("unlink")(path);
 }

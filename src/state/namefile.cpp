@@ -52,23 +52,42 @@ private:
             m_path = m_target + ".new" + (number == 0 ? "" : std::to_string(number));
             const int descriptor =
                 ::open(m_path.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC | O_NOFOLLOW, kNewFileMode);
-            if (descriptor < 0 || (IsOurs(descriptor) && ::ftruncate(descriptor, 0) == 0)) {
+            if (descriptor < 0) {
+                return descriptor;
+            }
+            const int error = Take(descriptor);
+            if (error == 0) {
                 return descriptor;
             }
             (void)::close(descriptor);
+            if (error != EWOULDBLOCK) {
+                (void)::unlink(m_path.c_str());
+                errno = error;
+                return -1;
+            }
         }
         errno = EAGAIN;
         return -1;
     }
 
-    /** Locks the file. @return whether it is ours and still stands there. */
-    [[nodiscard]] bool IsOurs(int descriptor) const
+    /**
+     * Locks the file and empties it.
+     * @return  0 it is ours; EWOULDBLOCK it is another writer's, or was; else an error.
+     */
+    [[nodiscard]] int Take(int descriptor) const
     {
         struct stat opened {};
         struct stat named {};
-        return ::flock(descriptor, LOCK_EX | LOCK_NB) == 0 && ::fstat(descriptor, &opened) == 0 &&
-               ::lstat(m_path.c_str(), &named) == 0 && opened.st_ino == named.st_ino &&
-               opened.st_dev == named.st_dev;
+        if (::flock(descriptor, LOCK_EX | LOCK_NB) != 0 || ::fstat(descriptor, &opened) != 0) {
+            return errno;
+        }
+        if (::lstat(m_path.c_str(), &named) != 0) {
+            return errno == ENOENT ? EWOULDBLOCK : errno;
+        }
+        if (opened.st_ino != named.st_ino || opened.st_dev != named.st_dev) {
+            return EWOULDBLOCK;
+        }
+        return ::ftruncate(descriptor, 0) == 0 ? 0 : errno;
     }
 
     const std::string& m_target;

@@ -7,10 +7,11 @@
 #include <gtest/gtest.h>
 
 #include <cstdarg>
+#include <utility>
 
 using harness::CallText;
 using harness::Expect;
-using harness::HarnessAllocations;
+using harness::PlatformCall;
 using harness::Recorder;
 
 namespace {
@@ -38,6 +39,10 @@ FILE* OpenPipe(Recorder& recorder, const std::string& call, const std::string& c
         pipe.text = output->text;
         pipe.status = output->status;
     }
+    if (const auto once = std::exchange(recorder.m_nextOutput, std::nullopt)) {
+        pipe.text = once->text;
+        pipe.status = once->status;
+    }
     FILE* const stream = std::tmpfile();
     if (stream == nullptr) {
         harness::Abort("no temporary file for a program's output");
@@ -53,7 +58,7 @@ FILE* OpenPipe(Recorder& recorder, const std::string& call, const std::string& c
 
 int VLIBCExec(const char* path, ...)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCExec");
     va_list list;
     va_start(list, path);
@@ -73,7 +78,7 @@ int VLIBCExec(const char* path, ...)
 
 int VLIBCExecl(const char* path, int options, ...)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCExecl");
     va_list list;
     va_start(list, options);
@@ -86,7 +91,7 @@ int VLIBCExecl(const char* path, int options, ...)
 
 int VLIBCExecv(const char* path, const char* const argv[], int wait)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCExecv");
     if (path == nullptr || argv == nullptr) {
         return recorder.Call("VLIBCExecv").value_or(-1);
@@ -102,7 +107,7 @@ int VLIBCExecv(const char* path, const char* const argv[], int wait)
 
 FILE* VLIBCPopen(const char* path, const char* mode, ...)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCPopen");
     va_list list;
     va_start(list, mode);
@@ -120,7 +125,7 @@ FILE* VLIBCPopen(const char* path, const char* mode, ...)
 
 int VLIBCPclose(FILE* stream)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCPclose");
     if (!recorder.Close(stream, "VLIBCPclose")) {
         return -1;
@@ -134,7 +139,7 @@ int VLIBCPclose(FILE* stream)
 
 int VLIBServiceIsRunning(const char* name)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBServiceIsRunning");
     return recorder
         .Call(CallText("VLIBServiceIsRunning", {harness::Text("VLIBServiceIsRunning", name)}))
@@ -143,7 +148,7 @@ int VLIBServiceIsRunning(const char* name)
 
 int VLIBServiceStart(const char* name, int flags)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBServiceStart");
     Expect("VLIBServiceStart", "flags", flags, 0);
     return recorder.Call(CallText("VLIBServiceStart", {harness::Text("VLIBServiceStart", name)}))
@@ -152,7 +157,7 @@ int VLIBServiceStart(const char* name, int flags)
 
 int VLIBServiceStop(const char* name, int flags)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBServiceStop");
     Expect("VLIBServiceStop", "flags", flags, 0);
     return recorder.Call(CallText("VLIBServiceStop", {harness::Text("VLIBServiceStop", name)}))
@@ -161,7 +166,7 @@ int VLIBServiceStop(const char* name, int flags)
 
 int VLIBServiceRestart(const char* name)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBServiceRestart");
     return recorder
         .Call(CallText("VLIBServiceRestart", {harness::Text("VLIBServiceRestart", name)}))

@@ -8,7 +8,7 @@
 #include <new>
 
 using harness::CallText;
-using harness::HarnessAllocations;
+using harness::PlatformCall;
 using harness::Recorder;
 
 namespace vornnetsdk::hook {
@@ -21,7 +21,7 @@ struct BaseHook::State {
 
 BaseHook::BaseHook(const std::string& category, const std::string& name)
     : m_state([&] {
-          const HarnessAllocations guard;
+          const PlatformCall guard;
           Recorder& recorder = Recorder::Current("BaseHook");
           if (recorder.Housekeeping(CallText("BaseHook", {category, name})).value_or(1) == 0) {
               throw std::bad_alloc();
@@ -35,7 +35,7 @@ BaseHook::BaseHook(const std::string& category, const std::string& name)
 
 int BaseHook::SetEnv(const std::string& key, const std::string& value)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("SetEnv");
     m_state->environment.push_back(key + "=" + value);
     return recorder.Housekeeping(CallText("SetEnv", {key, value})).value_or(0);
@@ -43,13 +43,13 @@ int BaseHook::SetEnv(const std::string& key, const std::string& value)
 
 bool BaseHook::IsValid()
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     return Recorder::Current("IsValid").Call("IsValid").value_or(1) != 0;
 }
 
 int BaseHook::ExecHook(_tag_sdk_plugin_action_ action)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("ExecHook");
     std::vector<std::string> words{m_state->category, m_state->name,
                                    std::to_string(static_cast<int>(action))};
@@ -59,7 +59,7 @@ int BaseHook::ExecHook(_tag_sdk_plugin_action_ action)
 
 BaseHook::~BaseHook()
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("~BaseHook");
     (void)recorder.Housekeeping("~BaseHook");
     if (recorder.Close(m_state, "~BaseHook")) {

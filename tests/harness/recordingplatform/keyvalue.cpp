@@ -12,8 +12,8 @@
 
 using harness::CallText;
 using harness::Expect;
-using harness::HarnessAllocations;
 using harness::KeyValues;
+using harness::PlatformCall;
 using harness::Recorder;
 using harness::Text;
 
@@ -61,7 +61,7 @@ void MoveHash(Recorder& recorder, VLIBCSzHash** hash)
 
 int VLIBCFileGetKeyValue(const char* path, const char* key, char* value, int size, int flags)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCFileGetKeyValue");
     const std::string file = Text("VLIBCFileGetKeyValue", path);
     const std::string name = Text("VLIBCFileGetKeyValue", key);
@@ -82,7 +82,7 @@ int VLIBCFileGetKeyValue(const char* path, const char* key, char* value, int siz
 
 int VLIBCFileSetKeyValue(const char* path, const char* key, const char* value, int flags)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCFileSetKeyValue");
     const std::string file = Text("VLIBCFileSetKeyValue", path);
     const KeyValues set{{Text("VLIBCFileSetKeyValue", key), Text("VLIBCFileSetKeyValue", value)}};
@@ -95,7 +95,7 @@ int VLIBCFileSetKeyValue(const char* path, const char* key, const char* value, i
 
 int VLIBCFileSetKeys(const char* path, VLIBCSzHash* set, VLIBCSzHash* remove, const char* format)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCFileSetKeys");
     const std::string file = Text("VLIBCFileSetKeys", path);
     EXPECT_STREQ(format, kLineFormat);
@@ -120,7 +120,7 @@ int VLIBCFileSetKeys(const char* path, VLIBCSzHash* set, VLIBCSzHash* remove, co
 
 int VLIBCFileRemoveKey(const char* path, const char* key)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCFileRemoveKey");
     const std::string file = Text("VLIBCFileRemoveKey", path);
     const KeyValues remove{{Text("VLIBCFileRemoveKey", key), ""}};
@@ -132,7 +132,7 @@ int VLIBCFileRemoveKey(const char* path, const char* key)
 
 int VLIBCFileCheckKeyValue(const char* path, const char* key, const char* value, int flags)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCFileCheckKeyValue");
     Expect("VLIBCFileCheckKeyValue", "flags", flags, 0);
     return recorder
@@ -144,7 +144,7 @@ int VLIBCFileCheckKeyValue(const char* path, const char* key, const char* value,
 
 int VLIBCFileExist(const char* path)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCFileExist");
     const std::string file = Text("VLIBCFileExist", path);
     const std::optional<int> answer = recorder.Call(CallText("VLIBCFileExist", {file}));
@@ -154,7 +154,7 @@ int VLIBCFileExist(const char* path)
 
 int VLIBCFileCheckDir(const char* path)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCFileCheckDir");
     const std::string folder = Text("VLIBCFileCheckDir", path);
     const std::optional<int> answer = recorder.Call(CallText("VLIBCFileCheckDir", {folder}));
@@ -165,7 +165,7 @@ int VLIBCFileCheckDir(const char* path)
 
 VLIBCSzHash* VLIBCSzHashAlloc(int size)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCSzHashAlloc");
     Expect("VLIBCSzHashAlloc", "size", size, kHashSize);
     if (recorder.Housekeeping("VLIBCSzHashAlloc").value_or(1) == 0) {
@@ -178,7 +178,7 @@ VLIBCSzHash* VLIBCSzHashAlloc(int size)
 
 int VLIBCSzHashSetValue(VLIBCSzHash** hash, const char* key, const char* value)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCSzHashSetValue");
     const std::string name = Text("VLIBCSzHashSetValue", key);
     const std::string text = Text("VLIBCSzHashSetValue", value);
@@ -204,7 +204,7 @@ int VLIBCSzHashSetValue(VLIBCSzHash** hash, const char* key, const char* value)
 
 void VLIBCSzHashFree(VLIBCSzHash* hash)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCSzHashFree");
     (void)recorder.Housekeeping("VLIBCSzHashFree");
     if (recorder.Close(hash, "VLIBCSzHashFree")) {
@@ -214,7 +214,7 @@ void VLIBCSzHashFree(VLIBCSzHash* hash)
 
 VLIBCSzList* VLIBCSzListAlloc(int size)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCSzListAlloc");
     Expect("VLIBCSzListAlloc", "size", size, kListSize);
     if (recorder.Housekeeping("VLIBCSzListAlloc").value_or(1) == 0) {
@@ -228,7 +228,7 @@ VLIBCSzList* VLIBCSzListAlloc(int size)
 
 const char* VLIBCSzListGet(VLIBCSzList* list, int index)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCSzListGet");
     if (!recorder.IsOpen(list, "VLIBCSzListGet") || index < 0 || index >= list->nItem) {
         return nullptr;
@@ -238,7 +238,7 @@ const char* VLIBCSzListGet(VLIBCSzList* list, int index)
 
 void VLIBCSzListFree(VLIBCSzList* list)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCSzListFree");
     (void)recorder.Housekeeping("VLIBCSzListFree");
     if (recorder.Close(list, "VLIBCSzListFree")) {
@@ -260,7 +260,7 @@ List* MoveList(Recorder& recorder, VLIBCSzList** list)
 
 int VLIBCStrSep(const char* text, const char* separator, VLIBCSzList** list)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCStrSep");
     const std::string source = Text("VLIBCStrSep", text);
     const std::string blank = Text("VLIBCStrSep", separator);
@@ -281,7 +281,7 @@ int VLIBCStrSep(const char* text, const char* separator, VLIBCSzList** list)
 
 int VLIBCStrTrimSpace(const char* source, char* destination)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBCStrTrimSpace");
     const std::string text = Text("VLIBCStrTrimSpace", source);
     const std::optional<int> answer = recorder.Housekeeping(CallText("VLIBCStrTrimSpace", {text}));

@@ -9,8 +9,8 @@
 #include <syslog.h>
 #include <unistd.h>
 
-using harness::HarnessAllocations;
 using harness::LogLine;
+using harness::PlatformCall;
 using harness::Recorder;
 
 namespace {
@@ -31,7 +31,7 @@ LogLine Parse(int priority, const std::string& line)
 
 __attribute__((format(printf, 2, 0))) void Log(int priority, const char* format, va_list arguments)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("syslog");
     if (!std::string_view(format).starts_with(kPrefix)) {
         ADD_FAILURE() << "the log format does not begin with \"" << kPrefix << "\": " << format;
@@ -54,7 +54,7 @@ extern "C" {
 
 unsigned int sleep(unsigned int seconds)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     const std::optional<int> left =
         Recorder::Current("sleep").Call("sleep " + std::to_string(seconds));
     return static_cast<unsigned int>(left.value_or(0));

@@ -12,7 +12,7 @@
 
 using harness::CallText;
 using harness::Expect;
-using harness::HarnessAllocations;
+using harness::PlatformCall;
 using harness::Recorder;
 using harness::Text;
 
@@ -50,7 +50,7 @@ std::string Name(const char* function, const char (&field)[VORN_NAME_SIZE])
 
 int VLIBNetGetInterfaceInfo(VLIBNETIFINFO* entries, int capacity, int selector)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBNetGetInterfaceInfo");
     Expect("VLIBNetGetInterfaceInfo", "capacity", capacity, kInterfaceCapacity);
     Expect("VLIBNetGetInterfaceInfo", "selector", selector, kConvertible);
@@ -72,7 +72,7 @@ int VLIBNetGetInterfaceInfo(VLIBNETIFINFO* entries, int capacity, int selector)
 
 int VLIBNetBridgeIfIsMaster(const char* name)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBNetBridgeIfIsMaster");
     return recorder
         .Call(CallText("VLIBNetBridgeIfIsMaster", {Text("VLIBNetBridgeIfIsMaster", name)}))
@@ -81,7 +81,7 @@ int VLIBNetBridgeIfIsMaster(const char* name)
 
 int VLIBNetVlanGet(const char* name, _tag_VLIB_VLAN* vlan)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBNetVlanGet");
     const std::string interface = Text("VLIBNetVlanGet", name);
     const std::optional<int> answer = recorder.Call(CallText("VLIBNetVlanGet", {interface}));
@@ -94,7 +94,7 @@ int VLIBNetVlanGet(const char* name, _tag_VLIB_VLAN* vlan)
 
 int VLIBNetVlanCreate(const char* parent, int vlanId, const VORNNETIPCONFIG* ipConfig)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBNetVlanCreate");
     std::array<char, sizeof(VORNNETIPCONFIG)> owner{};
     std::memcpy(owner.data(), ipConfig, owner.size() - 1);
@@ -106,7 +106,7 @@ int VLIBNetVlanCreate(const char* parent, int vlanId, const VORNNETIPCONFIG* ipC
 
 int VLIBNetVlanRemove(const char* name)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBNetVlanRemove");
     return recorder.Call(CallText("VLIBNetVlanRemove", {Text("VLIBNetVlanRemove", name)}))
         .value_or(0);
@@ -114,7 +114,7 @@ int VLIBNetVlanRemove(const char* name)
 
 int VLIBNetOVSIfIsMaster(const char* name)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VLIBNetOVSIfIsMaster");
     return recorder.Call(CallText("VLIBNetOVSIfIsMaster", {Text("VLIBNetOVSIfIsMaster", name)}))
         .value_or(1);
@@ -122,7 +122,7 @@ int VLIBNetOVSIfIsMaster(const char* name)
 
 int VORNNetGetEthInfo(VORNNETETHINFO* info, const char* name)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VORNNetGetEthInfo");
     const std::string interface = Text("VORNNetGetEthInfo", name);
     const std::optional<int> answer = recorder.Call(CallText("VORNNetGetEthInfo", {interface}));
@@ -140,7 +140,7 @@ int VORNNetGetEthInfo(VORNNETETHINFO* info, const char* name)
 
 int VORNNetIFGetIPConfig(const char* name, VORNNETIPCONFIG* ipConfig)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VORNNetIFGetIPConfig");
     const std::string interface = Text("VORNNetIFGetIPConfig", name);
     const std::optional<int> answer = recorder.Call(CallText("VORNNetIFGetIPConfig", {interface}));
@@ -154,7 +154,7 @@ int VORNNetIFGetIPConfig(const char* name, VORNNETIPCONFIG* ipConfig)
 
 int VORNNetLinkAggrGet(const char* name, VORNLINKAGGROPT* opt)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VORNNetLinkAggrGet");
     const std::string bond = Text("VORNNetLinkAggrGet", name);
     const std::optional<int> answer = recorder.Call(CallText("VORNNetLinkAggrGet", {bond}));
@@ -168,7 +168,7 @@ int VORNNetLinkAggrGet(const char* name, VORNLINKAGGROPT* opt)
 
 int VORNNetLinkAggrSet(const VORNLINKAGGROPT* opt)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VORNNetLinkAggrSet");
     std::vector<std::string> words{Name("VORNNetLinkAggrSet", opt->szMaster),
                                    "mode=" + std::to_string(static_cast<int>(opt->mode))};
@@ -180,7 +180,7 @@ int VORNNetLinkAggrSet(const VORNLINKAGGROPT* opt)
 
 VORN_LINK_AGGR_MODE VORNNetLinkAggrStringToMode(const char* text)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VORNNetLinkAggrStringToMode");
     const std::string name = Text("VORNNetLinkAggrStringToMode", text);
     const std::optional<int> answer =
@@ -193,7 +193,7 @@ VORN_LINK_AGGR_MODE VORNNetLinkAggrStringToMode(const char* text)
 
 const char* VORNNetLinkAggrModeToString(VORN_LINK_AGGR_MODE mode)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VORNNetLinkAggrModeToString");
     const int value = static_cast<int>(mode);
     (void)recorder.Call(CallText("VORNNetLinkAggrModeToString", {std::to_string(value)}));
@@ -203,7 +203,7 @@ const char* VORNNetLinkAggrModeToString(VORN_LINK_AGGR_MODE mode)
 
 int VORNNetLinkAggrOptSlsaveAdd(VORNLINKAGGROPT* opt, const char* slave)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VORNNetLinkAggrOptSlsaveAdd");
     const std::string name = Text("VORNNetLinkAggrOptSlsaveAdd", slave);
     const int result = recorder.Call(CallText("VORNNetLinkAggrOptSlsaveAdd", {name})).value_or(0);
@@ -220,7 +220,7 @@ int VORNNetLinkAggrOptSlsaveAdd(VORNLINKAGGROPT* opt, const char* slave)
 
 int VORNNetBondIPConflict(const char* bond, char* conflict, int size, unsigned int* out)
 {
-    const HarnessAllocations guard;
+    const PlatformCall guard;
     Recorder& recorder = Recorder::Current("VORNNetBondIPConflict");
     Expect("VORNNetBondIPConflict", "size", size, kConflictSize);
     ExpectZeroed("VORNNetBondIPConflict", conflict, kConflictSize);

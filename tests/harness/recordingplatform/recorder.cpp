@@ -26,7 +26,7 @@ bool IsReadable(const void* address)
 
 } // namespace
 
-int HarnessAllocations::s_depth = 0;
+thread_local int HarnessAllocations::s_depth = 0;
 Recorder* Recorder::s_current = nullptr;
 
 void Abort(const std::string& message)
@@ -101,6 +101,22 @@ bool Matches(const std::string& call, const std::string& words)
     return call.starts_with(words) && (call.size() == words.size() || call[words.size()] == ' ');
 }
 
+PlatformCall::PlatformCall()
+{
+    static std::recursive_mutex s_mutex;
+    m_oneThread = std::unique_lock(s_mutex);
+    if (Recorder::IsAlive() && Recorder::Current("").m_before) {
+        Recorder::Current("").m_before();
+    }
+}
+
+PlatformCall::~PlatformCall()
+{
+    if (Recorder::IsAlive() && Recorder::Current("").m_after) {
+        Recorder::Current("").m_after();
+    }
+}
+
 Recorder& Recorder::Current(const char* function)
 {
     if (s_current == nullptr) {
@@ -127,7 +143,7 @@ Recorder::~Recorder()
     if (m_heldLock != -1) {
         ADD_FAILURE() << "left locked: the lock file, handle " << m_heldLock;
     }
-    if (m_holdsPlatformLock) {
+    if (m_platformLockHolder != std::thread::id()) {
         ADD_FAILURE() << "left locked: the platform's file lock";
     }
 }
@@ -148,7 +164,10 @@ std::optional<int> Recorder::Housekeeping(const std::string& text)
 
 std::optional<int> Recorder::AnswerFor(const std::string& text)
 {
-    std::optional<int> answer;
+    std::optional<int> answer = m_interception ? m_interception(text) : std::nullopt;
+    if (answer) {
+        return answer;
+    }
     for (Rule& rule : m_rules) {
         if (!Matches(text, rule.call)) {
             continue;

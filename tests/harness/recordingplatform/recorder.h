@@ -9,10 +9,12 @@
 #include <cstdarg>
 #include <functional>
 #include <map>
+#include <mutex>
 #include <optional>
 #include <set>
 #include <string>
 #include <string_view>
+#include <thread>
 #include <utility>
 #include <vector>
 
@@ -83,7 +85,10 @@ public:
         int status;
     };
 
+    std::function<std::optional<int>(const std::string&)> m_interception;
     std::function<std::optional<int>(const std::string&)> m_reaction;
+    std::function<void()> m_before;
+    std::function<void()> m_after;
     std::vector<Rule> m_rules;
     std::vector<std::string> m_calls;
     std::vector<std::string> m_allCalls;
@@ -95,6 +100,7 @@ public:
     std::map<const void*, OpenHandle> m_open;
 
     std::vector<std::pair<std::string, ProgramOutput>> m_outputs;
+    std::optional<ProgramOutput> m_nextOutput;
     std::map<const void*, OpenPipe> m_pipes;
     std::vector<std::string> m_interfaces{"eth0"};
     std::map<std::string, _tag_VLIB_VLAN> m_vlans;
@@ -104,7 +110,10 @@ public:
     std::map<std::string, Link> m_links;
     std::optional<int> m_lockHandle;
     int m_heldLock = -1;
-    bool m_holdsPlatformLock = false;
+    /** The thread that holds the platform's file lock; none: nobody does. */
+    std::thread::id m_platformLockHolder;
+    bool m_takesRealLocks = false;
+    int m_realPlatformLock = -1;
     bool m_carryOutEdits = false;
     bool m_fillNamesWhole = false;
 
@@ -112,6 +121,19 @@ private:
     std::optional<int> AnswerFor(const std::string& text);
 
     static Recorder* s_current;
+};
+
+/** Around the body of every function of the platform. */
+class PlatformCall {
+public:
+    PlatformCall();
+    ~PlatformCall();
+    PlatformCall(const PlatformCall&) = delete;
+    PlatformCall& operator=(const PlatformCall&) = delete;
+
+private:
+    HarnessAllocations m_allocations;
+    std::unique_lock<std::recursive_mutex> m_oneThread;
 };
 
 /** Whether the call is, or begins with, the words. */

@@ -82,6 +82,27 @@ void RecordingPlatform::Output(const std::string& call, const std::string& text,
     outputs.emplace_back(call, Recorder::ProgramOutput{text, status});
 }
 
+void RecordingPlatform::OutputOnce(const std::string& text, int status)
+{
+    m_recorder->m_nextOutput = {text, status};
+}
+
+void RecordingPlatform::Intercept(std::function<std::optional<int>(const std::string& call)> answer)
+{
+    m_recorder->m_interception = std::move(answer);
+}
+
+void RecordingPlatform::Around(std::function<void()> before, std::function<void()> after)
+{
+    m_recorder->m_before = std::move(before);
+    m_recorder->m_after = std::move(after);
+}
+
+void RecordingPlatform::TakeRealLocks()
+{
+    m_recorder->m_takesRealLocks = true;
+}
+
 void RecordingPlatform::Interfaces(const std::vector<std::string>& names)
 {
     m_recorder->m_interfaces = names;
@@ -174,7 +195,7 @@ std::vector<std::string> RecordingPlatform::OpenHandles() const
     if (m_recorder->m_heldLock != -1) {
         result.emplace_back("the lock file");
     }
-    if (m_recorder->m_holdsPlatformLock) {
+    if (m_recorder->m_platformLockHolder != std::thread::id()) {
         result.emplace_back("the platform's file lock");
     }
     return result;

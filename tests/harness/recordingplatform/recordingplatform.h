@@ -79,6 +79,24 @@ public:
     /** What a program started with VLIBCPopen() prints, and the wait status it ends with. */
     void Output(const std::string& call, const std::string& text, int status = 0);
 
+    /** The same for the next program alone, whatever it is. */
+    void OutputOnce(const std::string& text, int status = 0);
+
+    /** Answers before all others, also for what only AllCalls() has: the handling of memory. */
+    void Intercept(std::function<std::optional<int>(const std::string& call)> answer);
+
+    /**
+     * What happens around every function of the platform: `before` it does or records anything, and
+     * `after` it has done what it does. Only one thread is in the platform at a time.
+     */
+    void Around(std::function<void()> before, std::function<void()> after);
+
+    /**
+     * Locks are the system's, so that other threads and processes wait for them, which is not
+     * recorded, and they go with a process that dies.
+     */
+    void TakeRealLocks();
+
     /** The host's interfaces, in the order listed. */
     void Interfaces(const std::vector<std::string>& names);
 
@@ -143,7 +161,7 @@ public:
     static bool Active() noexcept { return s_depth > 0; }
 
 private:
-    static int s_depth;
+    static thread_local int s_depth;
 };
 
 } // namespace harness

@@ -2,79 +2,16 @@
 // so on until a run passes, once with that allocation alone failing and once with all that follow.
 #include "memory/withoutmemory.h"
 
+#include "support/allocations.h"
+
 #include <algorithm>
-#include <cstdlib>
 #include <cstring>
-#include <new>
 #include <utility>
 
-using harness::HarnessAllocations;
 using harness::RecordingPlatform;
 using testing::AnyOf;
 using testing::Contains;
 using testing::IsEmpty;
-
-namespace {
-
-/** Allocations until one fails; 0: none does. */
-long g_countdown = 0;
-bool g_allThatFollow = false;
-bool g_failed = false;
-
-void* Allocate(std::size_t size)
-{
-    if (g_countdown > 0 && !HarnessAllocations::Active()) {
-        if (g_countdown == 1) {
-            g_failed = true;
-            g_countdown = g_allThatFollow ? 1 : 0;
-            return nullptr;
-        }
-        --g_countdown;
-    }
-    return std::malloc(size == 0 ? 1 : size);
-}
-
-} // namespace
-
-// Not inlined: the compiler would see memory from `new` go to `free` and warn of a mismatch.
-[[gnu::noinline]] void* operator new(std::size_t size)
-{
-    void* const memory = Allocate(size);
-    if (memory == nullptr) {
-        throw std::bad_alloc();
-    }
-    return memory;
-}
-
-[[gnu::noinline]] void* operator new[](std::size_t size)
-{
-    return operator new(size);
-}
-
-[[gnu::noinline]] void* operator new(std::size_t size, const std::nothrow_t& /*tag*/) noexcept
-{
-    return Allocate(size);
-}
-
-[[gnu::noinline]] void operator delete(void* memory) noexcept
-{
-    std::free(memory);
-}
-
-[[gnu::noinline]] void operator delete(void* memory, std::size_t /*size*/) noexcept
-{
-    std::free(memory);
-}
-
-[[gnu::noinline]] void operator delete[](void* memory) noexcept
-{
-    std::free(memory);
-}
-
-[[gnu::noinline]] void operator delete[](void* memory, std::size_t /*size*/) noexcept
-{
-    std::free(memory);
-}
 
 namespace unit {
 
@@ -83,17 +20,13 @@ namespace {
 /** Runs with the nth allocation failing. */
 int RunFailing(long nth, bool allThatFollow, const std::function<int()>& run)
 {
-    g_failed = false;
-    g_allThatFollow = allThatFollow;
-    g_countdown = nth;
     int result = 0;
     try {
+        const unit::FailingAllocation failing(nth, allThatFollow);
         result = run();
     } catch (...) {
-        g_countdown = 0;
         ADD_FAILURE() << "an exception left the library at allocation " << nth;
     }
-    g_countdown = 0;
     return result;
 }
 
@@ -176,7 +109,7 @@ TEST_P(WithoutMemory, AnswersItsFailureAndLeavesNothingOpen)
         if (!entry.mayStayStopped) {
             ExpectStartAfterEachStop(platform, nth);
         }
-        if (!g_failed) {
+        if (!FailingAllocation::HasFailed()) {
             EXPECT_EQ(result, entry.success);
             EXPECT_GT(nth, 1) << "nothing was allocated";
             return;

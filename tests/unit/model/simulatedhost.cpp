@@ -64,6 +64,21 @@ void WriteFiles(const Files& files)
     }
 }
 
+/** What bonds of the switch list as theirs, marked or not: the bond's file rules. */
+Names MembersOfBonds()
+{
+    Names members;
+    for (const std::string& file : ListFolder(kScripts)) {
+        const std::string name = file.substr(std::string("ifcfg-").size());
+        const std::string list = KeyOf(name, "SLAVE_LIST").value_or("");
+        if (list.size() > 1) {
+            const std::vector<std::string> slaves = Words(list.substr(1, list.size() - 2));
+            members.insert(slaves.begin(), slaves.end());
+        }
+    }
+    return members;
+}
+
 } // namespace
 
 Files ReadFiles()
@@ -85,16 +100,28 @@ std::optional<std::string> KeyOf(const std::string& interface, const std::string
     return std::nullopt;
 }
 
-SimulatedHost::SimulatedHost(harness::RecordingPlatform& platform) : m_platform(platform)
+SimulatedHost::SimulatedHost(harness::RecordingPlatform& platform)
+    : SimulatedHost(platform, SimulatedState())
+{
+}
+
+SimulatedHost::SimulatedHost(harness::RecordingPlatform& platform, const SimulatedState& state)
+    : SimulatedState(state), m_platform(platform)
 {
     platform.CarryOutFileEdits();
     platform.React([this](const std::string& call) { return React(call); });
     TellPlatform();
 }
 
+void SimulatedHost::Become(const SimulatedState& state)
+{
+    static_cast<SimulatedState&>(*this) = state;
+    TellPlatform();
+}
+
 void SimulatedHost::AddPort(const std::string& name, const std::string& text)
 {
-    m_ports.insert(name);
+    cards.insert(name);
     WriteFile(FileOf(name), "DEVICE=" + name + "\n" + text);
     TellPlatform();
 }
@@ -121,7 +148,7 @@ void SimulatedHost::AddVlan(const std::string& parent, int id, const std::string
 
 void SimulatedHost::TellPlatform()
 {
-    std::vector<std::string> interfaces(m_ports.begin(), m_ports.end());
+    std::vector<std::string> interfaces(cards.begin(), cards.end());
     std::string list;
     m_platform.NoVlansAndBonds();
     for (const auto& [name, bond] : linuxBonds) {
@@ -177,7 +204,7 @@ std::optional<int> SimulatedHost::Exists(const std::string& path) const
         return std::nullopt;
     }
     const std::string name = fs::path(path).parent_path().filename();
-    return bridges.contains(name) || m_ports.contains(name) || linuxBonds.contains(name) ||
+    return bridges.contains(name) || cards.contains(name) || linuxBonds.contains(name) ||
            linuxVlans.contains(name);
 }
 
@@ -232,9 +259,11 @@ void SimulatedHost::RunNetwork(const std::vector<std::string>& words)
         return;
     }
     std::map<std::string, Bridge> live;
+    const Names members = MembersOfBonds();
     for (const std::string& file : ListFolder(kScripts)) {
         const std::string name = file.substr(std::string("ifcfg-").size());
-        if (KeyOf(name, "TYPE") != "OVS" || KeyOf(name, "SLAVE") == "yes") {
+        if (KeyOf(name, "TYPE") != "OVS" || KeyOf(name, "SLAVE") == "yes" ||
+            (!KeyOf(name, "SLAVE_LIST") && members.contains(KeyOf(name, "PRIMARY").value_or("")))) {
             continue;
         }
         live[name] = bridges.contains(name) ? bridges[name] : Bridge();
@@ -253,13 +282,16 @@ int SimulatedHost::SetBond(const std::vector<std::string>& words)
         return bond == linuxBonds.end() ? -1 : TakeBondApart(name, bond->second);
     }
 
+    if (slaves.empty()) {
+        return -1;
+    }
     linuxBonds[name] = {mode, slaves};
     if (m_allowsChanges) {
         BuildNewBond(name, linuxBonds[name]);
         return 0;
     }
-    const auto memory = m_memories.find(name);
-    if (memory == m_memories.end()) {
+    const auto memory = memories.find(name);
+    if (memory == memories.end()) {
         return -1;
     }
     // A tag that was the way of a VLAN's addressing has been taken off by now.
@@ -268,7 +300,7 @@ int SimulatedHost::SetBond(const std::vector<std::string>& words)
     }
     EXPECT_EQ(mode, memory->second.mode) << name;
     WriteFiles(memory->second.before);
-    m_memories.erase(memory);
+    memories.erase(memory);
     return 0;
 }
 
@@ -295,7 +327,7 @@ int SimulatedHost::TakeBondApart(const std::string& name, const LinuxBond& bond)
     }
     fs::remove(FileOf(name));
     memory.left = FilesOf(bond.slaves);
-    m_memories[name] = memory;
+    memories[name] = memory;
     linuxBonds.erase(name);
     return 0;
 }
@@ -312,7 +344,7 @@ int SimulatedHost::RemoveVlan(const std::string& name)
                                   "OVS_VLAN_ID=" + std::to_string(vlan->second.id) + "\n");
     fs::remove(FileOf(name));
     memory.left = FilesOf({parent});
-    m_memories[name] = memory;
+    memories[name] = memory;
     linuxVlans.erase(vlan);
     return 0;
 }
@@ -325,8 +357,8 @@ int SimulatedHost::CreateVlan(const std::string& parent, int id)
         WriteFile(FileOf(name), "DEVICE=" + name + "\nVLAN=yes\n");
         return 0;
     }
-    const auto memory = m_memories.find(name);
-    if (memory == m_memories.end()) {
+    const auto memory = memories.find(name);
+    if (memory == memories.end()) {
         return -1;
     }
     for (const auto& [file, text] : memory->second.left) {
@@ -335,7 +367,7 @@ int SimulatedHost::CreateVlan(const std::string& parent, int id)
             Without(text, {"OVS_VLAN_ID"}));
     }
     WriteFiles(memory->second.before);
-    m_memories.erase(memory);
+    memories.erase(memory);
     return 0;
 }
 

@@ -21,22 +21,8 @@ Files ReadFiles();
 /** The value of a key, or nothing. */
 std::optional<std::string> KeyOf(const std::string& interface, const std::string& key);
 
-class SimulatedHost {
-public:
-    explicit SimulatedHost(harness::RecordingPlatform& platform);
-
-    /** Adds an interface; the rest of its file stands in `text`, one key a line. */
-    void AddPort(const std::string& name, const std::string& text);
-    void AddBond(const std::string& name, int mode, const std::vector<std::string>& slaves,
-                 const std::string& text);
-    void AddVlan(const std::string& parent, int id, const std::string& text);
-
-    /**
-     * From now on bonds and VLANs may come back otherwise than they went, or for the first time:
-     * without this the test fails unless everything is as it was left.
-     */
-    void AllowChanges() { m_allowsChanges = true; }
-
+/** What a host's kernel and switch have, and what its platform remembers. */
+struct SimulatedState {
     struct Bridge {
         std::string tag;
         Names ports;
@@ -52,10 +38,40 @@ public:
         int id;
         friend bool operator==(const LinuxVlan&, const LinuxVlan&) = default;
     };
+    /** What was there before something was taken apart, and what was left then. */
+    struct Memory {
+        int mode;
+        Files before;
+        Files left;
+    };
 
+    Names cards;
     std::map<std::string, Bridge> bridges;
     std::map<std::string, LinuxBond> linuxBonds;
     std::map<std::string, LinuxVlan> linuxVlans;
+    std::map<std::string, Memory> memories;
+};
+
+class SimulatedHost : public SimulatedState {
+public:
+    explicit SimulatedHost(harness::RecordingPlatform& platform);
+    /** A host as another one was. */
+    SimulatedHost(harness::RecordingPlatform& platform, const SimulatedState& state);
+
+    /** Adds an interface; the rest of its file stands in `text`, one key a line. */
+    void AddPort(const std::string& name, const std::string& text);
+    void AddBond(const std::string& name, int mode, const std::vector<std::string>& slaves,
+                 const std::string& text);
+    void AddVlan(const std::string& parent, int id, const std::string& text);
+
+    /**
+     * From now on bonds and VLANs may come back otherwise than they went, or for the first time:
+     * without this the test fails unless everything is as it was left.
+     */
+    void AllowChanges() { m_allowsChanges = true; }
+
+    /** Becomes a host as another one is. */
+    void Become(const SimulatedState& state);
 
 private:
     std::optional<int> React(const std::string& call);
@@ -72,14 +88,6 @@ private:
 
     harness::RecordingPlatform& m_platform;
     bool m_allowsChanges = false;
-    Names m_ports;
-    /** What was there before something was taken apart, and what was left then. */
-    struct Memory {
-        int mode;
-        Files before;
-        Files left;
-    };
-    std::map<std::string, Memory> m_memories;
 };
 
 } // namespace unit

@@ -1,13 +1,19 @@
 #include "support/filecalls.h"
 
+#include "recordingplatform/recordingplatform.h"
+
 #include <gtest/gtest.h>
 
 #include <array>
 #include <cerrno>
+#include <cstdarg>
 #include <map>
+#include <utility>
 
 #include <dlfcn.h>
+#include <fcntl.h>
 #include <linux/capability.h>
+#include <sys/file.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
 #include <unistd.h>
@@ -22,6 +28,8 @@ struct Failure {
 };
 
 struct State {
+    std::function<int(const std::string&)> before;
+    std::function<void()> after;
     std::map<std::string, Failure> failures;
     std::vector<std::string> calls;
     bool singleBytes = false;
@@ -29,11 +37,22 @@ struct State {
 
 State* g_state = nullptr;
 
+/** Notes a call for List(). */
+template <typename Text>
+void Note(const Text& text)
+{
+    if (g_state != nullptr) {
+        const harness::HarnessAllocations guard;
+        g_state->calls.push_back(text());
+    }
+}
+
 bool Fails(const char* function)
 {
     if (g_state == nullptr) {
         return false;
     }
+    const harness::HarnessAllocations guard;
     const auto found = g_state->failures.find(function);
     if (found == g_state->failures.end()) {
         return false;
@@ -52,12 +71,69 @@ std::string BaseName(const std::string& path)
     return path.substr(path.rfind('/') + 1);
 }
 
-std::string NameOfDescriptor(int descriptor)
+std::string PathOfDescriptor(int descriptor)
 {
     const std::string link = "/proc/self/fd/" + std::to_string(descriptor);
     std::array<char, 4096> target{};
     const ssize_t size = readlink(link.c_str(), target.data(), target.size() - 1);
-    return size < 0 ? link : BaseName(target.data());
+    return size < 0 ? link : target.data();
+}
+
+std::string NameOfDescriptor(int descriptor)
+{
+    return BaseName(PathOfDescriptor(descriptor));
+}
+
+/** A call of the library's that is being watched, or one that is not. */
+class Watched {
+public:
+    Watched(const char* function, const std::function<std::string()>& files)
+        : m_watched(g_state != nullptr && g_state->before && !harness::HarnessAllocations::Active())
+    {
+        if (m_watched) {
+            const harness::HarnessAllocations guard;
+            m_error = g_state->before(std::string(function) + " " + files());
+        }
+    }
+    ~Watched()
+    {
+        const harness::HarnessAllocations guard;
+        const int error = errno;
+        if (m_watched && g_state->after) {
+            g_state->after();
+        }
+        errno = error;
+    }
+    Watched(const Watched&) = delete;
+    Watched& operator=(const Watched&) = delete;
+
+    /** Whether it is to fail; errno says with what. */
+    [[nodiscard]] bool Fails() const
+    {
+        if (m_error > 0) {
+            errno = m_error;
+        }
+        return m_error > 0;
+    }
+    [[nodiscard]] bool IsShort() const { return m_error == FileCalls::kShortWrite; }
+
+private:
+    bool m_watched;
+    int m_error = 0;
+};
+
+const char* WayOfOpening(int flags)
+{
+    if ((flags & O_TRUNC) != 0) {
+        return "open-empty";
+    }
+    if ((flags & O_CREAT) != 0) {
+        return "open-new";
+    }
+    if ((flags & O_DIRECTORY) == O_DIRECTORY) {
+        return "open-folder";
+    }
+    return (flags & O_ACCMODE) == O_RDONLY ? "open-read" : "open-write";
 }
 
 template <typename Function>
@@ -101,6 +177,13 @@ void FileCalls::WriteSingleBytes()
     g_state->singleBytes = true;
 }
 
+void FileCalls::Watch(std::function<int(const std::string& call)> before,
+                      std::function<void()> after)
+{
+    g_state->before = std::move(before);
+    g_state->after = std::move(after);
+}
+
 const std::vector<std::string>& FileCalls::List() const
 {
     return g_state->calls;
@@ -118,61 +201,117 @@ ScopedWithoutOverride::~ScopedWithoutOverride()
 
 } // namespace unit
 
+namespace {
+
+/** The C library's own function. */
+template <typename Function>
+Function Next(const char* name)
+{
+    return unit::Next<Function>(name);
+}
+
+} // namespace
+
 extern "C" {
+
+// NOLINTNEXTLINE(cert-dcl50-cpp): declared so by the C library
+int open(const char* path, int flags, ...)
+{
+    va_list arguments;
+    va_start(arguments, flags);
+    const mode_t mode = (flags & O_CREAT) != 0 ? va_arg(arguments, mode_t) : 0;
+    va_end(arguments);
+    const unit::Watched watched(unit::WayOfOpening(flags), [&] { return path; });
+    return watched.Fails() ? -1 : Next<int (*)(const char*, int, ...)>("open")(path, flags, mode);
+}
+
+int mkdir(const char* path, mode_t mode) noexcept
+{
+    const unit::Watched watched("mkdir", [&] { return path; });
+    return watched.Fails() ? -1 : Next<int (*)(const char*, mode_t)>("mkdir")(path, mode);
+}
+
+int ftruncate(int descriptor, off_t size) noexcept
+{
+    const unit::Watched watched("ftruncate", [&] { return unit::PathOfDescriptor(descriptor); });
+    return watched.Fails() ? -1 : Next<int (*)(int, off_t)>("ftruncate")(descriptor, size);
+}
+
+int flock(int descriptor, int operation) noexcept
+{
+    const unit::Watched watched("flock", [&] { return unit::PathOfDescriptor(descriptor); });
+    return watched.Fails() ? -1 : Next<int (*)(int, int)>("flock")(descriptor, operation);
+}
+
+int fstat(int descriptor, struct stat* status) noexcept
+{
+    const unit::Watched watched("fstat", [&] { return unit::PathOfDescriptor(descriptor); });
+    return watched.Fails() ? -1 : Next<int (*)(int, struct stat*)>("fstat")(descriptor, status);
+}
+
+int lstat(const char* path, struct stat* status) noexcept
+{
+    const unit::Watched watched("lstat", [&] { return path; });
+    return watched.Fails() ? -1 : Next<int (*)(const char*, struct stat*)>("lstat")(path, status);
+}
 
 int fsync(int descriptor)
 {
-    if (unit::g_state != nullptr) {
-        unit::g_state->calls.push_back("fsync " + unit::NameOfDescriptor(descriptor));
-    }
-    return unit::Fails("fsync") ? -1 : unit::Next<int (*)(int)>("fsync")(descriptor);
+    const unit::Watched watched("fsync", [&] { return unit::PathOfDescriptor(descriptor); });
+    unit::Note([&] { return "fsync " + unit::NameOfDescriptor(descriptor); });
+    return watched.Fails() || unit::Fails("fsync") ? -1 : Next<int (*)(int)>("fsync")(descriptor);
 }
 
 int rename(const char* from, const char* to) noexcept
 {
-    if (unit::g_state != nullptr) {
-        unit::g_state->calls.push_back("rename " + unit::BaseName(from) + " " + unit::BaseName(to));
-    }
-    return unit::Fails("rename")
+    const unit::Watched watched("rename", [&] { return std::string(from) + " " + to; });
+    unit::Note([&] { return "rename " + unit::BaseName(from) + " " + unit::BaseName(to); });
+    return watched.Fails() || unit::Fails("rename")
                ? -1
-               : unit::Next<int (*)(const char*, const char*)>("rename")(from, to);
+               : Next<int (*)(const char*, const char*)>("rename")(from, to);
 }
 
 int unlink(const char* path) noexcept
 {
-    if (unit::g_state != nullptr) {
-        unit::g_state->calls.push_back("unlink " + unit::BaseName(path));
-    }
-    return unit::Fails("unlink") ? -1 : unit::Next<int (*)(const char*)>("unlink")(path);
+    const unit::Watched watched("unlink", [&] { return path; });
+    unit::Note([&] { return "unlink " + unit::BaseName(path); });
+    return watched.Fails() || unit::Fails("unlink") ? -1
+                                                    : Next<int (*)(const char*)>("unlink")(path);
 }
 
 int fchown(int descriptor, uid_t user, gid_t group) noexcept
 {
-    return unit::Fails("fchown")
+    const unit::Watched watched("fchown", [&] { return unit::PathOfDescriptor(descriptor); });
+    return watched.Fails() || unit::Fails("fchown")
                ? -1
-               : unit::Next<int (*)(int, uid_t, gid_t)>("fchown")(descriptor, user, group);
+               : Next<int (*)(int, uid_t, gid_t)>("fchown")(descriptor, user, group);
 }
 
 int fchmod(int descriptor, mode_t mode) noexcept
 {
-    return unit::Fails("fchmod") ? -1
-                                 : unit::Next<int (*)(int, mode_t)>("fchmod")(descriptor, mode);
+    const unit::Watched watched("fchmod", [&] { return unit::PathOfDescriptor(descriptor); });
+    return watched.Fails() || unit::Fails("fchmod")
+               ? -1
+               : Next<int (*)(int, mode_t)>("fchmod")(descriptor, mode);
 }
 
 ssize_t read(int descriptor, void* data, size_t size)
 {
-    return unit::Fails("read")
+    const unit::Watched watched("read", [&] { return unit::PathOfDescriptor(descriptor); });
+    return watched.Fails() || unit::Fails("read")
                ? -1
-               : unit::Next<ssize_t (*)(int, void*, size_t)>("read")(descriptor, data, size);
+               : Next<ssize_t (*)(int, void*, size_t)>("read")(descriptor, data, size);
 }
 
 ssize_t write(int descriptor, const void* data, size_t size)
 {
-    if (unit::Fails("write")) {
+    const unit::Watched watched("write", [&] { return unit::PathOfDescriptor(descriptor); });
+    if (watched.Fails() || unit::Fails("write")) {
         return -1;
     }
-    const bool single = unit::g_state != nullptr && unit::g_state->singleBytes && size > 1;
-    return unit::Next<ssize_t (*)(int, const void*, size_t)>("write")(descriptor, data,
-                                                                      single ? 1 : size);
+    const bool single =
+        watched.IsShort() || (unit::g_state != nullptr && unit::g_state->singleBytes);
+    return Next<ssize_t (*)(int, const void*, size_t)>("write")(descriptor, data,
+                                                                single && size > 1 ? 1 : size);
 }
 }

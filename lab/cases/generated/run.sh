@@ -1,6 +1,6 @@
 # shellcheck shell=bash disable=SC2154,SC2034 # variables of the guest's other files
 
-rounds="$(sampled 3 12)"
+rounds="$(sampled 2 12)"
 seed=20260101
 # The partner of an aggregate takes its time to agree.
 limit=15000

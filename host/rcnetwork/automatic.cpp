@@ -81,12 +81,14 @@ bool StartLocked(const Request& request)
 
 } // namespace
 
+bool ConfigurationIsLocked()
+{
+    return !TakeRunLock(kConfigurationLock, LockDeadlineIn(0)) && errno == EWOULDBLOCK;
+}
+
 bool ConversionRuns()
 {
-    if (IsHeld()) {
-        return true;
-    }
-    return !TakeRunLock(kConfigurationLock, LockDeadlineIn(0)) && errno == EWOULDBLOCK;
+    return IsHeld() || ConfigurationIsLocked();
 }
 
 std::set<std::string> NeededInterfaces(const std::map<std::string, InterfaceFile>& files)

@@ -14,6 +14,9 @@ namespace vornhost {
 /** The verb of the unit that udev has started for an interface. */
 constexpr char kAppearedVerb[] = "appeared";
 
+/** @return  whether a client holds the lock under which the library changes things. */
+bool ConfigurationIsLocked();
+
 /** @return  whether somebody edits the files: what they say now need not be what is meant. */
 bool ConversionRuns();
 

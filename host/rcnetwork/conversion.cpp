@@ -110,6 +110,17 @@ bool MindConversion(ConversionStage stage)
     return Check(SaveHandover(back ? HandoverOf(*inputs) : Handover{}), kHandoverPath) && recorded;
 }
 
+void SettleConversion(const Inputs& inputs)
+{
+    if (IsPartOfConversion() || ConfigurationIsLocked()) {
+        return;
+    }
+    const auto former = ConversionRecord::Load();
+    if (former && !former->Empty()) {
+        (void)Check(MindRecord(inputs, ConversionStage::kDone), kConversionPath);
+    }
+}
+
 ConversionRecord RecordAt(ConversionStage stage, ConversionRecord now,
                           const ConversionRecord& former)
 {

@@ -30,6 +30,12 @@ std::optional<ConversionStage> FindStage(const std::string& name);
  */
 bool MindConversion(ConversionStage stage);
 
+/**
+ * Leaves in the record of a conversion that was cut short only what the host has lost. Does nothing
+ * while a conversion is under way.
+ */
+void SettleConversion(const Inputs& inputs);
+
 /** @return  the bonds and VLANs that the host has now, on the switch or off it. */
 ConversionRecord BondsAndVlansOf(const Inputs& inputs);
 

@@ -1,6 +1,7 @@
 #include "reconcile.h"
 
 #include "apply.h"
+#include "conversion.h"
 #include "decision.h"
 #include "inputs.h"
 #include "retry.h"
@@ -172,6 +173,7 @@ bool Reconciler::Attempt()
     if (plan.Empty()) {
         Save(inputs->runState, plan.recordAfter);
         SettleHandover(*inputs);
+        SettleConversion(*inputs);
         return true;
     }
     Save(inputs->runState, plan.recordBefore);
@@ -228,6 +230,7 @@ bool Reconciler::ReportRest()
     if (plan.Empty()) {
         Save(inputs->runState, plan.recordAfter);
         SettleHandover(*inputs);
+        SettleConversion(*inputs);
         return true;
     }
     for (const Stage& stage : plan.stages) {

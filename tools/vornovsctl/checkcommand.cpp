@@ -72,6 +72,8 @@ public:
             Repair();
         }
         if (m_found.empty() && m_truths.host.unread.empty()) {
+            // All that it names is there again, and may be taken away from now on.
+            (void)vornhost::ConversionRecord{}.Save();
             return Done(kWhole, Fields());
         }
         return Failed(m_found.empty() ? kDoesNotHold : ExitStatusOf(m_found.front().kind),

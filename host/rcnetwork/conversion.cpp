@@ -7,8 +7,10 @@
 #include "report.h"
 
 #include "support/contains.h"
+#include "support/filestates.h"
 #include "support/interfacename.h"
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <cstring>
@@ -70,6 +72,17 @@ bool MindRecord(const Inputs& inputs, ConversionStage stage)
     return record == former || record.Save();
 }
 
+/** Whether the interface, or the bridge that stands for it, has the addressing of a file. */
+bool HasAddressing(const InterfaceFile& wanted, const std::string& name,
+                   const std::map<std::string, InterfaceFile>& files)
+{
+    return std::any_of(files.begin(), files.end(), [&](const auto& entry) {
+        const InterfaceFile& file = entry.second;
+        return (file.name == name || file.primary == name) && file.addresses == wanted.addresses &&
+               file.client == wanted.client;
+    });
+}
+
 bool Check(bool written, const char* path)
 {
     if (!written) {
@@ -119,6 +132,41 @@ void SettleConversion(const Inputs& inputs)
     if (former && !former->Empty()) {
         (void)Check(MindRecord(inputs, ConversionStage::kDone), kConversionPath);
     }
+}
+
+Handover OwedSinceCut(const std::map<std::string, InterfaceFile>& files)
+{
+    const auto record = ConversionRecord::Load();
+    return record && !record->vlans.empty() ? OwedSince(*record, RememberedVlan::LoadAll(), files)
+                                            : Handover{};
+}
+
+Handover OwedSince(const ConversionRecord& record, const std::vector<RememberedVlan>& remembered,
+                   const std::map<std::string, InterfaceFile>& files)
+{
+    Handover owed;
+    for (const FileVlan& vlan : record.vlans) {
+        std::vector<std::string> carriers{vlan.parent};
+        const auto bond = record.bonds.find(vlan.parent);
+        if (bond != record.bonds.end() && !bond->second.slaves.empty()) {
+            carriers.push_back(bond->second.slaves.front());
+        }
+        const auto memory =
+            std::find_if(remembered.begin(), remembered.end(), [&](const RememberedVlan& each) {
+                return each.parent == vlan.parent && each.id == static_cast<int>(vlan.id);
+            });
+        for (const std::string& name : carriers) {
+            // Who has given the interface another addressing meanwhile means it as it stands.
+            if (memory == remembered.end() ||
+                HasAddressing(ParseInterfaceFile(memory->name,
+                                                 FileOf(memory->state.before, memory->name).Text())
+                                  .file,
+                              name, files)) {
+                owed.tags[name] = vlan.id;
+            }
+        }
+    }
+    return owed;
 }
 
 ConversionRecord RecordAt(ConversionStage stage, ConversionRecord now,

@@ -7,9 +7,12 @@
 #include "plan.h"
 
 #include "support/conversionrecord.h"
+#include "support/remembered.h"
 
+#include <map>
 #include <optional>
 #include <string>
+#include <vector>
 
 namespace vornhost {
 
@@ -35,6 +38,17 @@ bool MindConversion(ConversionStage stage);
  * while a conversion is under way.
  */
 void SettleConversion(const Inputs& inputs);
+
+/**
+ * What a conversion that was cut short, by a loss of power for example, still owes: the VLANs whose
+ * addressing their parents have, or the first members of bonds that were taken apart. Without them
+ * the addresses would be asked for on the wrong network.
+ */
+Handover OwedSinceCut(const std::map<std::string, InterfaceFile>& files);
+
+/** The same by what was written down and what is remembered of the VLANs. */
+Handover OwedSince(const ConversionRecord& record, const std::vector<RememberedVlan>& remembered,
+                   const std::map<std::string, InterfaceFile>& files);
 
 /** @return  the bonds and VLANs that the host has now, on the switch or off it. */
 ConversionRecord BondsAndVlansOf(const Inputs& inputs);

@@ -1,6 +1,7 @@
 #include "inputs.h"
 
 #include "clientcontrol.h"
+#include "conversion.h"
 #include "kinship.h"
 
 #include "support/keyvaluefile.h"
@@ -195,6 +196,9 @@ std::optional<Inputs> ReadInputs(const Request& request, std::vector<Remark>& re
     ReadSwitchState(inputs, remarks);
     ReadRunState(inputs);
     inputs.handover = LoadHandover();
+    if (inputs.handover.Empty()) {
+        inputs.handover = OwedSinceCut(inputs.files);
+    }
     inputs.clients = ReadClients();
     auto live = ReadLiveState();
     if (!live) {

@@ -67,5 +67,41 @@ TEST(Conversion, LeavesAtItsEndOnlyWhatTheHostHasLost)
     EXPECT_TRUE(RecordAt(ConversionStage::kDone, kBond, {}).Empty()) << "made meanwhile";
 }
 
+std::map<std::string, InterfaceFile> FilesOf(const std::map<std::string, std::string>& texts)
+{
+    std::map<std::string, InterfaceFile> files;
+    for (const auto& [name, text] : texts) {
+        files[name] = ParseInterfaceFile(name, text).file;
+    }
+    return files;
+}
+
+constexpr char kAddressing[] = "IPADDR=192.0.2.5\nPREFIX=24\n";
+
+TEST(Conversion, ThatWasCutShortOwesTheVlanToWhatHasItsAddressing)
+{
+    const ConversionRecord record{{{"bond0", {"802.3ad", {"eth0", "eth1"}}}},
+                                  {{"eth2", 30}, {"bond0", 5}}};
+    RememberedVlan vlan{"eth2.30", "eth2", 30, {}};
+    vlan.state.before["eth2.30"].text = std::string("DEVICE=eth2.30\nVLAN=yes\n") + kAddressing;
+    RememberedVlan onBond{"bond0.5", "bond0", 5, {}};
+    onBond.state.before["bond0.5"].text = "DEVICE=bond0.5\nVLAN=yes\nBOOTPROTO=dhcp\n";
+
+    const auto files = FilesOf({{"eth2", std::string("DEVICE=eth2\n") + kAddressing},
+                                {"eth0", "DEVICE=eth0\nBOOTPROTO=dhcp\n"}});
+    using Tags = std::map<std::string, unsigned>;
+    EXPECT_EQ(OwedSince(record, {vlan, onBond}, files).tags, (Tags{{"eth2", 30}, {"eth0", 5}}));
+    EXPECT_EQ(OwedSince(record, {vlan, onBond},
+                        FilesOf({{"ovs_eth2", std::string("DEVICE=ovs_eth2\nTYPE=OVS\nPRIMARY="
+                                                          "eth2\n") +
+                                                  kAddressing}}))
+                  .tags,
+              (Tags{{"eth2", 30}}));
+    EXPECT_EQ(OwedSince(record, {vlan, onBond}, FilesOf({{"eth2", "DEVICE=eth2\n"}})).tags, Tags{})
+        << "an administrator has given it another addressing";
+    EXPECT_EQ(OwedSince(record, {}, files).tags, (Tags{{"eth2", 30}, {"bond0", 5}, {"eth0", 5}}))
+        << "of a tag that was never a VLAN's interface nothing else is known";
+}
+
 } // namespace
 } // namespace vornhost

@@ -3,6 +3,7 @@
 #include "support/interfacename.h"
 
 #include <CLI/CLI.hpp>
+#include <algorithm>
 #include <charconv>
 #include <vector>
 
@@ -151,6 +152,22 @@ std::string FillRequest(const CommandLine& line, GatewayRequest& request)
     return request.action == GatewayAction::kSet ? FillGateway(line.words, request) : "";
 }
 
+/**
+ * The arguments, the last one first. What follows an action and its family, as the library gives
+ * them, is names, whatever they look like.
+ */
+std::vector<std::string> Reversed(int argc, const char* const argv[])
+{
+    std::vector<std::string> words(argv + std::min(argc, 1), argv + argc);
+    const auto isFamily = [](const std::string& word) { return word == "-4" || word == "-6"; };
+    if (words.size() > 2 && words[0].ends_with("-gateway-info") &&
+        words[0] != "--list-gateway-info" && isFamily(words[1]) && words[2] != "--") {
+        words.insert(words.begin() + 2, "--");
+    }
+    std::reverse(words.begin(), words.end());
+    return words;
+}
+
 } // namespace
 
 ParsedRequest ParseRequest(int argc, const char* const argv[])
@@ -160,7 +177,7 @@ ParsedRequest ParseRequest(int argc, const char* const argv[])
     Describe(app, line);
     ParsedRequest parsed;
     try {
-        app.parse(argc, argv);
+        app.parse(Reversed(argc, argv));
     } catch (const CLI::CallForHelp&) {
         parsed.output = app.help();
         return parsed;

@@ -102,9 +102,10 @@ bool ParseCommandLine(int count, char** arguments, CommandLine& line)
 {
     for (int i = 1; i < count; ++i) {
         const std::string argument = arguments[i];
-        if (argument == "--dry-run") {
+        // What follows the verb is names, whatever they look like.
+        if (line.verb.empty() && argument == "--dry-run") {
             line.dryRun = true;
-        } else if (argument == "--boot") {
+        } else if (line.verb.empty() && argument == "--boot") {
             line.boot = true;
         } else if (line.verb.empty() && FindVerb(argument) != nullptr) {
             line.verb = argument;

@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <array>
 #include <cerrno>
+#include <set>
 
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -120,9 +121,10 @@ std::optional<std::string> KeyValueFile::GetWritten(std::string_view key) const
 std::vector<std::string> KeyValueFile::Keys() const
 {
     std::vector<std::string> keys;
+    std::set<std::string_view> seen;
     for (const Line& line : Lines()) {
         const std::string_view key = KeyOf(TextOf(line));
-        if (!key.empty() && std::find(keys.begin(), keys.end(), key) == keys.end()) {
+        if (!key.empty() && seen.insert(key).second) {
             keys.emplace_back(key);
         }
     }

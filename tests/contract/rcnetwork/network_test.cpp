@@ -207,6 +207,15 @@ TEST_F(Host, ASwitchThatDoesNotStartLeavesTheHostReachable)
     EXPECT_EQ(Network(), "eth0 192.0.2.5/24\ndefault via 192.0.2.1 dev eth0 proto static\n");
 }
 
+TEST_F(Host, TakesWhatFollowsTheVerbForNames)
+{
+    for (const char* const name : {"--dry-run", "--boot", "--help", "-", "--", "eth0/..", ""}) {
+        EXPECT_EQ(RcNetwork({"start", name}).exitCode, 2) << name;
+        EXPECT_EQ(RcNetwork({"stop", "lo", name}).exitCode, 2) << name;
+        EXPECT_EQ(RcNetwork({"set-ovs-bond", name}).exitCode, 2) << name;
+    }
+}
+
 TEST_F(Host, WrongUsageIsToldFromFailure)
 {
     for (const auto& arguments : std::vector<std::vector<std::string>>{

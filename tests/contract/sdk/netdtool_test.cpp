@@ -40,6 +40,18 @@ TEST_F(NetdTool, SetsCopiesAndDeletesARecord)
     EXPECT_EQ(ReadFile(kStore), "ovs_eth0 inet 192.0.2.1 metric 100\n");
 }
 
+TEST_F(NetdTool, TakesANameForNothingElse)
+{
+    for (const char* const name : {"--help", "--version", "--json", "-6", "--", "-h", "--bad=1"}) {
+        EXPECT_EQ(Tool({"--del-gateway-info", "-4", name}).exitCode, 2) << name;
+        EXPECT_EQ(Tool({"--copy-gateway-info", "-4", name, "eth0"}).exitCode, 2) << name;
+        EXPECT_EQ(Tool({"--copy-gateway-info", "-4", "eth0", name}).exitCode, 2) << name;
+        EXPECT_EQ(Tool({"--del-gateway-info", "-4", name}).output, "") << name;
+    }
+    EXPECT_EQ(Tool({"--help"}).exitCode, 0);
+    EXPECT_EQ(Tool({"--list-gateway-info", "-4", "--json"}).exitCode, 0);
+}
+
 TEST_F(NetdTool, TouchesOnlyTheFamilyThatIsAskedFor)
 {
     WriteFile(kStore, "eth0 inet 192.0.2.1\neth0 inet6 fe80::1\n");
@@ -108,7 +120,7 @@ TEST_F(NetdTool, RefusesAWrongCommandLine)
     };
     const Row rows[] = {
         {{"--copy-gateway-info", "eth0", "ovs_eth0"}, "-4 or -6 is missing"},
-        {{"--copy-gateway-info", "-4", "-6", "eth0", "ovs_eth0"}, "-4 excludes -6"},
+        {{"-4", "-6", "--copy-gateway-info", "eth0", "ovs_eth0"}, "-4 excludes -6"},
         {{"--copy-gateway-info", "-4", "eth0"}, "too few arguments"},
         {{"--copy-gateway-info", "-4", "eth0", "eth1", "eth2"}, "too many arguments"},
         {{"--copy-gateway-info", "-4", "eth0", ""}, "'' is no interface name"},
@@ -119,7 +131,7 @@ TEST_F(NetdTool, RefusesAWrongCommandLine)
         {{"--set-gateway-info", "-4", "eth0", "fe80::1"},
          "'fe80::1' is no gateway address of that family"},
         {{"--set-gateway-info", "-4", "eth0", "192.0.2.1", "many"}, "'many' is no route metric"},
-        {{"--del-gateway-info", "-4", "--json", "eth0"}, "--json is for listing"},
+        {{"--json", "--del-gateway-info", "-4", "eth0"}, "--json is for listing"},
         {{"--list-gateway-info", "eth0"}, "too many arguments"},
     };
     for (const Row& row : rows) {

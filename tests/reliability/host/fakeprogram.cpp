@@ -4,7 +4,7 @@
  *
  *   exit N    ends with that status, after "saying" what follows the number, if anything does
  *   kill N    ends by that signal
- *   hang      ends only when it is ended
+ *   hang      ends by the limit that the environment sets for the switch's tool, or never
  *   print N   prints N letters and ends with 0
  *
  * Without such a file it is a switch's tool whose bridges are those that have configuration files,
@@ -59,8 +59,12 @@ int Act(const char* verb, const char* value)
     if (std::strcmp(verb, "kill") == 0) {
         (void)::kill(::getpid(), static_cast<int>(number));
     }
-    while (std::strcmp(verb, "hang") == 0) {
-        ::pause();
+    if (std::strcmp(verb, "hang") == 0) {
+        const char* const limit = std::getenv("OVS_CTL_TIMEOUT");
+        (void)::alarm(limit == nullptr ? 0 : static_cast<unsigned>(std::atoi(limit)));
+        for (;;) {
+            ::pause();
+        }
     }
     if (std::strcmp(verb, "print") == 0) {
         Print(number);

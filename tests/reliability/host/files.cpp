@@ -15,12 +15,17 @@ namespace {
 
 namespace fs = std::filesystem;
 
+/** What is no text that the library writes is told by its time. */
+constexpr off_t kMuch = 8192;
+
 std::string Describe(const std::string& path, const struct stat& status)
 {
     std::ostringstream text;
     text << std::oct << status.st_mode << " owner " << std::dec << status.st_uid << " ";
     if (S_ISLNK(status.st_mode)) {
         text << "to " << fs::read_symlink(path).string();
+    } else if (S_ISREG(status.st_mode) && status.st_size > kMuch) {
+        text << "bytes " << status.st_size << " of " << status.st_mtim.tv_nsec;
     } else if (S_ISREG(status.st_mode)) {
         text << "text " << ReadFile(path);
     }

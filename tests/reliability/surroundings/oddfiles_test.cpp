@@ -110,10 +110,10 @@ const std::vector<std::pair<const char*, std::string>>& OddTexts()
         {"NUL bytes", std::string("FIRST=1\nNUL=a\0b\n\0\n", 18)},
         {"the same key again", "FIRST=1\nFIRST=2\nFIRST=3\n"},
         {"a megabyte in one line", "LONG=" + std::string(1 << 20, 'x') + "\nFIRST=1\n"},
-        {"a hundred thousand lines",
+        {"two thousand lines",
          [] {
              std::string text;
-             for (int line = 0; line < 100000; ++line) {
+             for (int line = 0; line < 2000; ++line) {
                  text += "KEY" + std::to_string(line) + "=1\n";
              }
              return text;

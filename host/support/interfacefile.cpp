@@ -30,7 +30,8 @@ bool IsFileOf(const KeyValueFile& file, const std::string& interface)
 
 std::string InterfaceParser::Value(const std::string& key) const
 {
-    std::string value = Trimmed(m_values.Get(key).value_or(""));
+    const auto found = m_values.find(key);
+    std::string value = found == m_values.end() ? std::string() : Trimmed(found->second);
     if (value.size() >= 2 && value.front() == value.back() &&
         (value.front() == '"' || value.front() == '\'')) {
         value = Trimmed(value.substr(1, value.size() - 2));
@@ -83,14 +84,14 @@ std::optional<unsigned> InterfaceParser::Number(const std::string& key, unsigned
 
 bool InterfaceParser::IsOwnFile()
 {
-    if (m_values.Text().find('=') == std::string::npos) {
+    if (m_file.Text().find('=') == std::string::npos) {
         Leave("ignored, because it is empty");
         return false;
     }
     const std::string device = Value("DEVICE");
     if (!device.empty() && device != m_parsed.file.name) {
         Leave("ignored, because its DEVICE is " + device);
-        m_parsed.file.fromBridge = IsFileOf(m_values, m_parsed.file.name);
+        m_parsed.file.fromBridge = IsFileOf(m_file, m_parsed.file.name);
         return m_parsed.file.fromBridge;
     }
     return true;

@@ -6,6 +6,7 @@
 
 #include "interfacefile.h"
 
+#include <map>
 #include <optional>
 #include <string>
 
@@ -17,7 +18,7 @@ constexpr char kInterfaceFilePrefix[] = "ifcfg-";
 class InterfaceParser {
 public:
     InterfaceParser(const std::string& name, const std::string& text)
-        : m_values(KeyValueFile::Parse(text))
+        : m_file(KeyValueFile::Parse(text)), m_values(m_file.Values())
     {
         m_parsed.file.name = name;
         // A file without its last line break may be one that is being written.
@@ -59,7 +60,8 @@ private:
     void ReadResolver();
     void ReadRoutes();
 
-    KeyValueFile m_values;
+    KeyValueFile m_file;
+    std::map<std::string, std::string> m_values; // read once: hundreds of keys are asked for
     ParsedFile m_parsed;
 };
 

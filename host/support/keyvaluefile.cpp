@@ -131,6 +131,18 @@ std::vector<std::string> KeyValueFile::Keys() const
     return keys;
 }
 
+std::map<std::string, std::string> KeyValueFile::Values() const
+{
+    std::map<std::string, std::string> values;
+    for (const Line& line : Lines()) {
+        const std::string_view text = Content(TextOf(line));
+        if (const std::string_view key = KeyOf(text); !key.empty()) {
+            values[std::string(key)] = WithoutQuotes(text.substr(text.find('=') + 1));
+        }
+    }
+    return values;
+}
+
 bool KeyValueFile::Set(std::string_view key, std::string_view value)
 {
     if (!IsKey(key) || !IsValue(value)) {

@@ -10,6 +10,7 @@
 #ifndef VORNHOST_SUPPORT_KEYVALUEFILE_H
 #define VORNHOST_SUPPORT_KEYVALUEFILE_H
 
+#include <map>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -32,6 +33,9 @@ public:
 
     /** @return every key once, in the file's order. */
     std::vector<std::string> Keys() const;
+
+    /** @return  every key's value, as Get() answers it. */
+    std::map<std::string, std::string> Values() const;
 
     /**
      * Makes a key present exactly once: its first line is replaced, where the administrator put it

@@ -45,7 +45,7 @@ struct Error {
     Error& operator=(const Error&) = delete;
     ~Error() { sd_bus_error_free(&value); }
 
-    sd_bus_error value = SD_BUS_ERROR_NULL;
+    sd_bus_error value{nullptr, nullptr, 0};
 };
 
 /** Results of jobs that ended, by the job's path. */

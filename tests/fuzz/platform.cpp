@@ -142,11 +142,6 @@ int VLIBNetOVSIfIsMaster(const char* /*name*/)
     return 1;
 }
 
-int VORNNetLinkAggrGet(const char* /*name*/, VORNLINKAGGROPT* /*opt*/)
-{
-    return -1;
-}
-
 int VORNNetBondIPConflict(const char* /*bond*/, char* /*conflict*/, int /*size*/,
                           unsigned int* /*out*/)
 {

@@ -203,20 +203,17 @@ Request ReadRequest(const Json& json)
     return request;
 }
 
-void ReadFiles(const std::string& folder, World& world)
+/** The texts of a folder's configuration files, by interface. */
+std::map<std::string, std::string> ReadTexts(const std::string& folder)
 {
-    std::set<std::filesystem::path> paths;
+    std::map<std::string, std::string> texts;
     for (const auto& entry : std::filesystem::directory_iterator(folder)) {
-        paths.insert(entry.path());
-    }
-    for (const auto& path : paths) {
-        const std::string name = InterfaceOfFileName(path.filename());
+        const std::string name = InterfaceOfFileName(entry.path().filename());
         if (!name.empty()) {
-            ParsedFile parsed = ParseInterfaceFile(name, ReadText(path));
-            world.remarks.insert(world.remarks.end(), parsed.remarks.begin(), parsed.remarks.end());
-            world.inputs.files[name] = parsed.file;
+            texts[name] = ReadText(entry.path());
         }
     }
+    return texts;
 }
 
 const char* Word(Severity severity)
@@ -247,9 +244,17 @@ std::string ReadText(const std::string& path)
 
 World ReadWorld(const std::string& folder)
 {
+    return ReadWorld(Json::parse(ReadText(folder + "/world.json")), ReadTexts(folder));
+}
+
+World ReadWorld(const nlohmann::json& json, const std::map<std::string, std::string>& files)
+{
     World world;
-    const Json json = Json::parse(ReadText(folder + "/world.json"));
-    ReadFiles(folder, world);
+    for (const auto& [name, text] : files) {
+        ParsedFile parsed = ParseInterfaceFile(name, text);
+        world.remarks.insert(world.remarks.end(), parsed.remarks.begin(), parsed.remarks.end());
+        world.inputs.files[name] = parsed.file;
+    }
     world.inputs.request = ReadRequest(json.value("request", Json::object()));
     world.inputs.live = ReadLive(json);
     world.inputs.switchState = ReadSwitch(json.value("switch", Json{{"running", false}}));

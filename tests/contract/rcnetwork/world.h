@@ -7,8 +7,11 @@
 
 #include "rcnetwork/plan.h"
 
+#include <map>
 #include <string>
 #include <vector>
+
+#include <nlohmann/json_fwd.hpp>
 
 namespace contract {
 
@@ -19,6 +22,9 @@ struct World {
 
 /** Reads such a folder; throws what goes wrong. */
 World ReadWorld(const std::string& folder);
+
+/** The same of what "world.json" says and of the texts of the files by interface. */
+World ReadWorld(const nlohmann::json& json, const std::map<std::string, std::string>& files);
 
 /** The plan as "rc.network --dry-run" prints it, and below it what is said. */
 std::string Describe(const vornhost::Plan& plan, const std::vector<vornhost::Remark>& remarks);

@@ -64,7 +64,6 @@ std::string WithoutQuotes(const std::string& value)
 void CheckReading(const KeyValueFile& file)
 {
     std::vector<std::string> keys;
-    std::string lastValue;
     for (const std::string& line : LinesOf(file.Text())) {
         const std::string key = KeyOf(line);
         if (!key.empty() && std::find(keys.begin(), keys.end(), key) == keys.end()) {
@@ -72,8 +71,10 @@ void CheckReading(const KeyValueFile& file)
         }
     }
     Expect(file.Keys() == keys, "the keys are others than those of the lines");
+    const auto values = file.Values();
+    Expect(values.size() == keys.size(), "there are more values than keys, or fewer");
     for (const std::string& key : keys) {
-        Expect(file.Get(key).has_value(), "a key that is there has no value");
+        Expect(file.Get(key) == values.at(key), "a key has two values");
     }
 }
 

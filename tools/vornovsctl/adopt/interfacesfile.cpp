@@ -4,6 +4,7 @@
 #include <array>
 #include <sstream>
 #include <string_view>
+#include <support/contains.h>
 #include <support/interfacevalues.h>
 
 namespace vornovsctl {
@@ -12,7 +13,6 @@ namespace {
 
 constexpr std::string_view kAside = "#adopted# ";     // a line that comes back as it was
 constexpr std::string_view kReplaced = "#replaced# "; // one after which its replacement stands
-constexpr int kDeepestInclusion = 16;
 
 /** A line with those that continue it. */
 struct LogicalLine {
@@ -24,7 +24,7 @@ struct LogicalLine {
 
 std::string Stripped(std::string_view text)
 {
-    constexpr std::string_view kBlanks = " \t\r\n";
+    constexpr std::string_view kBlanks = " \t\r\n\v\f";
     const std::size_t first = text.find_first_not_of(kBlanks);
     if (first == std::string_view::npos) {
         return "";
@@ -82,7 +82,7 @@ public:
 
     InterfacesConfig Take(const std::string& path)
     {
-        ReadFile(path, 0);
+        ReadFile(path);
         for (std::size_t index = 0; index < m_config.stanzas.size(); ++index) {
             Inherit(index);
         }
@@ -90,21 +90,22 @@ public:
     }
 
 private:
-    void ReadFile(const std::string& path, int depth)
+    void ReadFile(const std::string& path)
     {
-        if (depth > kDeepestInclusion) {
+        // Files may include each other, and each of them several times.
+        if (vornhost::Contains(m_config.paths, path)) {
             return;
         }
         m_config.paths.push_back(path);
         m_inInterface = false;
         for (const LogicalLine& line : LogicalLinesOf(m_readText(path))) {
             if (!line.IsEmpty()) {
-                ReadLine(path, line.text, depth);
+                ReadLine(path, line.text);
             }
         }
     }
 
-    void ReadLine(const std::string& path, const std::string& text, int depth)
+    void ReadLine(const std::string& path, const std::string& text)
     {
         std::vector<std::string> words = vornhost::Words(text);
         const std::string keyword = words.front();
@@ -122,7 +123,7 @@ private:
         } else if (keyword == "mapping") {
             m_config.mapped.insert(words.begin(), words.end());
         } else if (keyword.starts_with("source")) {
-            Include(path, keyword, words, depth);
+            Include(path, keyword, words);
         } else if (IsClassWord(keyword)) {
             const std::string name = keyword == "auto" ? keyword : keyword.substr(6);
             for (const std::string& word : words) {
@@ -170,7 +171,7 @@ private:
     }
 
     void Include(const std::string& path, const std::string& keyword,
-                 const std::vector<std::string>& patterns, int depth)
+                 const std::vector<std::string>& patterns)
     {
         for (std::string pattern : patterns) {
             if (!pattern.starts_with('/')) {
@@ -185,7 +186,7 @@ private:
                     name.find_first_not_of("abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ"
                                            "0123456789_-") == std::string::npos;
                 if (counts) {
-                    ReadFile(found, depth + 1);
+                    ReadFile(found);
                 }
             }
         }
@@ -233,8 +234,9 @@ std::string NamesWithout(const LogicalLine& line, const std::set<std::string>& n
     std::string original = line.raw;
     const bool ends = original.ends_with('\n');
     if (std::count(original.begin(), original.end(), '\n') > 1 || !ends) {
+        // The last line of a file may have no end, and then its replacement has none either.
         return EachLineAside(original) + (ends ? "" : "\n") + std::string(kReplaced) + "\n" + rest +
-               '\n';
+               (ends ? "\n" : "");
     }
     return std::string(kReplaced) + original + rest + '\n';
 }
@@ -295,6 +297,9 @@ std::string WithInterfacesAgain(const std::string& text)
         begin = end;
         if (replacement) {
             replacement = false;
+            if (!line.ends_with('\n') && result.ends_with('\n')) {
+                result.pop_back();
+            }
         } else if (line.starts_with(kAside)) {
             result += line.substr(kAside.size());
         } else if (line.starts_with(kReplaced)) {

@@ -64,6 +64,21 @@ TEST(InterfacesFile, IsReadWithItsContinuedLinesAndSources)
     EXPECT_FALSE(config.IsBroughtUp("eth2"));
 }
 
+TEST(InterfacesFile, ReadsFilesThatIncludeEachOtherOnce)
+{
+    RecordedHost host;
+    host.Write("/etc/network/interfaces", "source interfaces.d/*\nsource interfaces.d/*\n"
+                                          "source interfaces\niface eth0 inet dhcp\n");
+    host.Write("/etc/network/interfaces.d/more", "source ../interfaces.d/*\nsource more\n"
+                                                 "source /etc/network/interfaces\n");
+
+    const InterfacesConfig config = vornovsctl::ReadInterfaces(host.view);
+
+    EXPECT_EQ(config.stanzas.size(), 1U);
+    EXPECT_THAT(config.paths,
+                ElementsAre("/etc/network/interfaces", "/etc/network/interfaces.d/more"));
+}
+
 TEST(InterfacesFile, InheritsTheOptionsOfTemplates)
 {
     RecordedHost host;
@@ -93,7 +108,16 @@ TEST(WithoutInterfaces, CommentsOutWhatIsSaidOfThem)
                                                   "iface eth1 inet dhcp\n"
                                                   "#adopted# allow-hotplug eth1 eth0\n"
                                                   "#replaced# \n"
-                                                  "allow-hotplug eth1\n");
+                                                  "allow-hotplug eth1");
+}
+
+TEST(InterfacesFile, MayHoldLinesOfBlanksOfAnyKind)
+{
+    RecordedHost host;
+    host.Write("/etc/network/interfaces", "\f\niface eth0 inet dhcp\n \v\n");
+
+    EXPECT_EQ(vornovsctl::ReadInterfaces(host.view).stanzas.size(), 1U);
+    EXPECT_EQ(WithoutInterfaces("\f\n", {"eth0"}), "\f\n");
 }
 
 TEST(WithoutInterfaces, ChangesNothingForOthers)
@@ -104,10 +128,11 @@ TEST(WithoutInterfaces, ChangesNothingForOthers)
 
 TEST(WithInterfacesAgain, BringsBackWhatWasThereByteForByte)
 {
-    const std::string text = std::string(kText) + '\n';
-    for (const std::set<std::string>& names :
-         {std::set<std::string>{"eth0"}, {"eth1"}, {"eth0", "eth1"}, {"lo"}}) {
-        EXPECT_EQ(WithInterfacesAgain(WithoutInterfaces(text, names)), text);
+    for (const std::string& text : {std::string(kText), std::string(kText) + '\n'}) {
+        for (const std::set<std::string>& names :
+             {std::set<std::string>{"eth0"}, {"eth1"}, {"eth0", "eth1"}, {"lo"}}) {
+            EXPECT_EQ(WithInterfacesAgain(WithoutInterfaces(text, names)), text);
+        }
     }
 }
 

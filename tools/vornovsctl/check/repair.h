@@ -1,5 +1,6 @@
 /**
- * What takes a host out of its half states: the network program makes the live network what the
+ * What takes a host out of its half states: a file that was on its way to another name comes back,
+ * the network program makes the live network what the
  * files say, and a whole conversion by the library finishes the files of one that was cut short.
  */
 #ifndef VORNOVSCTL_CHECK_REPAIR_H
@@ -14,13 +15,15 @@ namespace vornovsctl {
 
 struct RepairStep {
     enum class Kind {
+        kRestoreFile,  /**< that of "subject", which only stands under the name in "source" */
         kStartNetwork, /**< the network program takes the files for what is meant */
         kUnregister,   /**< a client, whose name is in "subject" */
         kRegister,     /**< the same */
-        kRemoveFile,   /**< a stray one */
+        kRemoveFile,   /**< a stray one, or a copy that was not edited yet */
     };
     Kind kind;
     std::string subject;
+    std::string source = {};
 
     bool operator==(const RepairStep&) const = default;
 };

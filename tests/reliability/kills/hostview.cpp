@@ -5,6 +5,7 @@
 #include <support/netlink.h>
 #include <support/switchdatabase.h>
 
+#include <algorithm>
 #include <array>
 #include <chrono>
 #include <sstream>

@@ -11,6 +11,8 @@
  * - Failures are reported to the system log as well as through the result.
  * - "The lock" is the configuration lock "/tmp/ovs_config.lock", which serialises all processes
  *   that use the library; a call that takes it waits up to 5 seconds for it.
+ * - Threads of one client may call at once: for the lock they wait for each other as processes do.
+ *   An object of a class, and a variable that a call fills, is one thread's at a time.
  * - Callers need the privilege to configure the network (root).
  */
 #ifndef VORNOVS_VORNOVS_H

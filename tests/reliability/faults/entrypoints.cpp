@@ -187,7 +187,7 @@ std::vector<Scenario> Bonds()
         std::vector<std::string> slaves;
         {
             const harness::HarnessAllocations guard;
-            slaves = {"eth0", "eth1"};
+            slaves = {"eth0", "eth4"};
         }
         return VORN::OVS::OVSBondCreate(VORN_LINK_AGGR_OVS_BALANCE_SLB, "ovs_bond1", slaves);
     };

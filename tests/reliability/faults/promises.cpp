@@ -13,8 +13,8 @@ using testing::AnyOf;
 using testing::Contains;
 using testing::IsEmpty;
 
-const unit::Names kKnown{"client", "other", "eth0",  "eth1",   "eth2",
-                         "eth3",   "eth9",  "bond0", "eth1.10"};
+const unit::Names kKnown{"client", "other", "eth0", "eth1",  "eth2",
+                         "eth3",   "eth4",  "eth9", "bond0", "eth1.10"};
 
 std::vector<std::string> Lines(const std::string& text)
 {

@@ -15,6 +15,7 @@ void Build(unit::SimulatedHost& host)
     host.AddPort("eth0", "BOOTPROTO=static\n" + kSettings[0] + "\n" + kSettings[1] + "\n");
     host.AddPort("eth1", "BOOTPROTO=none\n");
     host.AddVlan("eth1", 10, kSettings[2] + "\n");
+    host.AddPort("eth4", "BOOTPROTO=none\n");
     host.AddBond("bond0", 4, {"eth2", "eth3"}, kSettings[3] + "\n" + kSettings[4] + "\n");
 }
 

@@ -262,7 +262,11 @@ void SimulatedHost::RunNetwork(const std::vector<std::string>& words)
     const Names members = MembersOfBonds();
     for (const std::string& file : ListFolder(kScripts)) {
         const std::string name = file.substr(std::string("ifcfg-").size());
-        if (KeyOf(name, "TYPE") != "OVS" || KeyOf(name, "SLAVE") == "yes" ||
+        const std::string device = KeyOf(name, "DEVICE").value_or("");
+        if (device == "ovs_" + name && !ReadFile(FileOf(device)) && bridges.contains(device)) {
+            live[device] = bridges[device]; // on its way off the switch: it is left as it is
+        }
+        if (KeyOf(name, "TYPE") != "OVS" || device != name || KeyOf(name, "SLAVE") == "yes" ||
             (!KeyOf(name, "SLAVE_LIST") && members.contains(KeyOf(name, "PRIMARY").value_or("")))) {
             continue;
         }

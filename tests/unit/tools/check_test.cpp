@@ -1,7 +1,4 @@
-#include "check/halfstates.h"
-#include "check/repair.h"
-#include "ctl.h"
-#include "show/samplehost.h"
+#include "truths.h"
 
 #include <filesystem>
 #include <fstream>
@@ -12,76 +9,20 @@ namespace {
 
 using testing::ElementsAre;
 using testing::IsEmpty;
+using unit::AddFile;
+using unit::BridgeIn;
+using unit::Check;
 using unit::Ctl;
+using unit::DeviceIn;
 using unit::Host;
+using unit::OnTheSwitch;
 using unit::Outcome;
-using vornhost::KeyValueFile;
-using vornovsctl::FileTruthOf;
+using unit::Plain;
+using unit::RemoveFile;
 using vornovsctl::FindHalfStates;
 using vornovsctl::HalfState;
 using vornovsctl::HostTruths;
 using enum vornovsctl::HalfStateClass;
-
-void AddFile(HostTruths& truths, const std::string& name, const std::string& text)
-{
-    std::erase_if(truths.files, [&](const auto& file) { return file.Name() == name; });
-    truths.files.push_back(FileTruthOf(name, KeyValueFile::Parse(text)));
-}
-
-void RemoveFile(HostTruths& truths, const std::string& name)
-{
-    std::erase_if(truths.files, [&](const auto& file) { return file.Name() == name; });
-}
-
-/** A port with a tag, two bonds, ports of clients. */
-HostTruths OnTheSwitch()
-{
-    HostTruths truths;
-    truths.host = unit::SampleHost();
-    for (const std::string number : {"1", "2", "4", "5"}) {
-        const std::string master = number < "3" ? "ovs_bond0" : "ovs_bond1";
-        AddFile(truths, "eth" + number,
-                "DEVICE=eth" + number + "\nSLAVE=yes\nMASTER=" + master + "\n");
-    }
-    AddFile(truths, "ovs_bond0",
-            "DEVICE=ovs_bond0\nTYPE=OVS\nPRIMARY=bond0\nSLAVE_LIST=\"eth1 eth2\"\n"
-            "IPADDR=192.0.2.10\n");
-    AddFile(truths, "ovs_bond1",
-            "DEVICE=ovs_bond1\nTYPE=OVS\nPRIMARY=bond1\nSLAVE_LIST=\"eth4 eth5\"\n");
-    AddFile(truths, "ovs_eth0", "DEVICE=ovs_eth0\nTYPE=OVS\nPRIMARY=eth0\nOVS_VLAN_ID=10\n");
-    AddFile(truths, "eth0", "DEVICE=eth0\nBRIDGE=ovs_eth0\nOVS_VLAN_ID=10\n");
-    AddFile(truths, "tap0", "DEVICE=tap0\nOVS_VLAN_ID=20\n");
-    return truths;
-}
-
-HostTruths Plain()
-{
-    HostTruths truths;
-    truths.host = unit::PlainHost();
-    truths.host.clients.emplace();
-    AddFile(truths, "eth0", "DEVICE=eth0\nIPADDR=192.0.2.10\n");
-    return truths;
-}
-
-vornovsctl::Bridge& BridgeIn(HostTruths& truths, const std::string& name)
-{
-    for (vornovsctl::Bridge& bridge : *truths.host.bridges) {
-        if (bridge.name == name) {
-            return bridge;
-        }
-    }
-    throw std::out_of_range(name);
-}
-
-vornovsctl::Device& DeviceIn(HostTruths& truths, const std::string& name)
-{
-    for (vornovsctl::Device& device : truths.host.devices) {
-        if (device.name == name) {
-            return device;
-        }
-    }
-    throw std::out_of_range(name);
-}
 
 TEST(HalfStates, AreNoneOnAWholeHost)
 {
@@ -106,6 +47,8 @@ TEST(HalfStates, ABridgesFileWantsItsBridgeUnlessItIsAMembersOrNotForTheBoot)
     AddFile(truths, "ovs_eth7", "DEVICE=ovs_eth7\nTYPE=OVS\nPRIMARY=eth7\n");
     AddFile(truths, "ovs_eth8", "DEVICE=ovs_eth8\nTYPE=OVS\nPRIMARY=eth8\nSLAVE=yes\n");
     AddFile(truths, "ovs_eth9", "DEVICE=ovs_eth9\nTYPE=OVS\nPRIMARY=eth9\nONBOOT=no\n");
+    AddFile(truths, "ovs_bond0",
+            "DEVICE=ovs_bond0\nTYPE=OVS\nPRIMARY=bond0\nSLAVE_LIST=\"eth1 eth2 eth8\"\n");
     EXPECT_THAT(FindHalfStates(truths),
                 ElementsAre(HalfState{kBridgeFileWithoutBridge, "ovs_eth7",
                                       "has a file, and the switch has no such bridge"}));
@@ -114,7 +57,8 @@ TEST(HalfStates, ABridgesFileWantsItsBridgeUnlessItIsAMembersOrNotForTheBoot)
     EXPECT_THAT(FindHalfStates(truths), IsEmpty()) << "a switch that does not answer may have it";
 
     truths.host.switchRuns = false;
-    for (const char* other : {"ovs_bond0", "ovs_bond1", "ovs_eth0"}) {
+    for (const char* other :
+         {"ovs_bond0", "ovs_bond1", "ovs_eth0", "ovs_eth8", "eth1", "eth2", "eth4", "eth5"}) {
         RemoveFile(truths, other);
     }
     EXPECT_THAT(FindHalfStates(truths),
@@ -168,6 +112,50 @@ TEST(HalfStates, ClientsAndSwitchBelongTogether)
                                       "name nobody, and interfaces are on the switch"}));
     truths.host.clients.reset();
     EXPECT_THAT(FindHalfStates(truths), IsEmpty()) << "what cannot be read is not judged";
+}
+
+TEST(HalfStates, NoInterfaceIsLeftPlainWhileOthersAreOnTheSwitch)
+{
+    HostTruths truths = OnTheSwitch();
+    vornovsctl::Device card;
+    for (const char* name : {"eth6", "eth7", "wlan0"}) {
+        card.name = name;
+        truths.host.devices.push_back(card);
+        AddFile(truths, name, "DEVICE=" + card.name + "\n");
+    }
+    truths.host.takenOff->insert("eth7");
+    AddFile(truths, "eth8", "DEVICE=eth8\n"); // there is no such card
+    truths.host.clients = {"apps"};
+    EXPECT_THAT(FindHalfStates(truths),
+                ElementsAre(HalfState{kRegisteredButPlain, "eth6",
+                                      "is not on the switch, and apps are registered"}));
+}
+
+TEST(HalfStates, APlainFileNamesItsBridge)
+{
+    HostTruths truths = OnTheSwitch();
+    AddFile(truths, "eth0", "DEVICE=eth0\n");
+    EXPECT_THAT(FindHalfStates(truths),
+                ElementsAre(HalfState{kUnfinishedFile, "eth0",
+                                      "has a file that does not name its bridge ovs_eth0"}));
+}
+
+TEST(HalfStates, ABondAndItsMembersKnowOfEachOther)
+{
+    HostTruths truths = OnTheSwitch();
+    AddFile(truths, "eth1", "DEVICE=eth1\nBRIDGE=ovs_eth1\n");
+    AddFile(truths, "ovs_eth2", "DEVICE=ovs_eth2\nTYPE=OVS\nPRIMARY=eth2\n");
+    const std::string unaware = "has a file that does not know of its bond";
+    EXPECT_THAT(FindHalfStates(truths),
+                ElementsAre(HalfState{kUnfinishedFile, "eth1", unaware},
+                            HalfState{kUnfinishedFile, "ovs_eth2", unaware}));
+
+    truths = OnTheSwitch();
+    AddFile(truths, "eth0", "DEVICE=eth0\nBRIDGE=ovs_eth0\nSLAVE=yes\nMASTER=ovs_bond7\n");
+    AddFile(truths, "ovs_eth6", "DEVICE=ovs_eth6\nTYPE=OVS\nPRIMARY=eth6\nSLAVE=yes\n");
+    const std::string alone = "has a file of a member of a bond, and no bond's file has it";
+    EXPECT_THAT(FindHalfStates(truths), ElementsAre(HalfState{kUnfinishedFile, "eth0", alone},
+                                                    HalfState{kUnfinishedFile, "ovs_eth6", alone}));
 }
 
 TEST(HalfStates, ABondHasTwoMembers)
@@ -235,17 +223,6 @@ TEST(HalfStates, WhatAConversionTookApartIsSomewhereAgain)
     EXPECT_THAT(FindHalfStates(truths), IsEmpty()) << "they are the switch's";
 }
 
-class Check : public unit::OnAHost {
-protected:
-    Check()
-    {
-        vornhost::Link link;
-        link.index = 1;
-        link.name = "eth0";
-        Host().links = {link};
-    }
-};
-
 TEST_F(Check, FindsNothingOnAWholeHostAndStartsNothing)
 {
     WriteInterfaceFile("eth0", "DEVICE=eth0\nIPADDR=192.0.2.10\n");
@@ -295,194 +272,6 @@ TEST_F(Check, SaysWhatItCouldNotRead)
 {
     Host().clients.reset();
     EXPECT_EQ(Ctl({"check"}), unit::Failed(1, "the registrations cannot be read."));
-}
-
-TEST(PlanRepair, StartsTheNetworkAndConvertsWhatWasCutShort)
-{
-    using Kind = vornovsctl::RepairStep::Kind;
-    const auto plan = [](const HostTruths& truths) {
-        return vornovsctl::PlanRepair(truths, FindHalfStates(truths));
-    };
-    const vornovsctl::RepairStep start{Kind::kStartNetwork, ""};
-    EXPECT_THAT(plan(Plain()), IsEmpty());
-
-    HostTruths truths = OnTheSwitch();
-    RemoveFile(truths, "ovs_eth0");
-    EXPECT_THAT(plan(truths), ElementsAre(start));
-
-    truths.host.clients.emplace();
-    EXPECT_THAT(plan(truths),
-                ElementsAre(start, vornovsctl::RepairStep{Kind::kRegister, "vornovsctl-repair"},
-                            vornovsctl::RepairStep{Kind::kUnregister, "vornovsctl-repair"}));
-    truths.host.clients = {"vornovsctl-repair"};
-    EXPECT_THAT(plan(truths),
-                ElementsAre(start, vornovsctl::RepairStep{Kind::kUnregister, "vornovsctl-repair"}));
-
-    truths = Plain();
-    truths.host.clients = {"apps", "vms"};
-    truths.strays = {"/a"};
-    EXPECT_THAT(plan(truths), ElementsAre(start, vornovsctl::RepairStep{Kind::kUnregister, "apps"},
-                                          vornovsctl::RepairStep{Kind::kUnregister, "vms"},
-                                          vornovsctl::RepairStep{Kind::kRegister, "apps"},
-                                          vornovsctl::RepairStep{Kind::kRegister, "vms"},
-                                          vornovsctl::RepairStep{Kind::kRemoveFile, "/a"}));
-    truths.host.clients.emplace();
-    EXPECT_THAT(plan(truths), ElementsAre(vornovsctl::RepairStep{Kind::kRemoveFile, "/a"}));
-}
-
-TEST(PlanRepair, BuildsWhatWasTakenApartWhileNothingIsOnTheSwitch)
-{
-    using Kind = vornovsctl::RepairStep::Kind;
-    using Step = vornovsctl::RepairStep;
-    const vornhost::ConvertedBond bond{"802.3ad", {"eth1", "eth2"}};
-    HostTruths truths = Plain();
-    truths.converted = {{{"bond7", bond}}, {{"bond7", 5}}};
-    EXPECT_THAT(PlanRepair(truths, FindHalfStates(truths)),
-                ElementsAre(Step{Kind::kStartNetwork, ""}, Step{Kind::kBuildBond, "bond7", bond},
-                            Step{Kind::kMakeVlan, "bond7", {}, 5}));
-
-    truths.host.clients = {"apps", "vornovsctl-repair"};
-    EXPECT_THAT(PlanRepair(truths, FindHalfStates(truths)),
-                ElementsAre(Step{Kind::kStartNetwork, ""},
-                            Step{Kind::kUnregister, "vornovsctl-repair"},
-                            Step{Kind::kUnregister, "apps"}, Step{Kind::kBuildBond, "bond7", bond},
-                            Step{Kind::kMakeVlan, "bond7", {}, 5}, Step{Kind::kRegister, "apps"}));
-}
-
-class Repair : public Check {
-protected:
-    static constexpr char kStray[] = "/etc/sysconfig/network-scripts/.vornovs-a1B2c3";
-
-    /** What the library does, as far as it is seen from here. */
-    static int Convert(unit::FakeHost& host)
-    {
-        const std::string& call = host.calls.back();
-        if (call.starts_with("Register ")) {
-            host.clients->insert(call.substr(9));
-            host.switchRuns = true;
-            host.ports = {{"ovs_eth0", {"eth0", "ovs_eth0"}}};
-            host.wires = {"eth0"};
-            WriteInterfaceFile("ovs_eth0", "DEVICE=ovs_eth0\nTYPE=OVS\nPRIMARY=eth0\n");
-            WriteInterfaceFile("eth0", "DEVICE=eth0\nBRIDGE=ovs_eth0\n");
-        } else if (call.starts_with("UnRegister ")) {
-            host.clients->erase(call.substr(11));
-            host.ports->clear();
-            std::filesystem::remove("/etc/sysconfig/network-scripts/ifcfg-ovs_eth0");
-            WriteInterfaceFile("eth0", "DEVICE=eth0\n");
-        }
-        return 0;
-    }
-
-    static void LeaveStray()
-    {
-        std::filesystem::create_directories(std::filesystem::path(kStray).parent_path());
-        std::ofstream(kStray) << "half";
-        std::filesystem::last_write_time(kStray, std::filesystem::file_time_type::clock::now() -
-                                                     std::chrono::minutes(1));
-    }
-
-    ~Repair() override { std::filesystem::remove(kStray); }
-};
-
-TEST_F(Repair, SaysWhatItDoesAndLeavesNothingForASecondOne)
-{
-    WriteInterfaceFile("eth0", "DEVICE=ovs_eth0\nTYPE=OVS\nPRIMARY=eth0\n");
-    LeaveStray();
-    Host().act = Convert;
-    const std::string plan = "eth0 has a file that describes 'ovs_eth0'.\n" + std::string(kStray) +
-                             " is left over from a writer that was killed.\n"
-                             "To do:\n"
-                             "  make the live network what the files say\n"
-                             "  register 'vornovsctl-repair'\n"
-                             "  unregister 'vornovsctl-repair'\n"
-                             "  remove /etc/sysconfig/network-scripts/.vornovs-a1B2c3\n";
-    EXPECT_EQ(Ctl({"repair", "--dry-run"}), unit::Done(plan));
-    EXPECT_THAT(Host().calls, IsEmpty());
-    EXPECT_TRUE(std::filesystem::exists(kStray));
-
-    EXPECT_EQ(Ctl({"repair"}), unit::Done(plan + "Everything fits together.\n"));
-    EXPECT_THAT(Host().calls, ElementsAre("StartNetwork", "Register vornovsctl-repair",
-                                          "UnRegister vornovsctl-repair"));
-    EXPECT_FALSE(std::filesystem::exists(kStray));
-    EXPECT_FALSE(Host().interruptible);
-
-    Host().calls.clear();
-    EXPECT_EQ(Ctl({"repair"}), unit::Done("Everything fits together.\n"));
-    EXPECT_EQ(Ctl({"repair", "--dry-run"}), unit::Done("Everything fits together.\n"));
-    EXPECT_THAT(Host().calls, IsEmpty());
-}
-
-TEST_F(Repair, KeepsClientsRegistered)
-{
-    Host().clients = {"apps", "vms"};
-    Host().act = Convert;
-    WriteInterfaceFile("eth0", "DEVICE=eth0\n");
-    EXPECT_EQ(Ctl({"repair"}).exitStatus, 0);
-    EXPECT_EQ(Host().clients, (std::set<std::string>{"apps", "vms"}));
-    EXPECT_TRUE(std::filesystem::exists("/etc/sysconfig/network-scripts/ifcfg-ovs_eth0"));
-}
-
-TEST_F(Repair, BuildsABondAndMakesAVlanUnderTheLibrarysLock)
-{
-    WriteInterfaceFile("eth0", "DEVICE=eth0\n");
-    Host().devices = {"eth0"};
-    ASSERT_TRUE(
-        (vornhost::ConversionRecord{{{"bond0", {"802.3ad", {"eth1", "eth2"}}}}, {{"eth0", 30}}}
-             .Save()));
-    Host().act = [](unit::FakeHost& host) {
-        if (host.calls.back().starts_with("VORNNetLinkAggrSet")) {
-            WriteInterfaceFile("eth1", "DEVICE=eth1\nSLAVE=yes\nMASTER=bond0\n");
-        } else if (host.calls.back().starts_with("VLIBNetVlanCreate")) {
-            WriteInterfaceFile("eth0.30", "DEVICE=eth0.30\nVLAN=yes\nPHYSDEV=eth0\n");
-        }
-        return 0;
-    };
-    EXPECT_EQ(
-        Ctl({"repair"}),
-        unit::Done("bond0 is a bond that a conversion which was cut short has taken apart.\n"
-                   "eth0 has had the VLAN 30, which a conversion that was cut short has taken "
-                   "from it.\n"
-                   "To do:\n"
-                   "  make the live network what the files say\n"
-                   "  build bond0 of eth1, eth2 again\n"
-                   "  make the VLAN 30 of eth0 again\n"
-                   "Everything fits together.\n"));
-    const std::string lock = "VLIBCFileLockTimeByFile /tmp/ovs_config.lock 1 5";
-    const std::string unlock = "VLIBCFileUnlockByFile 7";
-    EXPECT_THAT(Host().calls,
-                ElementsAre("StartNetwork", lock, "VORNNetLinkAggrSet 2 bond0 eth1 eth2", unlock,
-                            lock, "VLIBNetVlanCreate eth0 30", unlock));
-    EXPECT_TRUE(vornhost::ConversionRecord{}.Save());
-}
-
-TEST_F(Repair, BuildsNothingWhileSomebodyElseHasTheLock)
-{
-    ASSERT_TRUE(
-        (vornhost::ConversionRecord{{{"bond0", {"802.3ad", {"eth1", "eth2"}}}}, {}}.Save()));
-    Host().lockResult = -1;
-    EXPECT_EQ(Ctl({"repair"}).exitStatus, 18);
-    EXPECT_THAT(Host().calls, testing::Not(testing::Contains(testing::StartsWith("VORNNet"))));
-    EXPECT_TRUE(vornhost::ConversionRecord{}.Save());
-}
-
-TEST_F(Repair, TellsWhatItCouldNotMend)
-{
-    Host().clients = {"apps"};
-    const Outcome outcome = Ctl({"repair", "--json"});
-    EXPECT_EQ(outcome.exitStatus, 14);
-    EXPECT_THAT(Host().calls, ElementsAre("StartNetwork", "UnRegister apps", "Register apps",
-                                          "StartNetwork", "UnRegister apps", "Register apps",
-                                          "StartNetwork", "UnRegister apps", "Register apps"));
-    EXPECT_THAT(outcome.output, testing::HasSubstr("\"error\": \"not mended:"));
-}
-
-TEST_F(Repair, ChangesNothingWhenSomethingCannotBeRead)
-{
-    Host().clients.reset();
-    LeaveStray();
-    EXPECT_EQ(Ctl({"repair"}), unit::Failed(1, "the registrations cannot be read.\nNothing was "
-                                               "changed: what cannot be read cannot be judged."));
-    EXPECT_TRUE(std::filesystem::exists(kStray));
 }
 
 } // namespace

@@ -6,6 +6,7 @@
 #include <support/tagdevice.h>
 
 #include <algorithm>
+#include <array>
 #include <iterator>
 
 namespace vornovsctl {
@@ -153,6 +154,12 @@ private:
                          : Quoted(file.device)));
             return;
         }
+        if (LookAtMembership(file)) {
+            return;
+        }
+        if (!file.IsBridges()) {
+            LookAtPlainFile(file);
+        }
         if (!file.IsBridges() || file.content.slave || !file.content.onBoot) {
             return;
         }
@@ -166,15 +173,82 @@ private:
         }
     }
 
+    /** Whether a bond's file lists the interface as one of its members. */
+    bool IsListed(const std::string& interface) const
+    {
+        return std::any_of(m_truths.files.begin(), m_truths.files.end(), [&](const auto& file) {
+            const auto& list = file.content.slaveList;
+            return std::find(list.begin(), list.end(), interface) != list.end();
+        });
+    }
+
+    /** @return whether the file and those of the bonds differ on whose member it is. */
+    bool LookAtMembership(const FileTruth& file)
+    {
+        const vornhost::InterfaceFile& content = file.content;
+        const bool listed =
+            content.slaveList.empty() && IsListed(file.IsBridges() ? content.primary : file.Name());
+        const bool ofNone = content.slave && !listed &&
+                            (file.IsBridges() || (!content.master.empty() &&
+                                                  m_truths.FindFile(content.master) == nullptr));
+        if (ofNone) {
+            Add(HalfStateClass::kUnfinishedFile, file.Name(),
+                "has a file of a member of a bond, and no bond's file has it");
+        } else if (listed && !content.slave) {
+            Add(HalfStateClass::kUnfinishedFile, file.Name(),
+                "has a file that does not know of its bond");
+        }
+        return ofNone || (listed && !content.slave);
+    }
+
+    void LookAtPlainFile(const FileTruth& file)
+    {
+        const std::string& name = file.Name();
+        if (file.content.use != vornhost::FileUse::kPlain || file.content.slave) {
+            return;
+        }
+        const FileTruth* bridge = m_truths.FindFile(BridgeOf(name));
+        if (bridge != nullptr && bridge->IsBridges() && bridge->content.primary == name &&
+            file.content.bridge.empty()) {
+            Add(HalfStateClass::kUnfinishedFile, name,
+                "has a file that does not name its bridge " + BridgeOf(name));
+        } else if (bridge == nullptr && WasForgotten(name)) {
+            Add(HalfStateClass::kRegisteredButPlain, name,
+                "is not on the switch, and " + List(*m_host.clients) + " are registered");
+        }
+    }
+
+    /** Whether others are on the switch, and nobody took this one off. */
+    bool WasForgotten(const std::string& name) const
+    {
+        const Device* device = m_host.Find(name);
+        return m_host.clients && !m_host.clients->empty() && IsOnSwitch() && device != nullptr &&
+               (device->kind.empty() || device->kind == "bond") && device->master.empty() &&
+               !device->onTheSwitch && IsConverted(name) && m_host.takenOff &&
+               !m_host.takenOff->contains(name);
+    }
+
+    /** What the library leaves as it is when it takes the host to the switch. */
+    static bool IsConverted(const std::string& name)
+    {
+        constexpr std::array kNever{"ovs_", "wlan", "ppp", "tun"};
+        return std::none_of(kNever.begin(), kNever.end(),
+                            [&](const char* prefix) { return name.starts_with(prefix); });
+    }
+
+    bool IsOnSwitch() const
+    {
+        return !Bridges().empty() ||
+               std::any_of(m_truths.files.begin(), m_truths.files.end(),
+                           [](const FileTruth& file) { return file.IsBridges(); });
+    }
+
     void LookAtClients()
     {
         if (!m_host.clients) {
             return;
         }
-        const bool bridgeFiles =
-            std::any_of(m_truths.files.begin(), m_truths.files.end(),
-                        [](const FileTruth& file) { return file.IsBridges(); });
-        const bool onSwitch = bridgeFiles || !Bridges().empty();
+        const bool onSwitch = IsOnSwitch();
         const bool emptied = m_host.takenOff && !m_host.takenOff->empty();
         const bool cutShort = m_host.clients->contains(kRepairClient);
         if (onSwitch && m_host.clients->empty()) {

@@ -2,6 +2,7 @@
 
 #include "wording.h"
 
+#include <support/atomicfile.h>
 #include <support/interfacevalues.h>
 #include <vornovs/vornovs.h>
 
@@ -60,12 +61,12 @@ void AddUnfinished(const HostTruths& truths, const std::vector<HalfState>& found
     all.Add(truths.remembered);
     for (const auto& [name, bond] : all.bonds) {
         if (isFound(HalfStateClass::kUnfinishedBond, name)) {
-            plan.push_back({RepairStep::Kind::kBuildBond, name, bond});
+            plan.push_back({RepairStep::Kind::kBuildBond, name, "", bond});
         }
     }
     for (const vornhost::FileVlan& vlan : all.vlans) {
         if (isFound(HalfStateClass::kUnfinishedVlan, vlan.parent)) {
-            plan.push_back({RepairStep::Kind::kMakeVlan, vlan.parent, {}, vlan.id});
+            plan.push_back({RepairStep::Kind::kMakeVlan, vlan.parent, "", {}, vlan.id});
         }
     }
 }
@@ -127,6 +128,45 @@ void MakeVlan(const std::string& parent, unsigned id)
     }
 }
 
+/**
+ * A bridge's file that was copied to another name and removed, and not yet edited there, is the
+ * only one to hold the settings, which a conversion would write over.
+ */
+void AddRestorations(const HostTruths& truths, std::vector<RepairStep>& plan)
+{
+    for (const FileTruth& file : truths.files) {
+        if (file.type == "OVS" && file.device != file.Name() && !InterfaceOf(file.device).empty() &&
+            truths.FindFile(file.device) == nullptr) {
+            plan.push_back({RepairStep::Kind::kRestoreFile, file.device, file.Name()});
+        }
+    }
+}
+
+std::string PathOf(const std::string& interface)
+{
+    return std::string(vornhost::kConfigurationFolder) + "/ifcfg-" + interface;
+}
+
+/** A bond's file that is nothing yet but a copy of its first member's bridge's goes. */
+void AddRemovals(const HostTruths& truths, std::vector<RepairStep>& plan)
+{
+    for (const FileTruth& file : truths.files) {
+        const FileTruth* from = file.device == file.Name() ? nullptr : truths.FindFile(file.device);
+        if (file.type == "OVS" && file.content.slaveList.empty() && from != nullptr &&
+            from->IsBridges() && from->content.primary != InterfaceOf(file.Name()) &&
+            !InterfaceOf(file.Name()).empty()) {
+            plan.push_back({RepairStep::Kind::kRemoveFile, PathOf(file.Name())});
+        }
+    }
+}
+
+void RestoreFile(const std::string& interface, const std::string& source)
+{
+    if (const auto file = vornhost::KeyValueFile::Load(PathOf(source))) {
+        (void)vornhost::ReplaceFile(PathOf(interface), file->Text(), 0644);
+    }
+}
+
 /** A file that a writer still has goes by itself. */
 void RemoveStray(const std::string& path)
 {
@@ -145,6 +185,8 @@ void RemoveStray(const std::string& path)
 std::vector<RepairStep> PlanRepair(const HostTruths& truths, const std::vector<HalfState>& found)
 {
     std::vector<RepairStep> plan;
+    AddRestorations(truths, plan);
+    AddRemovals(truths, plan);
     const bool strayOnly = std::all_of(found.begin(), found.end(), [](const HalfState& each) {
         return each.kind == HalfStateClass::kStrayFile;
     });
@@ -172,6 +214,9 @@ std::vector<RepairStep> PlanRepair(const HostTruths& truths, const std::vector<H
 std::string TextOf(const RepairStep& step)
 {
     switch (step.kind) {
+    case RepairStep::Kind::kRestoreFile:
+        return "put the file of " + Quoted(step.subject) + " back from that of " +
+               Quoted(step.source);
     case RepairStep::Kind::kStartNetwork:
         return "make the live network what the files say";
     case RepairStep::Kind::kUnregister:
@@ -192,6 +237,9 @@ std::string TextOf(const RepairStep& step)
 void TakeStep(const RepairStep& step)
 {
     switch (step.kind) {
+    case RepairStep::Kind::kRestoreFile:
+        RestoreFile(step.subject, step.source);
+        break;
     case RepairStep::Kind::kStartNetwork:
         (void)VORN::OVS::StartNetwork({});
         break;

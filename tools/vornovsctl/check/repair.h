@@ -1,6 +1,7 @@
 /**
- * What takes a host out of its half states: the network program makes the live network what the
- * files say, and a whole conversion by the library finishes the files of one that was cut short.
+ * What takes a host out of its half states: a file that was on its way to another name comes back,
+ * the network program makes the live network what the files say, a whole conversion by the library
+ * finishes the files of one that was cut short, and bonds and VLANs that it took apart are built.
  */
 #ifndef VORNOVSCTL_CHECK_REPAIR_H
 #define VORNOVSCTL_CHECK_REPAIR_H
@@ -14,15 +15,17 @@ namespace vornovsctl {
 
 struct RepairStep {
     enum class Kind {
+        kRestoreFile,  /**< that of "subject", which only stands under the name in "source" */
         kStartNetwork, /**< the network program takes the files for what is meant */
         kUnregister,   /**< a client, whose name is in "subject" */
         kBuildBond,    /**< as it was before the conversion that took it apart */
         kMakeVlan,     /**< the same, on the interface in "subject" */
         kRegister,     /**< as kUnregister */
-        kRemoveFile,   /**< a stray one */
+        kRemoveFile,   /**< a stray one, or a copy that was not edited yet */
     };
     Kind kind;
     std::string subject;
+    std::string source{};
     vornhost::ConvertedBond bond{}; /**< that is built */
     unsigned vlan = 0;              /**< the id of the VLAN that is made */
 

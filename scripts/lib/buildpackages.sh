@@ -50,3 +50,8 @@ package_test_packages=(
 coverage_packages=(
     gcovr
 )
+
+fuzz_packages=(
+    clang
+    libclang-rt-dev
+)

@@ -5,6 +5,7 @@
 #include "keyvaluefile.h"
 
 #include <algorithm>
+#include <cctype>
 #include <cerrno>
 #include <filesystem>
 #include <nlohmann/json.hpp>
@@ -200,6 +201,18 @@ std::vector<Record> LoadRecords(const char* kind)
 
 } // namespace
 
+bool IsLinkAddress(const std::string& text)
+{
+    constexpr std::size_t kLength = 17;
+    constexpr std::size_t kStep = 3;
+    bool valid = text.size() == kLength;
+    for (std::size_t at = 0; valid && at < kLength; ++at) {
+        const auto byte = static_cast<unsigned char>(text[at]);
+        valid = at % kStep == kStep - 1 ? text[at] == ':' : std::isxdigit(byte) != 0;
+    }
+    return valid;
+}
+
 bool RememberedBond::HasSlaves(std::vector<std::string> others) const
 {
     std::vector<std::string> own = slaves;
@@ -214,6 +227,9 @@ std::optional<RememberedBond> RememberedBond::Load(const std::string& name)
         RememberedBond bond;
         bond.name = name;
         bond.mac = object.at("mac").get<std::string>();
+        if (!IsLinkAddress(bond.mac)) {
+            bond.mac.clear(); // it is going to be a word of a command
+        }
         bond.mtu = object.at("mtu").get<unsigned>();
         bond.options.values = object.at("options").get<std::map<std::string, std::string>>();
         bond.slaves = object.at("slaves").get<std::vector<std::string>>();

@@ -47,6 +47,9 @@ struct RememberedState {
     bool operator==(const RememberedState&) const = default;
 };
 
+/** Whether a text is an address of Ethernet as the kernel writes it: six pairs of hex digits. */
+bool IsLinkAddress(const std::string& text);
+
 /** A Linux bond that was taken apart. */
 struct RememberedBond {
     std::string name; ///< Of the Linux bond, such as "bond0".

@@ -52,7 +52,24 @@ snapshot_links()
         sed -E -e 's/^[0-9]+: //' -e 's/@(if)?[0-9]+:/:/' -e 's/ link-netns(id)? [^ ]+//' \
             -e 's/ (ad_aggregator(_id)?|link_failure_count) [0-9]+//g' -e 's/ gc_timer +[0-9.]+//' \
             -e 's/\\//g' -e 's/  +/ /g' |
-        sed '/^ovs-system:/d' | sort
+        sed '/^ovs-system:/d' | without_working_member | sort
+}
+
+# With $lab_any_member_works set leaves out which member of a bond works: where nobody has said which
+# shall, it is the one whose cable was found first.
+without_working_member()
+{
+    if [ -z "${lab_any_member_works:-}" ]; then
+        cat
+    else
+        sed -E -e 's/ active_slave [^ ]+//' -e 's/ bond_slave state [A-Z]+/ bond_slave/' \
+            -e '/\/active_slave:/d' -e "/^($(bond_members | tr '\n' '|')-) link 33:33:ff:/d"
+    fi
+}
+
+bond_members()
+{
+    cat /sys/class/net/*/bonding/slaves 2>/dev/null | tr ' ' '\n'
 }
 
 # Fleeting IPv6 addresses, one a line: temporary ones, which the kernel makes now and then, and those
@@ -95,7 +112,7 @@ snapshot_groups()
     ip maddress show |
         awk '/^[0-9]+:/ { name = $2; next } { $1 = $1; print name, $0 }' |
         grep -v -F -w -f <(fleeting) |
-        sed '/^ovs-system /d' | sort
+        sed '/^ovs-system /d' | without_working_member | sort
 }
 
 snapshot_sysctls()
@@ -136,7 +153,7 @@ snapshot_bonds()
     for folder in /sys/class/net/*/bonding; do
         [ -d "$folder" ] || continue
         grep -rs . "$folder" | sed -e "s|^/sys/class/net/||" -e '/\/ad_aggregator:/d'
-    done | bonds_in_order | sort
+    done | bonds_in_order | without_working_member | sort
 }
 
 snapshot_switch()

@@ -58,6 +58,18 @@ TEST_F(Remembered, BondIsWhatWasSavedToTheLastByte)
               std::filesystem::perms::owner_read | std::filesystem::perms::owner_write);
 }
 
+TEST(Remembered, TakesNothingElseForALinkAddress)
+{
+    for (const char* damaged :
+         {"02:00:00:00:00:0g", "02:00:00:00:00", "02-00-00-00-00-01", "a\nb"}) {
+        RememberedBond bond = SomeBond();
+        bond.mac = damaged;
+        ASSERT_TRUE(bond.Save());
+        EXPECT_EQ(RememberedBond::Load("bond0")->mac, "") << damaged;
+    }
+    ASSERT_TRUE(SomeBond().Save());
+}
+
 TEST_F(Remembered, BondIsReplacedByALaterOneAndForgotten)
 {
     RememberedBond later = SomeBond();

@@ -9,6 +9,7 @@
 
 #include "support/interfacename.h"
 #include "support/interfacevalues.h"
+#include "support/remembered.h"
 
 #include <algorithm>
 #include <array>
@@ -40,7 +41,12 @@ std::optional<World> HostOf(std::string_view text)
         const bool named = std::all_of(links.begin(), links.end(), [](const auto& link) {
             return vornhost::IsInterfaceName(link.name) && link.index > 0;
         });
-        return named ? std::optional(world) : std::nullopt;
+        const auto& bonds = world.inputs.formerBonds;
+        const bool addressed = std::all_of(bonds.begin(), bonds.end(), [](const auto& entry) {
+            const std::string& mac = entry.second.bond.mac;
+            return mac.empty() || vornhost::IsLinkAddress(mac);
+        });
+        return named && addressed ? std::optional(world) : std::nullopt;
     } catch (const std::exception&) {
         return std::nullopt;
     }

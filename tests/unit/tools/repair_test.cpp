@@ -185,6 +185,7 @@ TEST_F(Repair, BuildsABondAndMakesAVlanUnderTheLibrarysLock)
              .Save()));
     Host().act = [](unit::FakeHost& host) {
         if (host.calls.back().starts_with("VORNNetLinkAggrSet")) {
+            WriteInterfaceFile("bond0", "DEVICE=bond0\nBONDING_OPTS=\"mode=802.3ad\"\n");
             WriteInterfaceFile("eth1", "DEVICE=eth1\nSLAVE=yes\nMASTER=bond0\n");
         } else if (host.calls.back().starts_with("VLIBNetVlanCreate")) {
             WriteInterfaceFile("eth0.30", "DEVICE=eth0.30\nVLAN=yes\nPHYSDEV=eth0\n");

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <filesystem>
 #include <sstream>
 #include <string_view>
 #include <support/contains.h>
@@ -186,7 +187,7 @@ private:
                     name.find_first_not_of("abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ"
                                            "0123456789_-") == std::string::npos;
                 if (counts) {
-                    ReadFile(found);
+                    ReadFile(std::filesystem::path(found).lexically_normal());
                 }
             }
         }

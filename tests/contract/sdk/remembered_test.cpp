@@ -58,7 +58,7 @@ TEST_F(Remembered, BondIsWhatWasSavedToTheLastByte)
               std::filesystem::perms::owner_read | std::filesystem::perms::owner_write);
 }
 
-TEST(Remembered, TakesNothingElseForALinkAddress)
+TEST_F(Remembered, TakesNothingElseForALinkAddress)
 {
     for (const char* damaged :
          {"02:00:00:00:00:0g", "02:00:00:00:00", "02-00-00-00-00-01", "a\nb"}) {

@@ -30,6 +30,17 @@ using Names = std::set<std::string>;
 
 constexpr char kBridgePrefix[] = "ovs_";
 
+/** Whether a text that is not of a configuration file has what no program writes into one. */
+bool HasControlCharacter(const Json& json)
+{
+    if (json.is_string()) {
+        const auto& text = json.get_ref<const std::string&>();
+        return std::any_of(text.begin(), text.end(),
+                           [](char each) { return static_cast<unsigned char>(each) < ' '; });
+    }
+    return json.is_structured() && std::any_of(json.begin(), json.end(), HasControlCharacter);
+}
+
 /** @return nothing: the text is no such host, or one that no kernel would have. */
 std::optional<World> HostOf(std::string_view text)
 {
@@ -37,6 +48,10 @@ std::optional<World> HostOf(std::string_view text)
         Json json = Json::parse(text);
         std::map<std::string, std::string> files = json.value("files", Json::object());
         World world = contract::ReadWorld(json, files);
+        json.erase("files");
+        if (HasControlCharacter(json)) {
+            return std::nullopt;
+        }
         const auto& links = world.inputs.live.links;
         const bool named = std::all_of(links.begin(), links.end(), [](const auto& link) {
             return vornhost::IsInterfaceName(link.name) && link.index > 0;

@@ -1,7 +1,7 @@
 # shellcheck shell=bash disable=SC2154,SC2034 # variables of the guest's other files
 
 clients=16
-ports=1000
+ports="$(sampled 200 1000)"
 hook=/usr/vorn/etc/hooks/net/ovs_change/50-witness
 
 # Each client has a name of its own in the system log, which is the program's.
@@ -48,7 +48,7 @@ chmod 755 "$hook"
 
 step "$clients clients"
 status=0
-for pid in $(start_clients "$(sampled 20 60)"); do
+for pid in $(start_clients "$(sampled 10 60)"); do
     while process_runs "$pid"; do
         pause 0.5
     done

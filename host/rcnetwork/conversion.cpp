@@ -98,7 +98,7 @@ std::optional<ConversionStage> FindStage(const std::string& name)
     constexpr std::array<std::pair<const char*, ConversionStage>, 3> kStages{
         {{"create", ConversionStage::kToSwitch},
          {"delete", ConversionStage::kToPlain},
-         {"done", ConversionStage::kDone}}};
+         {"end", ConversionStage::kDone}}};
     for (const auto& [word, stage] : kStages) {
         if (name == word) {
             return stage;

@@ -19,7 +19,7 @@ namespace vornhost {
 enum class ConversionStage {
     kToSwitch, ///< A conversion to the switch begins: "create".
     kToPlain,  ///< One to plain networking begins: "delete".
-    kDone      ///< It has ended as it should.
+    kDone      ///< It has ended as it should: "end".
 };
 
 /** @return  nothing when there is no stage of that name. */

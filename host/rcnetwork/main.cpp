@@ -23,7 +23,7 @@ namespace {
 
 constexpr int kUsageError = 2;
 constexpr char kBondVerb[] = "set-ovs-bond";
-/** Of the hook program that is told of conversions: "create", "delete" or "done". */
+/** Of the hook program that is told of conversions: "create", "delete" or "end". */
 constexpr char kConversionVerb[] = "conversion";
 
 /** Of the tool that gives interfaces back to another manager. */

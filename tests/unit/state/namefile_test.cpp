@@ -216,6 +216,49 @@ TEST_P(SavedNames, StayAsTheyWereWhenSyncOrRenameFails)
     }
 }
 
+TEST_P(SavedNames, StayAsTheyWereWhenTheirReplacementCannotBeTaken)
+{
+    for (const std::string function : {"flock", "fstat", "lstat", "ftruncate"}) {
+        const RecordingPlatform platform;
+        WriteFile(GetParam().path, "eth0\n");
+        FileCalls calls;
+        calls.Watch(
+            [&](const std::string& call) {
+                return call.starts_with(function) && call.ends_with(".new") ? EIO : 0;
+            },
+            {});
+        EXPECT_EQ(GetParam().add("eth1"), 0) << function;
+        EXPECT_EQ(ReadFile(GetParam().path), "eth0\n") << function;
+        EXPECT_THAT(ListFolder(kStateFolder), ElementsAre(GetParam().FileName())) << function;
+    }
+}
+
+TEST_P(SavedNames, AreWrittenBesideAReplacementThatAnotherWriterHas)
+{
+    const std::string theirs = GetParam().path + ".new";
+    for (const bool gone : {true, false}) {
+        const RecordingPlatform platform;
+        WriteFile(GetParam().path, "eth0\n");
+        FileCalls calls;
+        calls.Watch(
+            [&](const std::string& call) {
+                if (gone && call == "lstat " + theirs) {
+                    return ENOENT;
+                }
+                if (!gone && call == "flock " + theirs) {
+                    fs::rename(theirs, theirs + "-away");
+                    WriteFile(theirs, "");
+                }
+                return 0;
+            },
+            {});
+        EXPECT_EQ(GetParam().add("eth1"), 0);
+        EXPECT_EQ(ReadFile(GetParam().path), "eth0\neth1\n");
+        EXPECT_TRUE(fs::remove(theirs));
+        fs::remove(theirs + "-away");
+    }
+}
+
 TEST_P(SavedNames, AreWrittenInPlaceWhereOwnerOrModeCannotBeKept)
 {
     for (const char* function : {"fchown", "fchmod"}) {

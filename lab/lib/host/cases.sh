@@ -25,8 +25,8 @@ lab_case_disk()
 }
 
 # lab_case_names MACHINE DAILY: the cases for a machine (empty: all). With DAILY "daily" a case for
-# the machine with systemd must have a file `daily`. Long cases, which have a deadline of their own,
-# come first: the short ones fill the gaps.
+# the machine with systemd must have a file `daily`, and one for the small one no file `seldom`. Long
+# cases, which have a deadline of their own, come first: the short ones fill the gaps.
 lab_case_names()
 {
     local machine=$1 daily=$2 folder name its
@@ -34,7 +34,8 @@ lab_case_names()
         name=$(basename "$folder")
         its=$(lab_case_machine "$name")
         if [[ (-z $machine || $its == "$machine") &&
-            (-z $daily || $its != systemd || -e $folder/daily) ]]; then
+            (-z $daily || ($its == systemd && -e $folder/daily) ||
+            ($its == small && ! -e $folder/seldom)) ]]; then
             printf '%d %s\n' "$([[ -e $folder/deadline ]] && echo 0 || echo 1)" "$name"
         fi
     done | sort | cut -d ' ' -f 2

@@ -1,7 +1,7 @@
 # shellcheck shell=bash disable=SC2154,SC2034 # variables of the guest's other files
 
 clients=16
-ports="$(sampled 200 1000)"
+ports="$(sampled 50 1000)"
 hook=/usr/vorn/etc/hooks/net/ovs_change/50-witness
 
 # Each client has a name of its own in the system log, which is the program's.

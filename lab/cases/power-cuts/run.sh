@@ -6,7 +6,7 @@ lab_members_in_any_order=yes
 phase_start()
 {
     local count
-    count="$(points 10 40)"
+    count="$(points 4 40)"
     topology_ready
     remember_plain
     points_spread "$count"

@@ -9,7 +9,7 @@ last="$(steps_taken)"
 sed 's/^/step /' "$lab_steps" | show
 expect_plain learned
 
-stride="$(sampled 3 1)"
+stride="$(sampled 8 1)"
 step "Be killed before $((last / stride)) of $last steps"
 # Minutes of probes: more seldom than elsewhere, still five times within the limit.
 lab_probe_interval=20

@@ -9,7 +9,7 @@ network_rests()
     no_process_named rc.network
 }
 
-count="$(points 4 40)"
+count="$(points 2 40)"
 remember_plain
 points_spread "$count"
 while points_next; do

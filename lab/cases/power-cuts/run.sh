@@ -6,7 +6,7 @@ lab_members_in_any_order=yes
 phase_start()
 {
     local count
-    count="$(points 4 40)"
+    count="$(points 2 40)"
     topology_ready
     remember_plain
     points_spread "$count"

@@ -39,6 +39,8 @@ phase_run()
     elif [ "$boots" -gt 1 ]; then
         fail "the machine restarted by itself"
     fi
+    # What came before, the host's preparation or another phase, has told why it failed.
+    [ ! -e "$lab_out/failure" ] || exit 1
     phase_wait_for_boot
     figure "boot $boots" "$(guest_time)" s
     step "Phase $phase"

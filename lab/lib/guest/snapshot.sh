@@ -69,7 +69,11 @@ without_working_member()
 
 bond_members()
 {
-    cat /sys/class/net/*/bonding/slaves 2>/dev/null | tr ' ' '\n'
+    local slaves
+    for slaves in /sys/class/net/*/bonding/slaves; do
+        # Without a bond the pattern stands for itself.
+        [ ! -e "$slaves" ] || tr ' ' '\n' <"$slaves"
+    done
 }
 
 # Fleeting IPv6 addresses, one a line: temporary ones, which the kernel makes now and then, and those

@@ -30,8 +30,10 @@ class Automatic : public Host {
 protected:
     void TearDown() override
     {
-        Host::TearDown();
+        // Whoever tries again may be writing in the folder that is deleted next.
+        EXPECT_EQ(RcNetwork({"stop"}).exitCode, 0);
         EXPECT_TRUE(WaitUntil([] { return Retriers() == 0; }));
+        Host::TearDown();
         for (const char* service : {"vornovs-db", "vornovs-vswitch"}) {
             Delete(std::string("/etc/init.d/") + service);
         }

@@ -30,8 +30,17 @@ if(NOT CMAKE_CXX_FLAGS MATCHES "-fsanitize")
     add_link_options(LINKER:-z,defs)
 endif()
 
+# What a library offers is compared with a recorded baseline by its types, which the release build's
+# debugging information has for these targets; packages are stripped of it.
+function(vornovs_describe_types)
+    foreach(target ${ARGN})
+        target_compile_options(${target} PRIVATE $<$<CONFIG:RelWithDebInfo>:-g2>)
+    endforeach()
+endfunction()
+
 # Exports of a library: only what the version script in packaging/ names.
 function(vornovs_export target script)
+    vornovs_describe_types(${target})
     target_link_options(${target} PRIVATE "LINKER:--version-script=${script}")
     set_target_properties(${target} PROPERTIES LINK_DEPENDS "${script}")
 endfunction()

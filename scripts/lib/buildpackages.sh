@@ -17,6 +17,7 @@ build_packages=(
 )
 
 test_packages=(
+    abigail-tools
     binutils
     clang
     dhcpcd-base

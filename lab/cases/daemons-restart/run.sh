@@ -5,7 +5,7 @@ kill_all()
 {
     local pid
     for pid in $(processes_named "$2"); do
-        kill "-$1" "$pid" 2>/dev/null || true
+        kill "-$1" "$pid" 2>/dev/null || true # it may have ended by now
     done
 }
 

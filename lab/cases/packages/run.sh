@@ -204,7 +204,7 @@ remove_is_refused()
     done
     expect_failure packages_apt remove vornovs-host
     kill "${holders[@]}"
-    wait "${holders[@]}" || true
+    wait "${holders[@]}" || true # their status is that they were ended
     wait_until 10 lock_is_free
     grep -q "vornovs: not removed: the client 'alpha' could not be withdrawn" "$lab_out/apt.log" ||
         fail "the reason is not told"

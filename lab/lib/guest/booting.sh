@@ -30,17 +30,22 @@ expect_answers()
     done
 }
 
+unit_state()
+{
+    systemctl is-active "$1" || true # which ends with 0 for active ones alone
+}
+
 expect_active()
 {
     local unit
     for unit in "$@"; do
-        expect_equal "$unit" active "$(systemctl is-active "$unit" || true)"
+        expect_equal "$unit" active "$(unit_state "$unit")"
     done
 }
 
 unit_is()
 {
-    [ "$(systemctl is-active "$1")" = "$2" ]
+    [ "$(unit_state "$1")" = "$2" ]
 }
 
 # unit_of PROCESS-NAME: the unit whose process it is.

@@ -306,12 +306,20 @@ expect_plain()
     expect_unchanged plain "${1:-home}"
 }
 
-# expect_registered NAME...: these and no others. There is no file while there is no client.
+# A name a line. There is no file while there is no client.
+registered_clients()
+{
+    if [ -e "$lab_state/ovs_reg.conf" ]; then
+        cat "$lab_state/ovs_reg.conf"
+    fi
+}
+
+# expect_registered NAME...: these and no others.
 expect_registered()
 {
     local wanted
     wanted="$(printf '%s\n' "$@" | sed '/^$/d' | sort)"
-    expect_equal "the registered clients" "$wanted" "$(cat "$lab_state/ovs_reg.conf" 2>/dev/null || true)"
+    expect_equal "the registered clients" "$wanted" "$(registered_clients)"
 }
 
 # True when no process holds the configuration lock.
@@ -344,7 +352,7 @@ bring_home()
     if [ -s "$lab_state/ovs_reg.conf" ]; then
         while read -r name; do
             expect_success vornovsctl unregister "$name"
-        done < <(cat "$lab_state/ovs_reg.conf")
+        done < <(registered_clients)
         if ! bridge_files_left; then
             return
         fi
@@ -364,7 +372,7 @@ mend()
     if [ -s "$lab_state/ovs_reg.conf" ]; then
         while read -r name; do
             expect_success vornovsctl unregister "$name"
-        done < <(cat "$lab_state/ovs_reg.conf")
+        done < <(registered_clients)
     fi
 }
 

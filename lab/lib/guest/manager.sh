@@ -4,7 +4,9 @@
 # The manager that the case is about; empty: nobody.
 manager_name()
 {
-    cat /lab/case/manager 2>/dev/null || true
+    if [ -e /lab/case/manager ]; then
+        cat /lab/case/manager
+    fi
 }
 
 # The units that make a manager one.

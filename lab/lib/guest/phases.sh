@@ -57,6 +57,6 @@ phase_wait_for_boot()
         note "rc.network ended with $status"
         return
     fi
-    systemctl is-system-running --wait >/dev/null || true
+    systemctl is-system-running --wait >/dev/null || true # "degraded" is a failure, too
     systemctl list-units --failed --plain --no-legend --no-pager | show
 }

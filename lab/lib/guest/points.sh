@@ -80,7 +80,7 @@ expect_reachable()
 # Takes the host from where an interrupted client left it to plain networking as it was.
 expect_way_home()
 {
-    vornovsctl check 2>&1 | show || true
+    vornovsctl check 2>&1 | show || true # its status is the class of what it found
     mend >"$lab_out/way-home" 2>&1 || fail "no way home: $(tail -n 3 "$lab_out/way-home")"
     expect_registered
     expect_plain "$1"

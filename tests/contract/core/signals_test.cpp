@@ -2,6 +2,7 @@
  * What a client does with its signals and descriptors is no matter of the program, and the other
  * way round.
  */
+#include "reapers/reapers.h"
 #include "scene.h"
 
 #include <array>
@@ -10,7 +11,6 @@
 #include <cstdlib>
 #include <functional>
 #include <string>
-#include <thread>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -57,25 +57,6 @@ void SetHandler(void (*handler)(int), int flags)
     ASSERT_EQ(::sigaction(SIGCHLD, &action, nullptr), 0);
 }
 
-void ReapAll(int)
-{
-    const int reason = errno;
-    while (::waitpid(-1, nullptr, WNOHANG) > 0) {
-    }
-    errno = reason;
-}
-
-void ReapForEver()
-{
-    std::thread([] {
-        for (;;) {
-            if (::waitpid(-1, nullptr, 0) < 0) {
-                std::this_thread::yield();
-            }
-        }
-    }).detach();
-}
-
 class ClientThat : public testing::TestWithParam<Treatment> {};
 
 TEST_P(ClientThat, GetsTheRightStatus)
@@ -102,8 +83,8 @@ INSTANTIATE_TEST_SUITE_P(
     testing::Values(Treatment{"LeavesSigchldAlone", [] { SetHandler(SIG_DFL, 0); }},
                     Treatment{"IgnoresSigchld", [] { SetHandler(SIG_IGN, 0); }},
                     Treatment{"WantsNoZombies", [] { SetHandler(SIG_DFL, SA_NOCLDWAIT); }},
-                    Treatment{"ReapsInAHandler", [] { SetHandler(ReapAll, 0); }},
-                    Treatment{"ReapsInAThread", ReapForEver}),
+                    Treatment{"ReapsInAHandler", [] { SetHandler(harness::ReapAll, 0); }},
+                    Treatment{"ReapsInAThread", harness::ReapForEver}),
     [](const auto& row) { return row.param.name; });
 
 TEST(Client, GetsTheRightStatusWhileSignalsInterruptIt)

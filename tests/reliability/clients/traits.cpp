@@ -1,19 +1,16 @@
 #include "clients/traits.h"
 
 #include "host/host.h"
+#include "reapers/reapers.h"
 
 #include <algorithm>
-#include <cerrno>
-#include <chrono>
 #include <csignal>
 #include <cstdlib>
 #include <filesystem>
 #include <stdexcept>
-#include <thread>
 
 #include <fcntl.h>
 #include <sys/resource.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 namespace reliability {
@@ -37,25 +34,6 @@ void OnChildEnd(void (*handler)(int), int flags)
     action.sa_handler = handler;
     action.sa_flags = flags;
     Check(::sigaction(SIGCHLD, &action, nullptr) == 0, "sigaction");
-}
-
-void ReapAll(int /*signal*/)
-{
-    const int reason = errno;
-    while (::waitpid(-1, nullptr, WNOHANG) > 0) {
-    }
-    errno = reason;
-}
-
-void ReapForEver()
-{
-    std::thread([] {
-        for (;;) {
-            if (::waitpid(-1, nullptr, 0) < 0) {
-                std::this_thread::sleep_for(std::chrono::microseconds(100));
-            }
-        }
-    }).detach();
 }
 
 void BlockAll()
@@ -142,8 +120,8 @@ std::vector<Trait> ChildTraits()
     return {{"leaves SIGCHLD alone", [] { OnChildEnd(SIG_DFL, 0); }},
             {"ignores SIGCHLD", [] { OnChildEnd(SIG_IGN, 0); }},
             {"wants no zombies", [] { OnChildEnd(SIG_DFL, SA_NOCLDWAIT); }},
-            {"reaps in a handler", [] { OnChildEnd(ReapAll, 0); }},
-            {"reaps in a thread", ReapForEver}};
+            {"reaps in a handler", [] { OnChildEnd(harness::ReapAll, 0); }},
+            {"reaps in a thread", harness::ReapForEver}};
 }
 
 std::vector<Trait> SignalTraits()

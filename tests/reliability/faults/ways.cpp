@@ -1,24 +1,14 @@
 #include "faults/ways.h"
 
 #include "faults/contract.h"
+#include "support/support.h"
 
 #include <algorithm>
 #include <cerrno>
-#include <sstream>
 
 namespace reliability {
 
 namespace {
-
-std::vector<std::string> Words(const std::string& text)
-{
-    std::istringstream stream(text);
-    std::vector<std::string> words;
-    for (std::string word; stream >> word;) {
-        words.push_back(word);
-    }
-    return words;
-}
 
 /** Puts the call's words in the places of $1, $2... */
 std::string Filled(const std::string& text, const std::vector<std::string>& words)
@@ -77,7 +67,7 @@ std::vector<Way> WaysOfOpening(const std::string& verb, const std::string& path,
 
 std::vector<Way> WaysOfFile(const Point& point)
 {
-    const std::vector<std::string> words = Words(point.text);
+    const std::vector<std::string> words = unit::Words(point.text);
     const std::string& verb = words[0];
     const std::string& path = words[1];
     if (verb.starts_with("open-")) {
@@ -116,7 +106,7 @@ std::vector<Way> WaysOfFile(const Point& point)
 
 std::vector<Way> WaysOf(const Point& point, const std::vector<Row>& own)
 {
-    const std::vector<std::string> words = Words(point.text);
+    const std::vector<std::string> words = unit::Words(point.text);
     const Row* row = Find(own, point.text);
     if (row == nullptr && point.file) {
         return WaysOfFile(point);

@@ -10,16 +10,6 @@ namespace fs = std::filesystem;
 
 namespace {
 
-std::vector<std::string> Words(const std::string& text)
-{
-    std::istringstream stream(text);
-    std::vector<std::string> words;
-    for (std::string word; stream >> word;) {
-        words.push_back(word);
-    }
-    return words;
-}
-
 std::vector<std::string> Lines(const std::string& text)
 {
     std::istringstream stream(text);

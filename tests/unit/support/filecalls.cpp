@@ -136,6 +136,7 @@ const char* WayOfOpening(int flags)
     return (flags & O_ACCMODE) == O_RDONLY ? "open-read" : "open-write";
 }
 
+/** The C library's own function. */
 template <typename Function>
 Function Next(const char* name)
 {
@@ -203,12 +204,7 @@ ScopedWithoutOverride::~ScopedWithoutOverride()
 
 namespace {
 
-/** The C library's own function. */
-template <typename Function>
-Function Next(const char* name)
-{
-    return unit::Next<Function>(name);
-}
+using unit::Next;
 
 } // namespace
 

@@ -96,6 +96,16 @@ std::optional<std::string> ReadFile(const std::string& path)
     return text.str();
 }
 
+std::vector<std::string> Words(const std::string& text)
+{
+    std::istringstream stream(text);
+    std::vector<std::string> words;
+    for (std::string word; stream >> word;) {
+        words.push_back(word);
+    }
+    return words;
+}
+
 std::vector<std::string> ListFolder(const std::string& path)
 {
     std::vector<std::string> names;

@@ -47,6 +47,9 @@ void WriteFile(const std::string& path, const std::string& text);
 /** The file's content, or nothing when there is no file. */
 std::optional<std::string> ReadFile(const std::string& path);
 
+/** What stands between white space. */
+std::vector<std::string> Words(const std::string& text);
+
 /** The names in a folder, sorted. */
 std::vector<std::string> ListFolder(const std::string& path);
 

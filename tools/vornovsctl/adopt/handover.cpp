@@ -170,7 +170,16 @@ void MarkNetworkRoutes(const HostView& host, const std::string& name, Hands& han
     }
 }
 
-/** For the moment in which the daemon takes over it is to leave what is lasting as it finds it. */
+/**
+ * For the moment in which the daemon takes over it is to leave what is lasting as it finds it, and
+ * the members of a bond, all of which it would take down to make them members once more.
+ */
+std::string KeepTextOf(bool members)
+{
+    return std::string("[Network]\nKeepConfiguration=static\n") +
+           (members ? "KeepMaster=yes\n" : "");
+}
+
 std::string KeepPathOf(const AdoptedInterface& interface)
 {
     return "/run/systemd/network/" + interface.origin.substr(interface.origin.rfind('/') + 1) +
@@ -187,17 +196,20 @@ void GiveToNetworkd(const HostView& host, const AdoptionRecord& record,
         (void)hands.Run({"networkctl", "reload"});
         return;
     }
-    std::set<std::string> paths;
+    std::map<std::string, bool> paths; // and whether all that the file is for are members
     for (const AdoptedInterface& interface : record.interfaces) {
         if (interface.manager == Manager::kNetworkd && names.contains(interface.name)) {
-            paths.insert(KeepPathOf(interface));
+            const vornhost::Link* const link = host.live.Find(interface.name);
+            const bool isMember = link != nullptr && link->master != 0;
+            const auto [path, isNew] = paths.emplace(KeepPathOf(interface), isMember);
+            path->second = path->second && isMember;
         }
     }
-    for (const std::string& path : paths) {
-        hands.Write(path, "[Network]\nKeepConfiguration=static\n", kReadableMode);
+    for (const auto& [path, members] : paths) {
+        hands.Write(path, KeepTextOf(members), kReadableMode);
     }
     StartAnew(kNetworkdUnit, hands);
-    for (const std::string& path : paths) {
+    for (const auto& [path, members] : paths) {
         hands.Remove(path);
         hands.RemoveEmptyFolder(path.substr(0, path.rfind('/')));
     }

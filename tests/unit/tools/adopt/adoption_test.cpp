@@ -7,6 +7,7 @@
 #include <filesystem>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <map>
 #include <sys/stat.h>
 
 namespace {
@@ -44,11 +45,13 @@ public:
     }
 
     std::vector<std::string> runs;
+    std::map<std::string, std::string> written; // what was written last, also if it is gone by now
 
     void Write(const std::string& path, const std::string& text, unsigned mode) override
     {
         Live();
         Hands::Write(path, text, mode);
+        written[path] = text;
     }
     void Remove(const std::string& path) override
     {
@@ -463,6 +466,10 @@ TEST(Networkd, IsEndedWithoutAWordAndKeptFromMakingTheBond)
                                         "systemctl kill --kill-whom=main --signal=KILL "
                                         "systemd-networkd.service",
                                         "systemctl start systemd-networkd.service"));
+    EXPECT_EQ(hands.written["/run/systemd/network/20-bond0.network.d/zz-vornovs-keep.conf"],
+              "[Network]\nKeepConfiguration=static\n");
+    EXPECT_EQ(hands.written["/run/systemd/network/30-eth0.network.d/zz-vornovs-keep.conf"],
+              "[Network]\nKeepConfiguration=static\nKeepMaster=yes\n");
     EXPECT_EQ(host.Files(), before);
 }
 

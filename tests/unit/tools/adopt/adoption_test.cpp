@@ -439,6 +439,8 @@ TEST(Networkd, IsEndedWithoutAWordAndKeptFromMakingTheBond)
     host.Write("/etc/systemd/network/10-bond0.netdev", "[NetDev]\nName=bond0\nKind=bond\n");
     host.Write("/etc/systemd/network/20-bond0.network", "[Network]\nAddress=192.0.2.10/24\n");
     host.Write("/etc/systemd/network/30-eth0.network", "[Network]\nBond=bond0\n");
+    constexpr char kAddressMode[] = "/proc/sys/net/ipv6/conf/eth0/addr_gen_mode";
+    host.Write(kAddressMode, "1\n");
     host.Answer("networkctl --json=short list",
                 R"({"Interfaces":[{"Name":"bond0","AdministrativeState":"configured",)"
                 R"("NetworkFile":"/etc/systemd/network/20-bond0.network"},)"
@@ -460,9 +462,12 @@ TEST(Networkd, IsEndedWithoutAWordAndKeptFromMakingTheBond)
               "[Match]\nKernelCommandLine=vornovs.release\n");
 
     hands.runs.clear();
+    host.Write(kAddressMode, "0\n");
     (void)vornovsctl::PerformRelease(host.view, {"bond0", "eth0"}, record, hands);
+    host.Write(kAddressMode, "1\n");
 
     EXPECT_THAT(hands.runs, ElementsAre("/etc/rc.network leave bond0 eth0",
+                                        "ip link set dev eth0 addrgenmode none",
                                         "systemctl kill --kill-whom=main --signal=KILL "
                                         "systemd-networkd.service",
                                         "systemctl start systemd-networkd.service"));

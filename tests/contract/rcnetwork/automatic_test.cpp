@@ -30,8 +30,9 @@ class Automatic : public Host {
 protected:
     void TearDown() override
     {
-        // Whoever tries again may be writing in the folder that is deleted next.
-        EXPECT_EQ(RcNetwork({"stop"}).exitCode, 0);
+        // Whoever tries again may be writing in the folder that is deleted next. With a switch that
+        // seems to run the stop fails, and ends the trying all the same.
+        (void)RcNetwork({"stop"});
         EXPECT_TRUE(WaitUntil([] { return Retriers() == 0; }));
         Host::TearDown();
         for (const char* service : {"vornovs-db", "vornovs-vswitch"}) {

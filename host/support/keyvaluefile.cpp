@@ -212,11 +212,12 @@ void KeyValueFile::Erase(const Line& line)
     // The file ended without a line break: what is its last line now does so too.
     const std::string_view last = std::string_view(m_text).substr(LastLine());
     const std::string keptBreak = ending.empty() || !last.ends_with("\r\n") ? "" : "\r";
-    if (Content(last).empty() && keptBreak.empty()) {
-        return; // an empty line is nothing but its line break
+    const std::string kept = std::string(Content(last)) + keptBreak;
+    if (kept.empty() || Content(kept) != Content(last)) {
+        return; // an empty line is nothing but its line break, and what ends like one needs it
     }
-    m_text.resize(LastLine() + Content(last).size());
-    m_text += keptBreak;
+    m_text.resize(LastLine());
+    m_text += kept;
 }
 
 void KeyValueFile::Append(const std::string& line)

@@ -70,8 +70,11 @@ void Run(std::string_view text)
     const KeyValueFile file = KeyValueFile::Parse(std::string(text));
     const std::vector<std::string> slaves = Listed(file);
     for (const std::string& slave : slaves) {
-        if (slave.find('/') != std::string::npos) {
-            return; // no interface is called so, and there is no such folder
+        if (slave.find_first_of("/\t\n\v\f\r") != std::string::npos) {
+            return; // no interface is called so
+        }
+        if (slave == kBond) {
+            return; // its file is the bond's, which is looked at afterwards
         }
         fuzz::WriteFile(PathOf(slave), "SLAVE=yes\nMASTER=bond0\n");
     }

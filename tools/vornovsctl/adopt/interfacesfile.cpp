@@ -121,6 +121,9 @@ private:
         words.erase(words.begin());
         if (keyword == "iface" || keyword == "template") {
             BeginStanza(path, words);
+            if (keyword == "template") {
+                m_config.stanzas.back().method.clear(); // it configures none by itself
+            }
         } else if (keyword == "mapping") {
             m_config.mapped.insert(words.begin(), words.end());
         } else if (keyword.starts_with("source")) {
@@ -217,13 +220,14 @@ std::string EachLineAside(const std::string& raw)
 std::string NamesWithout(const LogicalLine& line, const std::set<std::string>& names)
 {
     std::vector<std::string> words = vornhost::Words(line.text);
-    const std::size_t before = words.size();
-    std::erase_if(words, [&](const std::string& word) {
-        return names.contains(word.substr(0, word.find('=')));
-    });
-    if (words.size() == before) {
+    const auto removed =
+        std::remove_if(words.begin() + 1, words.end(), [&](const std::string& word) {
+            return names.contains(word.substr(0, word.find('=')));
+        });
+    if (removed == words.end()) {
         return line.raw;
     }
+    words.erase(removed, words.end());
     if (words.size() == 1) {
         return EachLineAside(line.raw);
     }
@@ -231,6 +235,8 @@ std::string NamesWithout(const LogicalLine& line, const std::set<std::string>& n
     for (const std::string& word : words) {
         rest += (rest.empty() ? "" : " ") + word;
     }
+    // At its end it would have the next line go on with this one.
+    rest += rest.ends_with('\\') ? " " : "";
     // On one line, whatever the original looks like: what is commented out has to be found again.
     std::string original = line.raw;
     const bool ends = original.ends_with('\n');

@@ -120,6 +120,27 @@ TEST(InterfacesFile, MayHoldLinesOfBlanksOfAnyKind)
     EXPECT_EQ(WithoutInterfaces("\f\n", {"eth0"}), "\f\n");
 }
 
+TEST(InterfacesFile, TakesATemplateForNoInterface)
+{
+    RecordedHost host;
+    host.Write("/etc/network/interfaces", "template eth0 inet static\n\tgateway 192.0.2.1\n"
+                                          "iface eth1 inet static inherits eth0\n");
+
+    const InterfacesConfig config = vornovsctl::ReadInterfaces(host.view);
+
+    EXPECT_FALSE(config.Has("eth0"));
+    EXPECT_TRUE(config.Has("eth1"));
+    EXPECT_THAT(config.stanzas.at(1).options, ElementsAre(Pair("gateway", "192.0.2.1")));
+}
+
+TEST(WithoutInterfaces, KnowsKeywordsFromNamesAndEndsNoLineWithABackslash)
+{
+    EXPECT_EQ(WithoutInterfaces("auto auto eth0\n", {"auto"}),
+              "#replaced# auto auto eth0\nauto eth0\n");
+    EXPECT_EQ(WithoutInterfaces("auto eth1 \\ eth0\niface eth1 inet dhcp\n", {"eth0"}),
+              "#replaced# auto eth1 \\ eth0\nauto eth1 \\ \niface eth1 inet dhcp\n");
+}
+
 TEST(WithoutInterfaces, ChangesNothingForOthers)
 {
     EXPECT_EQ(WithoutInterfaces(kText, {"eth7"}), kText);

@@ -88,6 +88,11 @@ figure "ports" "$ports" "attached and detached"
 
 step "Come home"
 rm "$hook"
+# Whoever takes a device away takes it off the switch first: a bridge stays as long as others have
+# ports on it.
+for number in $(seq "$clients"); do
+    printf ' -- --if-exists del-port vm%s' "$number"
+done | xargs ovs-vsctl --timeout=30
 {
     for number in $(seq "$ports"); do
         echo "link del tap$number"

@@ -21,7 +21,6 @@ constexpr char kPlainOnSwitch[] = "DEVICE=eth0\nONBOOT=yes\nIPADDR=192.0.2.7\n"
                                   "NETMASK=255.255.255.0\nBRIDGE=ovs_eth0\n";
 constexpr char kBridgeFile[] = "DEVICE=ovs_eth0\nONBOOT=yes\nIPADDR=192.0.2.7\n"
                                "NETMASK=255.255.255.0\nTYPE=OVS\nPRIMARY=eth0\n";
-constexpr char kGateways[] = "eth0 inet 192.0.2.1\n";
 
 /** One client of each kind that meets every trait beside several others. */
 std::vector<std::vector<Trait>> Representatives()

@@ -290,8 +290,8 @@ TEST_F(OddFiles, KeepEveryByteThatIsNotTheLibrarys)
         files[IfcfgPath("ovs_eth0")] = text;
         reliability::StartWith(files);
         EXPECT_EQ(reliability::RunClient({},
-                                         [&](reliability::Findings& findings) {
-                                             findings.Expect(AfterATag(findings) == text,
+                                         [&before = text](reliability::Findings& findings) {
+                                             findings.Expect(AfterATag(findings) == before,
                                                              "the file is not what it was");
                                          }),
                   "");

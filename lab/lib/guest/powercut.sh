@@ -14,7 +14,7 @@ cut_power_after()
         pause "$seconds"
         echo b >/proc/sysrq-trigger
     ) &
-    "$@" >/dev/null 2>&1 || true
+    "$@" >/dev/null 2>&1 || true # what it comes to is of no account without power
     # It has ended before its power.
     sleep 3600
     fail "the power stayed on"

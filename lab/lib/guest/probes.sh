@@ -46,8 +46,8 @@ probes_next_phase()
 probes_stop()
 {
     if [ -n "${lab_probe:-}" ]; then
-        kill "$lab_probe" 2>/dev/null || true
-        wait "$lab_probe" || true
+        kill "$lab_probe" 2>/dev/null || true # it may have ended by now
+        wait "$lab_probe" || true # its status is that it was ended
         lab_probe=''
     fi
 }

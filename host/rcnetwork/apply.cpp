@@ -1,6 +1,7 @@
 #include "apply.h"
 
 #include "announce.h"
+#include "announcer.h"
 #include "clientcontrol.h"
 #include "inputs.h"
 #include "readiness.h"
@@ -340,6 +341,9 @@ bool Applier::Run(const Stage& stage)
         return RunBatch(stage);
     case StageKind::kAnnounce:
         AnnounceAll(stage);
+        return true;
+    case StageKind::kAnnouncer:
+        std::for_each(stage.lines.begin(), stage.lines.end(), KeepAnnouncing);
         return true;
     case StageKind::kRouters:
         HearAll(stage);

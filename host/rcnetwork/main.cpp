@@ -1,3 +1,4 @@
+#include "announcer.h"
 #include "automatic.h"
 #include "conversion.h"
 #include "hold.h"
@@ -61,6 +62,7 @@ constexpr std::array kVerbs = {
     VerbForm{kConversionVerb, Words::kText, false},
     VerbForm{kHolderVerb, Words::kText, true},
     VerbForm{kRetryVerb, Words::kNone, true},
+    VerbForm{kAnnounceVerb, Words::kInterface, true},
     VerbForm{kAppearedVerb, Words::kInterface, true},
 };
 
@@ -151,6 +153,10 @@ bool RunWithoutLock(const CommandLine& line)
     }
     if (line.verb == kRetryVerb) {
         RetryUntilDone();
+        return true;
+    }
+    if (line.verb == kAnnounceVerb) {
+        AnnounceForAWhile(line.word);
         return true;
     }
     if (line.verb == kAppearedVerb) {

@@ -92,6 +92,7 @@ void AddStages(const Steps& steps, Plan& plan)
     AddStage(plan, StageKind::kBatch, "tidy", steps.tidy.Lines());
     AddStage(plan, StageKind::kReady, "wait for members", steps.readyAfter);
     AddStage(plan, StageKind::kBatch, "put in order", steps.order.Lines());
+    AddStage(plan, StageKind::kAnnouncer, "announce again", steps.announceAgain);
     AddStage(plan, StageKind::kSettings, "settings after", steps.settingsAfter);
     AddStage(plan, StageKind::kBatch, "finish", steps.finish.Lines());
     AddStage(plan, StageKind::kRouters, "hear routers", Once(steps.hearRouters));

@@ -66,18 +66,19 @@ struct Inputs {
 
 /** How the lines of a stage are carried out. */
 enum class StageKind {
-    kServices, ///< Start scripts; what follows is planned anew once they ran.
-    kSwitch,   ///< Commands of one transaction of the switch's database.
-    kWait,     ///< "INTERFACE MAC" that must exist before anything goes on.
-    kSettings, ///< "INTERFACE SETTING VALUE"
-    kBatch,    ///< Lines of one "ip -batch".
-    kAnnounce, ///< "INTERFACE" whose place the network outside is told.
-    kRouters,  ///< "INTERFACE METRIC GATEWAY" of a route that is the kernel's to make again.
-    kCards,    ///< "INTERFACE OPTION SETTING...", of ethtool.
-    kResolver, ///< "tell NAME server ADDRESS... domain DOMAIN..." or "forget NAME".
-    kClients,  ///< "end NAME", "drop NAME" or "start NAME of NAME,NAME: OPTION; OPTION".
-    kReady,    ///< "KIND NAME..." that is waited for as long as that makes sense.
-    kGateways  ///< "INTERFACE" whose gateway records are dropped.
+    kServices,  ///< Start scripts; what follows is planned anew once they ran.
+    kSwitch,    ///< Commands of one transaction of the switch's database.
+    kWait,      ///< "INTERFACE MAC" that must exist before anything goes on.
+    kSettings,  ///< "INTERFACE SETTING VALUE"
+    kBatch,     ///< Lines of one "ip -batch".
+    kAnnounce,  ///< "INTERFACE" whose place the network outside is told.
+    kAnnouncer, ///< "INTERFACE" whose place it is told now and for a while.
+    kRouters,   ///< "INTERFACE METRIC GATEWAY" of a route that is the kernel's to make again.
+    kCards,     ///< "INTERFACE OPTION SETTING...", of ethtool.
+    kResolver,  ///< "tell NAME server ADDRESS... domain DOMAIN..." or "forget NAME".
+    kClients,   ///< "end NAME", "drop NAME" or "start NAME of NAME,NAME: OPTION; OPTION".
+    kReady,     ///< "KIND NAME..." that is waited for as long as that makes sense.
+    kGateways   ///< "INTERFACE" whose gateway records are dropped.
 };
 
 struct Stage {

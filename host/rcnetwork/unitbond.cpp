@@ -163,11 +163,13 @@ void UnitPlanner::Gather()
     auto& last = m_unit.late ? m_steps.move.links : m_steps.tidy.links;
     const bool late = m_unit.late;
     bool joins = false;
+    bool gathered = false;
     for (const Link* member : m_unit.members) {
         if (IsMissing(*member)) {
             const bool early = !late && IsIdle(member);
             GatherMember(*member, early ? m_steps.devices.links : last);
             joins = joins || early;
+            gathered = true;
         }
     }
     const auto& sources = m_unit.sources;
@@ -180,6 +182,27 @@ void UnitPlanner::Gather()
     if (!late && m_unit.port == nullptr) {
         PutInOrder();
     }
+    if (gathered && moves) {
+        AnnounceAgain();
+    }
+}
+
+/**
+ * The bond may take another member into use when the one with the traffic joins or the others do so
+ * anew. The kernel then tells switches outside, but not when it is busy with something else at that
+ * moment; without that they would send to a member that is not in use, until the host speaks.
+ */
+void UnitPlanner::AnnounceAgain()
+{
+    for (const Link* member : m_unit.members) {
+        const std::string wait = "member " + member->name;
+        auto& ready = m_steps.readyAfter;
+        if (!IsIdle(member) && IsMissing(*member) && member->carrier &&
+            std::find(ready.begin(), ready.end(), wait) == ready.end()) {
+            ready.push_back(wait);
+        }
+    }
+    m_steps.announceAgain.push_back(Carrier());
 }
 
 /** The kernel keeps the order in which members join, and the first one has a meaning. */

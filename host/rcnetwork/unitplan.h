@@ -52,6 +52,7 @@ struct Steps {
     BatchParts tidy; ///< What no traffic waits for.
     std::vector<std::string> readyAfter;
     BatchParts order; ///< Members that join anew, because of their order.
+    std::vector<std::string> announceAgain;
     std::vector<std::string> settingsAfter;
     BatchParts finish; ///< What needs those settings.
     std::vector<std::string> resolver;
@@ -111,6 +112,7 @@ private:
     void Gather();
     void GatherMember(const Link& member, std::vector<std::string>& lines);
     void PutInOrder();
+    void AnnounceAgain();
     void AdjustBondOptions();
     void ChangeMode(const LiveBond& live, const BondOptions& options);
     void DissolveBonds();

@@ -3,9 +3,13 @@
  */
 #include "host.h"
 #include "rcnetwork/announce.h"
+#include "rcnetwork/announcer.h"
 #include "support/descriptor.h"
+#include "systemd/fakesystemd.h"
 
 #include <array>
+#include <chrono>
+#include <future>
 #include <set>
 #include <sstream>
 
@@ -22,6 +26,12 @@ namespace {
 using testing::Contains;
 using testing::IsSupersetOf;
 using testing::Not;
+
+constexpr char kArpOfEth0[] = "arp 0001"
+                              "02000000000a"
+                              "c0000205"
+                              "000000000000"
+                              "c0000205";
 
 std::string Hex(const unsigned char* data, size_t size)
 {
@@ -88,11 +98,7 @@ TEST_F(AnnounceTest, TellsTheLinkAddressOfEachAddress)
                                "00000000"
                                "02000000000a"
                                "00000000",
-                               "arp 0001"
-                               "02000000000a"
-                               "c0000205"
-                               "000000000000"
-                               "c0000205",
+                               kArpOfEth0,
                                "advertisement hops 255 20000000"
                                "20010db8000000000000000000000005"
                                "0201"
@@ -125,6 +131,32 @@ TEST_F(AnnounceTest, LeavesAddressesOutThatAreNotInUseYet)
 TEST_F(AnnounceTest, FailsForAnInterfaceThatIsNotThere)
 {
     EXPECT_FALSE(vornhost::Announce("eth7"));
+}
+
+TEST_F(AnnounceTest, GoesOnAsLongAsTheInterfaceIsThere)
+{
+    const auto begin = std::chrono::steady_clock::now();
+    auto announcer = std::async(std::launch::async, [] { return RcNetwork({"announce", "eth0"}); });
+
+    for (int time = 0; time < 2; ++time) {
+        EXPECT_TRUE(WaitUntil([&] { return Arrived().contains(kArpOfEth0); })) << time;
+    }
+    Ip("link set eth0 down name other0");
+
+    EXPECT_EQ(announcer.get(), (Outcome{0, "", ""}));
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(12));
+    Ip("link set other0 name eth0");
+}
+
+TEST_F(AnnounceTest, GoesOnInAUnitOfItsOwnWhereSystemdRuns)
+{
+    harness::FakeSystemd systemd;
+    systemd.AddUnit("vornovs-announce@.service");
+
+    vornhost::KeepAnnouncing("eth0");
+
+    EXPECT_THAT(Arrived(), Contains(kArpOfEth0));
+    EXPECT_THAT(systemd.Jobs(), testing::ElementsAre("StartUnit vornovs-announce@eth0.service"));
 }
 
 } // namespace

@@ -133,11 +133,20 @@ std::vector<std::string> KeyValueFile::Keys() const
 
 std::map<std::string, std::string> KeyValueFile::Values() const
 {
+    std::map<std::string, std::string> values = WrittenValues();
+    for (auto& [key, value] : values) {
+        value = std::string(WithoutQuotes(value));
+    }
+    return values;
+}
+
+std::map<std::string, std::string> KeyValueFile::WrittenValues() const
+{
     std::map<std::string, std::string> values;
     for (const Line& line : Lines()) {
         const std::string_view text = Content(TextOf(line));
         if (const std::string_view key = KeyOf(text); !key.empty()) {
-            values[std::string(key)] = WithoutQuotes(text.substr(text.find('=') + 1));
+            values[std::string(key)] = text.substr(text.find('=') + 1);
         }
     }
     return values;

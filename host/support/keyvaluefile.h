@@ -37,6 +37,9 @@ public:
     /** @return  every key's value, as Get() answers it. */
     std::map<std::string, std::string> Values() const;
 
+    /** @return  every key's value, as GetWritten() answers it. */
+    std::map<std::string, std::string> WrittenValues() const;
+
     /**
      * Makes a key present exactly once: its first line is replaced, where the administrator put it
      * and its comment; further ones go. A new key is appended.

@@ -96,18 +96,25 @@ bool SameSettings(const KeyValueFile& one, const KeyValueFile& other)
 bool CarryChanges(const KeyValueFile& base, const KeyValueFile& changed, const KeyFilter& filter,
                   KeyValueFile& target)
 {
+    // Looked up in the files themselves, each key would be searched for from line to line.
+    const auto before = base.WrittenValues();
+    const auto now = changed.WrittenValues();
     bool carried = false;
     const auto concerns = [&](const std::string& key) {
-        return !IsPlaceKey(key) && filter(key) && base.GetWritten(key) != changed.GetWritten(key);
+        const auto former = before.find(key);
+        const auto present = now.find(key);
+        return !IsPlaceKey(key) && filter(key) &&
+               (former == before.end() || present == now.end() ||
+                former->second != present->second);
     };
     for (const std::string& key : base.Keys()) {
-        if (concerns(key) && !changed.GetWritten(key)) {
+        if (concerns(key) && !now.contains(key)) {
             carried = target.Remove(key) || carried;
         }
     }
     for (const std::string& key : changed.Keys()) {
         if (concerns(key)) {
-            carried = target.Set(key, *changed.GetWritten(key)) || carried;
+            carried = target.Set(key, now.at(key)) || carried;
         }
     }
     return carried;

@@ -3,12 +3,15 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <chrono>
+#include <string>
+
 namespace {
 
 using testing::ElementsAre;
 using vornhost::KeyValueFile;
 
-KeyValueFile File(const char* text)
+KeyValueFile File(const std::string& text)
 {
     return KeyValueFile::Parse(text);
 }
@@ -123,6 +126,22 @@ TEST(CarryChanges, LeavesWhatTheConversionsWriteAndWhatTheFilterRefuses)
         onlyB, target));
 
     EXPECT_EQ(target.Text(), "A=0\n");
+}
+
+TEST(CarryChanges, IsDoneWithALongFileInTime)
+{
+    constexpr int kLines = 50000;
+    std::string lines;
+    for (int line = 0; line < kLines; ++line) {
+        lines += "KEY" + std::to_string(line) + "=1\n";
+    }
+    KeyValueFile target = File(lines);
+    const auto begin = std::chrono::steady_clock::now();
+
+    EXPECT_TRUE(vornhost::CarryChanges(File(lines), File(lines + "NEW=1\n"), AnyKey, target));
+
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(10));
+    EXPECT_EQ(target.Text(), lines + "NEW=1\n");
 }
 
 TEST(SameSettings, GoesByKeysAndValuesAlone)

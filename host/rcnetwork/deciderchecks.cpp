@@ -116,7 +116,10 @@ void Decider::CheckMaster()
     }
 }
 
-/** Without ONBOOT an interface is not brought up, but one that is live keeps what it carries. */
+/**
+ * Without ONBOOT an interface is not brought up, but one that is live keeps what it carries. A bond
+ * or VLAN that is not there is not made, either, to take over what its bridge carries.
+ */
 void Decider::RespectOnBoot()
 {
     if (m_unit.target == Target::kLeaveAlone || m_unit.file == nullptr || m_unit.file->onBoot ||
@@ -126,7 +129,9 @@ void Decider::RespectOnBoot()
     m_unit.addWanted = false;
     m_unit.removeUnwanted = false;
     const bool live = m_unit.port != nullptr && m_unit.port->up;
-    if (!live && m_unit.switchBridge == nullptr) {
+    const bool isMissing =
+        m_unit.port == nullptr && (m_unit.IsGroup() || m_unit.kind == UnitKind::kVlan);
+    if ((!live && m_unit.switchBridge == nullptr) || isMissing) {
         m_unit.target = Target::kLeaveAlone;
     }
 }

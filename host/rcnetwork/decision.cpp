@@ -3,6 +3,7 @@
 #include "decider.h"
 
 #include <algorithm>
+#include <iterator>
 
 namespace vornhost {
 namespace {
@@ -44,6 +45,50 @@ int Rank(const Unit& unit)
     return unit.members.empty() ? kAfterAllLinks : unit.members.front()->index;
 }
 
+/** Whether there is such an interface once the devices that the units ask for are made. */
+bool WillBeThere(const Inputs& inputs, const std::vector<Unit>& units, const std::string& name)
+{
+    return inputs.live.FindLink(name) != nullptr ||
+           std::any_of(units.begin(), units.end(), [&](const Unit& unit) {
+               const bool isMade = unit.IsGroup() || unit.kind == UnitKind::kVlan;
+               return (unit.target == Target::kSwitch && unit.bridge == name) ||
+                      (isMade && unit.addWanted && unit.name == name);
+           });
+}
+
+/**
+ * Puts VLANs that are to be made behind what they stand on. Those on nothing are left out: one
+ * device that cannot be made would keep the whole host from its network.
+ */
+void PutVlansOnTheirParents(const Inputs& inputs, const Kinship& kinship, std::vector<Unit>& units,
+                            std::vector<Remark>& remarks)
+{
+    const auto firstMade = std::stable_partition(units.begin(), units.end(), [](const Unit& unit) {
+        return unit.kind != UnitKind::kVlan || !unit.addWanted || unit.takeDown ||
+               (unit.port != nullptr && !unit.rebuilt);
+    });
+    std::vector<Unit> left;
+    std::copy(firstMade, units.end(), std::back_inserter(left));
+    units.erase(firstMade, units.end());
+    const auto hasParent = [&](const Unit& unit) {
+        return WillBeThere(inputs, units, kinship.ParentFor(*inputs.files.at(unit.name).vlan));
+    };
+    for (bool found = true; found;) {
+        const auto next = std::find_if(left.begin(), left.end(), hasParent);
+        found = next != left.end();
+        if (found) {
+            units.push_back(*next);
+            left.erase(next);
+        }
+    }
+    for (const Unit& unit : left) {
+        const bool asked = !inputs.request.names.empty() || unit.file->onBoot;
+        remarks.push_back({asked ? Severity::kError : Severity::kWarning,
+                           "there is no interface " + inputs.files.at(unit.name).vlan->parent +
+                               " for " + unit.name});
+    }
+}
+
 } // namespace
 
 std::set<std::string> Concerned(const Inputs& inputs)
@@ -73,6 +118,7 @@ std::vector<Unit> DecideUnits(const Inputs& inputs, const Kinship& kinship,
             remarks.push_back({Severity::kError, name + " was not started"});
         }
     }
+    PutVlansOnTheirParents(inputs, kinship, units, remarks);
     std::stable_sort(units.begin(), units.end(),
                      [](const Unit& one, const Unit& other) { return Rank(one) < Rank(other); });
     return units;

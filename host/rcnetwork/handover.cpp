@@ -71,6 +71,9 @@ Handover ParseHandover(const std::string& text, unsigned long second)
         for (const auto& [name, bond] : json.at("bonds").items()) {
             handover.bonds[name] = {bond.at("members").get<std::vector<std::string>>(),
                                     bond.at("mac").get<std::string>(), bond.at("lacp").get<bool>()};
+            if (handover.bonds[name].members.empty()) {
+                return {}; // nobody would carry its traffic
+            }
         }
     } catch (const std::exception&) {
         return {};

@@ -49,7 +49,15 @@ std::string Quoted(const std::string& value)
     const bool plain =
         value.find_first_not_of("abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ"
                                 "0123456789_-") == std::string::npos;
-    return plain ? value : "\"" + value + "\"";
+    if (plain) {
+        return value;
+    }
+    std::string text = "\"";
+    for (const char each : value) {
+        text += each == '"' || each == '\\' ? "\\" : "";
+        text += each;
+    }
+    return text + "\"";
 }
 
 } // namespace

@@ -1,5 +1,7 @@
 #include "sources.h"
 
+#include "support/contains.h"
+
 #include <algorithm>
 #include <iterator>
 
@@ -7,6 +9,20 @@
 
 namespace vornhost {
 namespace {
+
+constexpr char kVlanKind[] = "vlan";
+
+/** Stands for the number of an interface that has none yet; hardly any has one as high. */
+int NumberFor(const std::string& name)
+{
+    constexpr unsigned kFirst = 10000;
+    constexpr unsigned kCount = 90000;
+    unsigned number = 0;
+    for (const char letter : name) {
+        number = number * 31 + static_cast<unsigned char>(letter);
+    }
+    return static_cast<int>(kFirst + number % kCount);
+}
 
 class SourceFinder {
 public:
@@ -46,7 +62,7 @@ void SourceFinder::Absorb()
     }
     if (m_unit.tag) {
         for (const Link& link : m_inputs.live.links) {
-            if (link.kind == "vlan" && !IsTagDevice(link) && m_unit.port != nullptr &&
+            if (link.kind == kVlanKind && !IsTagDevice(link) && m_unit.port != nullptr &&
                 link.parent == m_unit.port->index && link.vlanId == static_cast<int>(*m_unit.tag) &&
                 !m_kinship.HasFile(link.name)) {
                 absorbed.push_back(link.name);
@@ -68,7 +84,7 @@ std::string SourceFinder::TagDevice() const
     if (owner == nullptr && !m_unit.members.empty()) {
         owner = m_unit.members.back();
     }
-    return TagDeviceName(owner == nullptr ? 0 : owner->index, *m_unit.tag);
+    return TagDeviceName(owner == nullptr ? NumberFor(m_unit.name) : owner->index, *m_unit.tag);
 }
 
 void SourceFinder::NameCarrier()
@@ -120,7 +136,8 @@ void SourceFinder::Look(const std::string& base)
     const bool legacy = base != m_unit.name && m_inputs.live.bonds.contains(base) &&
                         !m_kinship.HeirOf(base).empty();
     const bool replaced = m_unit.kind == UnitKind::kSwitchBond && base == m_unit.name;
-    const bool device = link != nullptr && link->kind == "vlan" && base != m_unit.name;
+    const bool device = link != nullptr && link->kind == kVlanKind && base != m_unit.name &&
+                        !Contains(m_kinship.MembersOf(m_unit.name), base);
     if (base != m_unit.bridge) {
         Add(link, legacy || (!replaced && !device));
     }
@@ -147,10 +164,14 @@ void SourceFinder::Look(const std::string& base)
     }
 }
 
-/** A VLAN's interface whose bond has gone, or has gone on to the switch. */
+/**
+ * A VLAN's interface whose bond has gone, or has gone on to the switch. What has its name and is no
+ * VLAN stays.
+ */
 bool SourceFinder::IsOnWrongParent() const
 {
-    if (m_unit.kind != UnitKind::kVlan || m_unit.port == nullptr || !m_unit.addWanted) {
+    if (m_unit.kind != UnitKind::kVlan || m_unit.port == nullptr ||
+        m_unit.port->kind != kVlanKind || !m_unit.addWanted) {
         return false;
     }
     const FileVlan& vlan = *m_kinship.UsableFile(m_unit.name)->vlan;
@@ -164,7 +185,7 @@ bool SourceFinder::CanJoinAnyTime(const Link& member) const
 {
     const auto& links = m_inputs.live.links;
     const bool carriesVlan = std::any_of(links.begin(), links.end(), [&](const Link& link) {
-        return link.kind == "vlan" && link.parent == member.index;
+        return link.kind == kVlanKind && link.parent == member.index;
     });
     return member.master == 0 && !HasAddresses(member) && !(carriesVlan && member.up);
 }
@@ -190,7 +211,7 @@ bool SourceFinder::IsLate() const
     }
     const bool replaces =
         std::any_of(m_unit.sources.begin(), m_unit.sources.end(), [&](const Source& source) {
-            const bool sameVlan = source.link->kind == "vlan" && m_unit.carrierLink == nullptr &&
+            const bool sameVlan = source.link->kind == kVlanKind && m_unit.carrierLink == nullptr &&
                                   (m_unit.tag || m_unit.kind == UnitKind::kVlan);
             return !source.stays && sameVlan;
         });

@@ -83,7 +83,8 @@ void UnitPlanner::PlanDevices()
         const FileVlan& vlan = *m_inputs.files.at(m_unit.name).vlan;
         MakeVlan(m_unit.name, m_kinship.ParentFor(vlan), vlan.id);
         m_record.made = true;
-    } else if (m_unit.tag && !ToSwitch() && m_unit.carrierLink == nullptr) {
+    }
+    if (m_unit.tag && !ToSwitch() && m_unit.carrierLink == nullptr) {
         const bool noPort = m_unit.kind == UnitKind::kSwitchBond;
         MakeVlan(m_unit.carrier, noPort ? m_unit.port->name : m_unit.name, *m_unit.tag);
     }

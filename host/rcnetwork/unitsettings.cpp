@@ -26,10 +26,13 @@ bool HasOwnWay(const std::string& setting)
 
 } // namespace
 
+/** What could not be read from the one interface is not known, and left as it is on the other. */
 void UnitPlanner::Set(std::vector<std::string>& stage, const std::string& interface,
                       const std::string& setting, const std::string& value) const
 {
-    stage.push_back(interface + " " + setting + " " + value);
+    if (!value.empty()) {
+        stage.push_back(interface + " " + setting + " " + value);
+    }
 }
 
 void UnitPlanner::PlanLinks()
@@ -192,7 +195,9 @@ void UnitPlanner::MoveIpv6Stack()
     const bool silenced = m_record.formerSettings.contains(kDisableIpv6) && source == m_unit.name;
     std::string off =
         silenced ? m_record.formerSettings.at(kDisableIpv6) : Live(source, kDisableIpv6);
-    const std::string mode = Live(source, kAddressMode);
+    const std::string former = m_unit.carrierLink == nullptr ? kNewInterface : Carrier();
+    std::string mode = Live(source, kAddressMode);
+    mode = mode.empty() ? Live(former, kAddressMode) : mode;
     if (m_unit.MainSource() == nullptr || off.empty()) {
         return;
     }
@@ -200,7 +205,6 @@ void UnitPlanner::MoveIpv6Stack()
         off = "1";
     }
     const bool madeLate = &Settings() != &m_steps.settingsBefore;
-    const std::string former = m_unit.carrierLink == nullptr ? kNewInterface : Carrier();
     if (off == "0" && Live(former, kAddressMode) != kAddressModeNone && !madeLate) {
         Set(m_steps.settingsBefore, Carrier(), kAddressMode, kAddressModeNone);
     }

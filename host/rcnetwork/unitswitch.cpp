@@ -2,6 +2,9 @@
 
 #include "portcolumns.h"
 
+#include "support/interfacevalues.h"
+#include "support/remembered.h"
+
 #include <algorithm>
 
 namespace vornhost {
@@ -49,8 +52,8 @@ std::string UnitPlanner::WantedMac() const
         return handed->second.mac;
     }
     if (m_unit.kind == UnitKind::kSwitchBond && m_unit.switchBridge != nullptr &&
-        m_unit.switchBridge->marked && !m_unit.switchBridge->hwaddr.empty()) {
-        return m_unit.switchBridge->hwaddr;
+        m_unit.switchBridge->marked && IsLinkAddress(m_unit.switchBridge->hwaddr)) {
+        return Lower(m_unit.switchBridge->hwaddr); // anybody may have set it
     }
     if (m_unit.IsGroup() && m_unit.port == nullptr) {
         return m_unit.members.empty() ? "" : m_unit.members.front()->mac;

@@ -6,7 +6,6 @@
 
 #include <algorithm>
 #include <array>
-#include <sstream>
 #include <string_view>
 
 namespace vornhost {
@@ -24,6 +23,13 @@ bool IsFileOf(const KeyValueFile& file, const std::string& interface)
     // A conversion back that was cut short has copied the bridge's file over the interface's and
     // not edited it yet; were it not the interface's, nothing could finish the way home.
     return device == kBridgePrefix + interface && file.Get("PRIMARY") == interface;
+}
+
+/** Such a text cannot be a word of a command. */
+bool HasControlCharacter(const std::string& text)
+{
+    return std::any_of(text.begin(), text.end(),
+                       [](unsigned char byte) { return byte < ' ' || byte == 0x7f; });
 }
 
 } // namespace
@@ -104,10 +110,7 @@ void InterfaceParser::ReadStructure()
     file.bridge = Value("BRIDGE");
     file.slave = Lower(Value("SLAVE")) == "yes";
     file.master = file.slave ? Value("MASTER") : "";
-    std::istringstream slaves(Value("SLAVE_LIST"));
-    for (std::string slave; slaves >> slave;) {
-        file.slaveList.push_back(slave);
-    }
+    ReadSlaves();
     ReadBondOptions();
     const std::string type = Lower(Value("TYPE"));
     const std::string bonding = Lower(Value("BONDING_MASTER"));
@@ -123,16 +126,28 @@ void InterfaceParser::ReadStructure()
     ReadVlan();
 }
 
+void InterfaceParser::ReadSlaves()
+{
+    for (const std::string& slave : Words(Value("SLAVE_LIST"))) {
+        if (IsInterfaceName(slave)) {
+            m_parsed.file.slaveList.push_back(slave);
+        } else {
+            Refuse("SLAVE_LIST", "\"" + slave + "\" is no interface name");
+        }
+    }
+}
+
+/** An option without a value is left at what it is. */
 void InterfaceParser::ReadBondOptions()
 {
-    std::istringstream options(Value("BONDING_OPTS"));
-    for (std::string option; options >> option;) {
+    for (const std::string& option : Words(Value("BONDING_OPTS"))) {
         const auto equals = option.find('=');
-        if (equals == std::string::npos || equals == 0) {
+        if (equals == std::string::npos || equals == 0 || HasControlCharacter(option)) {
             Refuse("BONDING_OPTS", "\"" + option + "\" is not NAME=VALUE");
-            continue;
+        } else if (equals + 1 < option.size()) {
+            m_parsed.file.bondOptions.emplace_back(option.substr(0, equals),
+                                                   option.substr(equals + 1));
         }
-        m_parsed.file.bondOptions.emplace_back(option.substr(0, equals), option.substr(equals + 1));
     }
 }
 
@@ -149,7 +164,9 @@ void InterfaceParser::ReadVlan()
         id = id.empty() ? file.name.substr(dot + 1) : id;
     }
     const auto number = ToNumber(id, 0, kMostVlan);
-    if (!parent.empty() && number && file.name.rfind(kBridgePrefix, 0) != 0) {
+    if (!parent.empty() && !IsInterfaceName(parent)) {
+        Refuse("PHYSDEV", "no interface name");
+    } else if (!parent.empty() && number && file.name.rfind(kBridgePrefix, 0) != 0) {
         file.vlan = FileVlan{parent, *number};
     }
 }

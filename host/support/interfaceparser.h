@@ -39,6 +39,7 @@ private:
     // interfacefile.cpp: what kind of file it is
     bool IsOwnFile();
     void ReadStructure();
+    void ReadSlaves();
     void ReadBondOptions();
     void ReadVlan();
     std::string ProtocolProblem() const;

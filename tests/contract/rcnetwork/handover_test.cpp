@@ -33,6 +33,13 @@ TEST(Handover, ThatCannotBeReadIsNone)
     }
 }
 
+TEST(Handover, OfABondWithoutMembersIsNone)
+{
+    const Handover handover{{}, {{"bond0", {{}, "02:00:00:00:00:01", false}}}};
+
+    EXPECT_TRUE(ParseHandover(HandoverText(handover, 100), 100).Empty());
+}
+
 TEST(Handover, LetsTheFirstMemberSpeakAndSilencesTheOthers)
 {
     ASSERT_NE(kHandover.FirstOf("eth0"), nullptr);

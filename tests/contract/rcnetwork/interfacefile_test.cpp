@@ -244,6 +244,16 @@ TEST(ParseInterfaceFile, ReadsABondAndItsMember)
     EXPECT_FALSE(member.file.bond);
 }
 
+TEST(ParseInterfaceFile, PassesOverABondOptionWithoutAValue)
+{
+    const auto parsed = ParseInterfaceFile(
+        "bond0", "DEVICE=bond0\nBONDING_OPTS=\"mode=active-backup primary= miimon=100\"\n");
+
+    EXPECT_THAT(Texts(parsed), IsEmpty());
+    EXPECT_THAT(parsed.file.bondOptions,
+                ElementsAre(std::pair("mode", "active-backup"), std::pair("miimon", "100")));
+}
+
 TEST(ParseInterfaceFile, ReadsABondOfTheSwitchOfAnyName)
 {
     for (const char* name : {"ovs_bond0", "uplink"}) {
@@ -357,6 +367,12 @@ INSTANTIATE_TEST_SUITE_P(
                 "ROUTE0=default veja 192.0.2.1: \"veja\" is not supported"},
         Refused{"LinkCommands", "ETHTOOL_OPTS=\"-f eth0 firmware\"\n",
                 "ETHTOOL_OPTS=-f eth0 firmware: not settings of a link"},
+        Refused{"BondOption", "BONDING_OPTS=\"mode=1 miimon=1\x1b\"\n",
+                "BONDING_OPTS=mode=1 miimon=1\x1b: \"miimon=1\x1b\" is not NAME=VALUE"},
+        Refused{"VlanParent", "PHYSDEV=\"eth1 up\"\nVLAN_ID=5\n",
+                "PHYSDEV=eth1 up: no interface name"},
+        Refused{"Slave", "SLAVE_LIST=\"eth1 --x\"\n",
+                "SLAVE_LIST=eth1 --x: \"--x\" is no interface name"},
         Refused{"LinkAddress", "MACADDR=02:00:00:00:00:01\n",
                 "MACADDR=02:00:00:00:00:01: changing the link address is not supported yet"}),
     [](const testing::TestParamInfo<Refused>& row) { return row.param.description; });

@@ -58,6 +58,15 @@ TEST(PortColumns, TakeTheFilesValueBeforeTheRememberedOne)
               "\"bond_mode,bond_updelay,lacp,other_config:lacp-time\"");
 }
 
+TEST(PortColumns, QuoteWhatTheToolWouldTakeForTheEndOfAValue)
+{
+    const PortColumns columns(FileWith("bond_mode=balance-slb other_config:a=b\"c\\d"), nullptr);
+
+    EXPECT_EQ(columns.Changes(nullptr, true),
+              " bond_mode=balance-slb other_config:a=\"b\\\"c\\\\d\""
+              " external_ids:vornovs-options=\"bond_mode,other_config:a\"");
+}
+
 TEST(PortColumns, ChangeNothingWhenItIsSo)
 {
     SwitchPort live = LivePort();

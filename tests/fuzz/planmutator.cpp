@@ -37,10 +37,28 @@ constexpr std::array kLines{"TYPE=OVS",
                             "GATEWAY=192.0.2.1",
                             "MTU=9000",
                             "OVS_VLAN_ID=5",
+                            "OVS_VLAN_ID=4094",
+                            "PHYSDEV=eth0",
+                            "VLAN_ID=5",
                             "ROUTE0=\"198.51.100.0/24 via 192.0.2.9\"",
                             "ETHTOOL_OPTS=\"-K eth0 tso off\"",
                             "IPV6_AUTOCONF=yes",
                             "DNS1=192.0.2.53"};
+/** What a link, an address, a route, a port of the switch or a record may have, and seldom has. */
+constexpr std::array kParts{R"({"valid": 60, "preferred": 0})",
+                            R"({"flags": 512})",
+                            R"({"peer": "192.0.2.9"})",
+                            R"({"metric": 100})",
+                            R"({"kind": "vlan", "vlan": 5, "parent": 2})",
+                            R"({"kind": "bond"})",
+                            R"({"kind": "bridge"})",
+                            R"({"master": 4})",
+                            R"({"up": false})",
+                            R"({"type": 7})",
+                            R"({"ours": false})",
+                            R"({"tag": 5})",
+                            R"({"made": true})",
+                            R"({"client": true})"};
 constexpr std::array kNames{"eth0", "eth1", "eth2", "bond0", "ovs_eth0", "ovs_bond0", "eth0.5"};
 
 class Mutation {
@@ -95,6 +113,8 @@ private:
             node.erase(at);
         } else if (node.is_array()) {
             node.push_back(*at);
+        } else if (Below(2) == 0) {
+            node.update(Json::parse(kParts[Below(kParts.size())]));
         } else {
             node[kNames[Below(kNames.size())]] = *at;
         }

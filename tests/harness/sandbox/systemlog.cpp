@@ -52,6 +52,9 @@ SystemLog::SystemLog() : m_socket(::socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0
     }
     ::closelog(); // the C library may hold a connection to an earlier one
     m_server = std::thread([this] { Serve(); });
+    // A thread that begins takes memory; who is forked meanwhile would find the allocator locked,
+    // for not every sanitizer's looks after that.
+    (void)Lines();
 }
 
 SystemLog::~SystemLog()

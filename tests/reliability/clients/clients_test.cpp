@@ -53,11 +53,7 @@ TEST(Client, IsServedWhateverItDoesWithItselfOrToldThatItCannotBe)
     const std::string withoutDescriptor = DescriptorTraits().back().name;
     int served = 0;
     int refused = 0;
-    size_t number = 0;
     for (const auto& traits : Combinations()) {
-        if (!reliability::IsTried(number++)) {
-            continue;
-        }
         const bool canBe = traits.back().name != withoutDescriptor;
         EXPECT_EQ(RunClient(traits, canBe ? reliability::ExpectServed : reliability::ExpectRefused),
                   "")

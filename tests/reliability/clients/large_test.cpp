@@ -1,6 +1,4 @@
-// A client as large as the machine lets it be. What a sanitizer keeps of each page would be more
-// than the client itself.
-#ifndef __SANITIZE_ADDRESS__
+// A client as large as the machine lets it be.
 #include "host/client.h"
 #include "host/host.h"
 #include "support/figures.h"
@@ -78,4 +76,3 @@ TEST(LargeClient, IsServedInTime)
 }
 
 } // namespace
-#endif

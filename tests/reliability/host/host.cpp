@@ -5,7 +5,9 @@
 #include <cstdlib>
 #include <filesystem>
 #include <sstream>
+#include <stdexcept>
 
+#include <sys/mount.h>
 #include <sys/wait.h>
 #include <unistd.h>
 #include <vornplatform/core.h>
@@ -34,6 +36,15 @@ void InstallService(const std::string& name, const std::string& body)
               0755);
 }
 
+#ifdef PLAIN_VORNRUN
+void InstallPlainHelper()
+{
+    if (::mount(PLAIN_VORNRUN, VORNRUN, nullptr, MS_BIND, nullptr) != 0) {
+        throw std::runtime_error("the plain helper cannot be put in its place");
+    }
+}
+#endif
+
 /** Reads a number and the line break after it. */
 size_t TakeNumber(const std::string& text, size_t& at)
 {
@@ -58,6 +69,9 @@ void InstallPrograms()
     InstallService("vornovs-vswitch", "exit 0");
     InstallService("failing", "exit 7");
     WriteFile(kCalls, "");
+#ifdef PLAIN_VORNRUN
+    InstallPlainHelper();
+#endif
 }
 
 void MakeInterfaces(const std::vector<std::string>& names)

@@ -26,19 +26,6 @@ constexpr char kProgramEnvironment[] = "PATH=/usr/sbin:/usr/bin:/sbin:/bin\n"
                                        "OVS_CTL_TIMEOUT=10\n"
                                        "VORNOVS_HOLD=1\n";
 
-/**
- * Whether to try what has that number. With a sanitizer in every program each costs ten times as
- * much, and one in seven is tried.
- */
-constexpr bool IsTried(size_t number)
-{
-#ifdef __SANITIZE_ADDRESS__
-    return number % 7 == 0;
-#else
-    return number < SIZE_MAX;
-#endif
-}
-
 /** Puts the programs there, and services that count as running. Once in a process is enough. */
 void InstallPrograms();
 

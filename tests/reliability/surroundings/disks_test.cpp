@@ -104,15 +104,11 @@ bool RunOn(const char* folder, const Trouble& trouble, const Operation& operatio
 
 TEST_F(Disks, ThatTakeNothingMoreLoseAndTearNothing)
 {
-    size_t number = 0;
     int tried = 0;
     int undone = 0;
     for (const char* const folder : kFolders) {
         for (const Trouble& trouble : kTroubles) {
             for (const Operation& operation : reliability::Operations()) {
-                if (!reliability::IsTried(number++)) {
-                    continue;
-                }
                 SCOPED_TRACE(operation.name + ", " + folder + " is a disk with " + trouble.name);
                 undone += RunOn(folder, trouble, operation) ? 0 : 1;
                 ++tried;
@@ -136,14 +132,10 @@ void LimitFiles(rlim_t size, bool ended)
 TEST_F(Disks, ThatAClientMayNotWriteToLoseAndTearNothing)
 {
     const std::string wasEnded = "the client died with status " + std::to_string(SIGXFSZ) + "\n";
-    size_t number = 0;
     int tried = 0;
     for (const bool ended : {false, true}) {
         for (const rlim_t size : {0UL, 5UL, 40UL, 80UL}) {
             for (const Operation& operation : reliability::Operations()) {
-                if (!reliability::IsTried(number++)) {
-                    continue;
-                }
                 SCOPED_TRACE(operation.name + " with files of " + std::to_string(size) +
                              (ended ? " bytes or the client ends" : " bytes"));
                 reliability::StartWith(operation.start);

@@ -4,7 +4,8 @@
 //
 // INTERVAL is in milliseconds. NAMESPACE is "here" or a name of ip-netns. Once every target has
 // been answered the file OUTPUT.ready is made and the counting begins. SIGUSR1 begins the next
-// phase. SIGTERM ends: a line a target is written to OUTPUT, separated by tabs:
+// phase. SIGUSR2 makes the interval five times as long, for the time in which little is expected.
+// SIGTERM ends: a line a target is written to OUTPUT, separated by tabs:
 //
 //   LABEL TARGET[@SOURCE] GAP AT ANSWERED SENT PHASE-GAP [ANSWERED SENT PHASE-GAP]...
 //
@@ -40,8 +41,10 @@ namespace {
 constexpr std::size_t kSequences = 65536;
 constexpr std::size_t kPhases = 32;
 constexpr double kLateAnswers = 0.2; // seconds that the last probes are given
+constexpr double kRelaxed = 5;       // times the interval
 
 volatile std::sig_atomic_t g_phase = 0;
+volatile std::sig_atomic_t g_relax = 0;
 volatile std::sig_atomic_t g_end = 0;
 
 [[noreturn]] void Die(const std::string& what)
@@ -70,6 +73,7 @@ struct Target {
     socklen_t length = 0;
     int socket = -1;
     double lastAnswer = 0;
+    double interval = 0; // from it to the next request
     double gap = 0;
     double gapBegan = 0;
     std::array<unsigned, kPhases> sent{};
@@ -192,9 +196,9 @@ void Send(Target& target, std::size_t number, std::uint16_t sequence)
     }
 }
 
-void NoteGap(Target& target, double until, double interval)
+void NoteGap(Target& target, double until)
 {
-    const double gap = until - target.lastAnswer - interval;
+    const double gap = until - target.lastAnswer - target.interval;
     if (gap > target.gap) {
         target.gap = gap;
         target.gapBegan = target.lastAnswer;
@@ -225,8 +229,9 @@ void Receive(int socket, std::vector<Target>& targets, double interval)
         }
         Target& target = targets[number];
         const double now = Now();
-        NoteGap(target, now, interval);
+        NoteGap(target, now);
         target.lastAnswer = now;
+        target.interval = interval;
         target.lastPhase = static_cast<std::size_t>(g_phase);
         ++target.answered[target.phaseOf[sequence]];
     }
@@ -327,20 +332,23 @@ int main(int argc, char** argv)
         }
     }
     std::signal(SIGUSR1, [](int) { g_phase = std::min<int>(g_phase + 1, kPhases - 1); });
+    std::signal(SIGUSR2, [](int) { g_relax = 1; });
     std::signal(SIGTERM, [](int) { g_end = 1; });
     BeRealTime();
 
     double began = Now();
     double next = began;
+    double present = interval;
     bool counting = false;
     std::uint16_t sequence = 0;
     while (g_end == 0) {
+        present = g_relax == 0 ? interval : interval * kRelaxed;
         for (std::size_t number = 0; number < targets.size(); ++number) {
             Send(targets[number], number, sequence);
         }
         ++sequence;
-        next += interval;
-        Listen(sockets, targets, next, interval);
+        next += present;
+        Listen(sockets, targets, next, present);
         if (!counting && AllAnswered(targets)) {
             counting = true;
             Restart(targets);
@@ -350,9 +358,9 @@ int main(int argc, char** argv)
     }
 
     const double end = Now();
-    Listen(sockets, targets, end + kLateAnswers, interval);
+    Listen(sockets, targets, end + kLateAnswers, present);
     for (Target& target : targets) {
-        NoteGap(target, end, interval);
+        NoteGap(target, end);
     }
     Report(output, targets, began);
     return 0;

@@ -1,4 +1,6 @@
-# shellcheck shell=bash disable=SC2154 # variables of the guest's other files
+# shellcheck shell=bash disable=SC2154,SC2034 # variables of the guest's other files
+
+lab_probe_interval=5
 
 fails_with()
 {
@@ -38,6 +40,21 @@ for direction in in out; do
     figure "60 ms dark $direction" "$outage" ms
     expect_at_most "60 ms, seen $direction" 60 "$outage"
     expect_at_most "60 ms, seen $direction" "$outage" 80
+done
+
+step "Make it dark for 200 ms while it is probed less often"
+probes_start
+probes_relax
+pause 0.1
+darken add
+pause 0.2
+darken del
+sleep 1
+probes_stop
+for direction in in out; do
+    outage="$(probes_outage "$direction")"
+    expect_at_most "200 ms, seen $direction" 175 "$outage"
+    expect_at_most "200 ms, seen $direction" "$outage" 250
 done
 
 step "Make it dark for good"

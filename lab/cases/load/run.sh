@@ -24,7 +24,7 @@ expect_explained()
     for number in $(seq "$clients"); do
         failed="$(awk '{ print $(NF - 1) }' "$lab_out/load-$number")"
         # Counting no line is a failure to grep.
-        lines="$(system_log | grep -c " load-$number: .*cpp:" || true)"
+        lines="$(system_log | grep -c " load-$number: .*cpp:" || [ $? -eq 1 ])"
         [ "$lines" -ge "$failed" ] ||
             fail "client $number failed $failed times and the system log has $lines lines of it"
     done

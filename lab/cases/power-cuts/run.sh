@@ -6,7 +6,7 @@ lab_members_in_any_order=yes
 phase_start()
 {
     local count
-    count="$(points 2 40)"
+    count="$(points 10 40)"
     topology_ready
     remember_plain
     points_spread "$count"
@@ -23,6 +23,7 @@ go_on()
         step "Power cut $point_seconds s after the beginning of $point_verb"
         cut_power_after "$point_seconds" cut vornovsctl "$point_verb" alpha
     fi
+    points_leave
     figure "reachable after the boot" "$(cat "$worst")" "hundredths of a second at most"
 }
 
@@ -33,6 +34,6 @@ phase_cut()
     if [ "$reachable_after" -gt "$(cat "$worst")" ]; then
         echo "$reachable_after" >"$worst"
     fi
-    expect_way_home cut
+    expect_repaired
     go_on
 }

@@ -341,7 +341,7 @@ expect_lock_free()
 # True when no program runs for a client: neither the client nor what it started.
 client_is_gone()
 {
-    no_process_named vornovsctl && no_process_named vornrun && no_process_named vornnetdtool
+    no_process_named vornovsctl vornrun vornnetdtool
 }
 
 # Brings a host home as its manual says, whatever state a killed client left.
@@ -362,13 +362,19 @@ bring_home()
     expect_success vornovsctl unregister home
 }
 
-# The same for a host whose client was killed: one command takes it to a whole state, with which a
-# second one has nothing to do, and who is registered then can leave.
+# For a host whose client was killed: one command takes it to a whole state, with which a second one
+# has nothing to do.
+repair_host()
+{
+    expect_success vornovsctl repair
+    expect_equal "what a second repair says" "Everything fits together." "$(vornovsctl repair 2>&1)"
+}
+
+# The same, and who is registered then can leave.
 mend()
 {
     local name
-    expect_success vornovsctl repair
-    expect_equal "what a second repair says" "Everything fits together." "$(vornovsctl repair 2>&1)"
+    repair_host
     if [ -s "$lab_state/ovs_reg.conf" ]; then
         while read -r name; do
             expect_success vornovsctl unregister "$name"

@@ -114,16 +114,22 @@ killed_with_all_after()
     "$@" >"$lab_out/client-output" 2>&1 &
     client=$!
     pause "$seconds"
-    for pid in "$client" $(processes_named vornrun) $(processes_named rc.network); do
+    for pid in "$client" $(processes_named vornrun rc.network); do
         if ! works_in_background "$pid"; then
             kill -KILL "$pid" 2>/dev/null || true # it may have ended by now
         fi
     done
-    { wait "$client" || true; } 2>/dev/null # the shell tells of the kill
+    { wait "$client" || true; } 2>/dev/null # its status is that it was killed, which the shell tells
 }
 
-# True for a process of the network program that waits for the end of a conversion.
+# True for a process of the network program that goes on by itself.
 works_in_background()
 {
-    tr '\0' ' ' <"/proc/$1/cmdline" 2>/dev/null | grep -Eq '^[^ ]*rc\.network (holder|retry) '
+    network_program_does "$1" 'announce|holder|retry'
+}
+
+# network_program_does PID VERBS: true for one that was started with one of these verbs, "ONE|OTHER".
+network_program_does()
+{
+    tr '\0' ' ' <"/proc/$1/cmdline" 2>/dev/null | grep -Eq "^[^ ]*rc\.network ($2) "
 }

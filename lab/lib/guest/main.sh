@@ -114,6 +114,8 @@ lab_send_results()
     # What the host looked like in the end tells why a case waited in vain.
     { ip -details address show; ip route show table all; ip -6 route show table all; } \
         >"$lab_out/network" 2>/dev/null
+    # And what switches and neighbours outside believed.
+    { in_outside bridge fdb show; in_outside ip neigh show; } >"$lab_out/outside" 2>/dev/null
     cp -r /var/log/openvswitch "$lab_out/openvswitch-log" 2>/dev/null
     # Set on the open line: a line that somebody closed may have forgotten how it was set.
     {

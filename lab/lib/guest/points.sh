@@ -4,7 +4,8 @@
 lab_points="$lab_out/points"
 
 # points_spread COUNT: learns how long both take, and writes the points to $lab_points, a line each:
-# VERB SECONDS-AFTER-ITS-BEGINNING. The host is plain before and afterwards.
+# VERB SECONDS-AFTER-ITS-BEGINNING; of both verbs in turn, since one begins where the other leads to.
+# The host is plain before and afterwards.
 points_spread()
 {
     local verb
@@ -14,10 +15,10 @@ points_spread()
         mv "$lab_steps" "$lab_out/learned-$verb"
     done
     expect_plain learned
-    {
-        points_over "$lab_out/learned-register" register $((($1 + 1) / 2))
-        points_over "$lab_out/learned-unregister" unregister $(($1 / 2))
-    } | sort -k 2 -n >"$lab_points"
+    paste -d '\n' \
+        <(points_over "$lab_out/learned-register" register $((($1 + 1) / 2))) \
+        <(points_over "$lab_out/learned-unregister" unregister $(($1 / 2))) |
+        sed '/^$/d' >"$lab_points"
 }
 
 # points_over STEPS VERB COUNT: prints points between the first step and the end. In a pause nothing
@@ -55,11 +56,22 @@ points_next()
     sed -i 1d "$lab_points"
 }
 
-# Brings a plain host to where the verb of the point begins.
+# Brings a whole host to where the verb of the point begins: on the switch or off it.
 points_prepare()
 {
-    if [ "$point_verb" = unregister ]; then
+    if [ "$point_verb" = register ]; then
+        points_leave
+    elif [ -z "$(registered_clients)" ]; then
         expect_success vornovsctl register alpha
+    fi
+}
+
+# Takes a whole host off the switch, and it is in everything what it was.
+points_leave()
+{
+    if [ -n "$(registered_clients)" ]; then
+        expect_success vornovsctl unregister alpha
+        expect_plain
     fi
 }
 
@@ -77,13 +89,19 @@ expect_reachable()
     reachable_after=$((ticks - began))
 }
 
-# Takes the host from where an interrupted client left it to plain networking as it was.
-expect_way_home()
+# A repair takes the host from where an interrupted client left it to a whole state: on the switch
+# with all it had, or off it and in everything what it was.
+expect_repaired()
 {
     vornovsctl check 2>&1 | show || true # its status is the class of what it found
-    mend >"$lab_out/way-home" 2>&1 || fail "no way home: $(tail -n 3 "$lab_out/way-home")"
-    expect_registered
-    expect_plain "$1"
+    repair_host >"$lab_out/repair" 2>&1 || fail "not repaired: $(tail -n 3 "$lab_out/repair")"
+    if [ -n "$(registered_clients)" ]; then
+        expect_registered alpha
+        expect_on_switch
+    else
+        expect_plain
+    fi
+    expect_reachable 5
     expect_whole_files
     expect_lock_free
 }

@@ -39,7 +39,7 @@ servers_asked()
 }
 
 # Who has what now, one a line, without until when: MAC ADDRESS NAME CLIENT-ID, and of IPv6
-# IAID ADDRESS NAME DUID.
+# IAID ADDRESS NAME DUID. Before the first one there is no list, which is as good as an empty one.
 servers_leases()
 {
     { grep -E '^[0-9]+ [^ ]+ [0-9a-f.:]+ ' "$lab_leases" 2>/dev/null || true; } |

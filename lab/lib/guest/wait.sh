@@ -19,7 +19,8 @@ guest_ticks()
 }
 
 # wait_until SECONDS COMMAND...: tries a command every 20 ms until it succeeds, every 200 ms once a
-# second has passed; fails the case when it has not within the given seconds.
+# second has passed and once a second after five; fails the case when it has not within the given
+# seconds. Waiting costs nothing here, looking does.
 wait_until()
 {
     local seconds="$1" ticks began deadline
@@ -34,8 +35,10 @@ wait_until()
         fi
         if [ "$((ticks - began))" -lt 100 ]; then
             pause 0.02
-        else
+        elif [ "$((ticks - began))" -lt 500 ]; then
             pause 0.2
+        else
+            pause 1
         fi
     done
 }
@@ -63,17 +66,17 @@ process_ended()
     ! process_runs "$1"
 }
 
-# Pids of the processes with this program name, one a line: the kernel's name for it, which is cut to
-# 15 bytes, or the one that it was called by.
+# Pids of the processes with one of these program names, one a line: the kernel's name for it, which
+# is cut to 15 bytes, or the one that it was called by.
 processes_named()
 {
-    local folder name called
+    local folder name called wanted=" $* "
     for folder in /proc/[0-9]*; do
         { read -r name <"$folder/comm"; } 2>/dev/null || continue
         called=''
         # Fails for a process that has ended by now and for a kernel thread, which has no such line.
         { read -r -d '' called <"$folder/cmdline"; } 2>/dev/null || true
-        if [ "$name" = "$1" ] || [ "${called##*/}" = "$1" ]; then
+        if [[ $wanted == *" $name "* || $wanted == *" ${called##*/} "* ]]; then
             echo "${folder#/proc/}"
         fi
     done
@@ -81,12 +84,12 @@ processes_named()
 
 process_named()
 {
-    [ -n "$(processes_named "$1")" ]
+    [ -n "$(processes_named "$@")" ]
 }
 
 no_process_named()
 {
-    [ -z "$(processes_named "$1")" ]
+    [ -z "$(processes_named "$@")" ]
 }
 
 file_has()

@@ -52,7 +52,7 @@ lab_case_deadline()
     if [[ -f $file ]]; then
         cat "$file"
     else
-        echo 600
+        echo 1200
     fi
 }
 

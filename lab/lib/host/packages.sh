@@ -41,15 +41,24 @@ lab_wanted_packages()
         grep -v '^linux-image-cloud-amd64=' | LC_ALL=C sort -u
 }
 
-# Unpacks every package into $lab_debian; does nothing when what is there is what apt offers.
+# Unpacks every package into $lab_debian; does nothing when what is there is what apt offers. Tests of
+# the platform want them as well, and may run beside the lab: one of them does it.
 lab_fetch_packages()
 {
-    local stamp=$lab_debian/.packages wanted archive
+    local stamp=$lab_debian/.packages turn
+    mkdir -p "$lab_build"
+    exec {turn}>"$lab_build/.fetching"
+    flock "$turn"
     # apt offers the same as long as its lists are the same, and asking takes seconds.
-    if [[ $stamp -nt /var/lib/apt/lists && $stamp -nt ${BASH_SOURCE[0]} ]]; then
-        return
+    if [[ ! $stamp -nt /var/lib/apt/lists || ! $stamp -nt ${BASH_SOURCE[0]} ]]; then
+        lab_unpack_packages "$(lab_wanted_packages)"
     fi
-    wanted=$(lab_wanted_packages)
+    exec {turn}>&-
+}
+
+lab_unpack_packages()
+{
+    local stamp=$lab_debian/.packages wanted=$1 archive
     if [[ -f $stamp && $(<"$stamp") == "$wanted" ]]; then
         touch "$stamp"
         return

@@ -26,18 +26,26 @@ ensure_package_lists()
     fi
 }
 
-# Installs those of the named packages that are missing.
+# Installs those of the named packages that are missing. Commands that run side by side wait for each
+# other: apt would fail.
 ensure_host_packages()
 {
-    local package missing=()
+    local package missing=() turn
+    exec {turn}<"${BASH_SOURCE[0]}"
+    flock "$turn"
     for package in "$@"; do
         package_installed "$package" || missing+=("$package")
     done
-    if [[ ${#missing[@]} -eq 0 ]]; then
-        return
+    if [[ ${#missing[@]} -gt 0 ]]; then
+        install_host_packages "${missing[@]}"
     fi
-    say_note "installing ${missing[*]}"
+    exec {turn}<&-
+}
+
+install_host_packages()
+{
+    say_note "installing $*"
     as_root apt-get update -q >&2
     as_root env DEBIAN_FRONTEND=noninteractive \
-        apt-get install -y -q --no-install-recommends "${missing[@]}" >&2
+        apt-get install -y -q --no-install-recommends "$@" >&2
 }

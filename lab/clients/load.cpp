@@ -3,8 +3,9 @@
 //   load client NAME PORT SECONDS SEED
 //       does what comes to its mind: registers and withdraws itself, attaches and detaches its
 //       port, asks who is registered
-//   load ports BRIDGE PREFIX COUNT
-//       attaches PREFIX1 to PREFIXn, and detaches them once it has read a line
+//   load attach BRIDGE PREFIX COUNT
+//   load detach BRIDGE PREFIX COUNT
+//       attaches PREFIX1 to PREFIXn, or detaches them, one after the other
 //
 // A client remembers what it did, and fails when its registration is lost or a name turns up that
 // is nobody's. In the end it says whether it is registered, how many calls it made and how many of
@@ -107,22 +108,14 @@ private:
     int m_failed = 0;
 };
 
-void ChangePorts(const std::string& bridge, const std::string& prefix, int count)
+void ChangePorts(bool attach, const std::string& bridge, const std::string& prefix, int count)
 {
-    for (const bool attach : {true, false}) {
-        for (int number = 1; number <= count; ++number) {
-            const std::string port = prefix + std::to_string(number);
-            const int result =
-                attach ? VORN::OVS::AttachPort(bridge, port) : VORN::OVS::DetachPort(bridge, port);
-            if (result != 1) {
-                Die(port + ": " + std::to_string(result));
-            }
-        }
-        std::printf("%s\n", attach ? "attached" : "detached");
-        std::fflush(stdout);
-        // Whoever started this looks at the switch and lets it go on.
-        if (attach && std::getchar() == EOF) {
-            Die("nobody looks");
+    for (int number = 1; number <= count; ++number) {
+        const std::string port = prefix + std::to_string(number);
+        const int result =
+            attach ? VORN::OVS::AttachPort(bridge, port) : VORN::OVS::DetachPort(bridge, port);
+        if (result != 1) {
+            Die(port + ": " + std::to_string(result));
         }
     }
 }
@@ -137,12 +130,13 @@ int main(int count, char** arguments)
         client.Run(std::chrono::seconds(std::atoi(arguments[4])));
         return 0;
     }
-    if (what == "ports" && count == 5) {
-        ChangePorts(arguments[2], arguments[3], std::atoi(arguments[4]));
+    if ((what == "attach" || what == "detach") && count == 5) {
+        ChangePorts(what == "attach", arguments[2], arguments[3], std::atoi(arguments[4]));
         return 0;
     }
     std::fputs("Usage: load client NAME PORT SECONDS SEED\n"
-               "       load ports BRIDGE PREFIX COUNT\n",
+               "       load attach BRIDGE PREFIX COUNT\n"
+               "       load detach BRIDGE PREFIX COUNT\n",
                stderr);
     return 2;
 }

@@ -1,7 +1,6 @@
 # shellcheck shell=bash disable=SC2154,SC2034 # variables of the guest's other files
 
 clients=16
-ports="$(sampled 50 1000)"
 hook=/usr/vorn/etc/hooks/net/ovs_change/50-witness
 
 # Each client has a name of its own in the system log, which is the program's.
@@ -66,26 +65,6 @@ figure "clients" "$clients" "at once"
 figure "their calls" "$(cat "$lab_out"/load-* | awk '{ n += $3 } END { print n }')" times
 figure "conversions" "$(grep -c '^4 ' "$lab_out/witness")" "one at a time"
 
-step "$ports ports"
-expect_success vornovsctl register home
-for number in $(seq "$ports"); do
-    echo "link add tap$number type dummy"
-done | ip -batch -
-mkfifo "$lab_out/go"
-/lab/clients/load ports ovs_eth0 tap "$ports" <"$lab_out/go" >"$lab_out/ports" 2>&1 &
-changing=$!
-exec {go}>"$lab_out/go"
-while process_runs "$changing" && ! grep -q attached "$lab_out/ports"; do
-    pause 0.5
-done
-expect_equal "the ports that are attached" "$ports" \
-    "$(ovs-vsctl --timeout=30 list-ports ovs_eth0 | grep -c '^tap')"
-echo >&"$go"
-expect_success wait "$changing"
-expect_equal "the ports that are left" "" \
-    "$(ovs-vsctl --timeout=30 list-ports ovs_eth0 | sed -n '/^tap/p')"
-figure "ports" "$ports" "attached and detached"
-
 step "Come home"
 rm "$hook"
 # Whoever takes a device away takes it off the switch first: a bridge stays as long as others have
@@ -93,14 +72,9 @@ rm "$hook"
 for number in $(seq "$clients"); do
     printf ' -- --if-exists del-port vm%s' "$number"
 done | xargs ovs-vsctl --timeout=30
-{
-    for number in $(seq "$ports"); do
-        echo "link del tap$number"
-    done
-    for number in $(seq "$clients"); do
-        echo "link del vm$number"
-    done
-} | ip -batch -
+for number in $(seq "$clients"); do
+    echo "link del vm$number"
+done | ip -batch -
 while read -r name; do
     expect_success vornovsctl unregister "$name"
 done < <(cat "$lab_state/ovs_reg.conf")

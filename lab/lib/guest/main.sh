@@ -8,6 +8,8 @@
 . /lab/wait.sh
 # shellcheck source=topology.sh
 . /lab/topology.sh
+# shellcheck source=userspace.sh
+. /lab/userspace.sh
 # shellcheck source=servers.sh
 . /lab/servers.sh
 # shellcheck source=manager.sh
@@ -35,14 +37,17 @@
 # shellcheck source=powercut.sh
 . /lab/powercut.sh
 
-# lab_main case|here: what the guest is for. The small machine's outside world is made here; the
-# other's is there since before its first program.
+# lab_main case|here: what the guest is for. The outside world is made here, but that of the machine
+# with systemd, which is there since before its first program.
 lab_main()
 {
     mkdir -p "$lab_out"
     if ! machine_has_systemd; then
         topology_build
         servers_start
+    fi
+    if machine_shares_kernel; then
+        userspace_bridges &
     fi
     if [ -e /lab/case/run.sh ]; then
         lab_run_case
@@ -57,7 +62,7 @@ lab_main()
             "$(topology_ports)"
         cd /root || exit 1
         lab_shell
-        printf 'lab-left\n' >/dev/ttyS1
+        machine_shares_kernel || printf 'lab-left\n' >/dev/ttyS1
     else
         lab_send_results
     fi
@@ -69,7 +74,7 @@ lab_main()
 
 lab_shell()
 {
-    if machine_has_systemd; then
+    if machine_has_systemd || machine_shares_kernel; then
         bash -i
     else
         setsid cttyhack bash
@@ -119,7 +124,7 @@ lab_send_results()
     cp -r /var/log/openvswitch "$lab_out/openvswitch-log" 2>/dev/null
     # Set on the open line: a line that somebody closed may have forgotten how it was set.
     {
-        stty raw -echo <&1
+        machine_shares_kernel || stty raw -echo <&1
         tar -C "$lab_out" -cf - . 2>/dev/null | cat
     } >/dev/ttyS2
 }

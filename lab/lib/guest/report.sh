@@ -7,6 +7,12 @@ machine_has_systemd()
     [ -d /lab/machine ]
 }
 
+# True in namespaces of another machine's kernel, whose clock goes on while programs wait.
+machine_shares_kernel()
+{
+    [ -d /lab/namespaces ]
+}
+
 # True where a disk keeps what a case left before a reboot.
 machine_has_disk()
 {

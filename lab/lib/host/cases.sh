@@ -1,7 +1,7 @@
 # shellcheck shell=bash disable=SC2154,SC2034 # variables that the lab's files share
 # Running cases: each in a guest of its own.
 
-# The machine that a case is for: small or systemd.
+# The machine that a case is for: small, systemd or namespaces.
 lab_case_machine()
 {
     local file=$lab_source/cases/$1/machine
@@ -24,18 +24,19 @@ lab_case_disk()
     fi
 }
 
-# lab_case_names MACHINE DAILY: the cases for a machine (empty: all). With DAILY "daily" a case for
-# the machine with systemd must have a file `daily`, and one for the small one no file `seldom`. Long
+# lab_case_names DAILY MACHINE...: the cases for these machines (none: all). With DAILY "daily" a
+# case for the machine with systemd must have a file `daily`, and another one no file `seldom`. Long
 # cases, which have a deadline of their own, come first: the short ones fill the gaps.
 lab_case_names()
 {
-    local machine=$1 daily=$2 folder name its
+    local daily=$1 folder name its
+    shift
     for folder in "$lab_source"/cases/*/; do
         name=$(basename "$folder")
         its=$(lab_case_machine "$name")
-        if [[ (-z $machine || $its == "$machine") &&
+        if [[ ($# -eq 0 || " $* " == *" $its "*) &&
             (-z $daily || ($its == systemd && -e $folder/daily) ||
-            ($its == small && ! -e $folder/seldom)) ]]; then
+            ($its != systemd && ! -e $folder/seldom)) ]]; then
             printf '%d %s\n' "$([[ -e $folder/deadline ]] && echo 0 || echo 1)" "$name"
         fi
     done | sort | cut -d ' ' -f 2
@@ -70,12 +71,16 @@ lab_run_case()
     mkdir -p "$results"
 
     began=$(date +%s)
-    lab_run_guest "$name" "$machine" "$(<"$lab_source/cases/$name/topology")" || status=$?
+    if [[ $machine == namespaces ]]; then
+        lab_run_namespaces "$name" || status=$?
+    else
+        lab_run_guest "$name" "$machine" "$(<"$lab_source/cases/$name/topology")" || status=$?
+    fi
     echo $(($(date +%s) - began)) >"$results/seconds"
 
     # A guest that hung sends no results; the verdict is read from its report all the same.
     tar -C "$results" -xf "$results/results.tar" 2>/dev/null || true
-    rm -f "$results"/{results.tar,guest.cpio,disk}
+    rm -rf "$results"/{results.tar,guest.cpio,disk,tree,tree.root}
     verdict=$(lab_report_verdict "$results/report")
     if [[ -z $verdict ]]; then
         verdict="failed: $(lab_why_no_verdict "$status" "$name")"
@@ -103,6 +108,16 @@ lab_run_guest()
         (lab_start_guest "$((left > 0 ? left : 1))" "$machine" "$topology" "$results/guest.cpio" \
             "$results/disk" "$lab_words" "${lines[@]}") </dev/null >>"$results/qemu" 2>&1 || return
     done
+}
+
+# Runs a case in namespaces.
+lab_run_namespaces()
+{
+    local name=$1 results=$lab_results/$1
+    lab_make_namespaces_tree "$results/tree" "$(<"$lab_source/cases/$name/topology")" \
+        "$lab_source/cases/$name"
+    (lab_start_namespaces "$(lab_case_deadline "$name")" "$results/tree" "$lab_words" \
+        "$results/results.tar") </dev/null >>"$results/report" 2>&1
 }
 
 # lab_reboots REPORT: how often the case has asked for a reboot.

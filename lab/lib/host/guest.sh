@@ -87,6 +87,11 @@ lab_stay()
     folder=$(mktemp -d "$lab_build/shell.XXXXXX")
     # shellcheck disable=SC2064 # the folder's name as it is now
     trap "rm -rf '$folder'" EXIT
+    if [[ $1 == namespaces ]]; then
+        lab_make_namespaces_tree "$folder/tree" "$2" "$3"
+        (lab_start_namespaces 0 "$folder/tree" lab.here "$folder/results.tar") || true
+        return
+    fi
     lab_make_guest_image "$folder/image" "$1" "$2" "$3" "$4"
     if [[ -n $5 ]]; then
         lab_make_guest_disk "$folder/disk" "$5"

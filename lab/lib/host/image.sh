@@ -273,12 +273,11 @@ lab_product_files()
     find "$lab_release" -name cmake_install.cmake
 }
 
-# Writes the archive that a guest starts from: $1 archive, $2 machine, $3 topology, $4 case folder
-# or empty, $5 network manager, empty for the case's.
-lab_make_guest_image()
+# Fills a folder with what is a guest's own: $1 folder, $2 machine, $3 topology, $4 case folder or
+# empty, $5 network manager, empty for the case's.
+lab_fill_guest()
 {
-    local archive=$1 machine=$2 topology=$3 case_folder=$4 manager=$5 root base=$lab_image
-    root=$(mktemp -d "$lab_build/guest.XXXXXX")
+    local root=$1 machine=$2 topology=$3 case_folder=$4 manager=$5
     mkdir -p "$root/lab/topology" "$root/lab/case"
     cp "$lab_source"/lib/guest/* "$root/lab/"
     cp -r "$(lab_topology_folder "$topology")/." "$root/lab/topology/"
@@ -288,9 +287,22 @@ lab_make_guest_image()
     if [[ -n $manager ]]; then
         echo "$manager" >"$root/lab/case/manager"
     fi
+    # What kind of machine it is, it sees by these.
+    case $machine in
+        systemd) cp -r "$lab_source/lib/machine" "$root/lab/" ;;
+        namespaces) cp -r "$lab_source/lib/namespaces" "$root/lab/" ;;
+    esac
+}
+
+# Writes the archive that a guest starts from: $1 archive, and as above.
+lab_make_guest_image()
+{
+    local archive=$1 machine=$2 root base=$lab_image
+    shift
+    root=$(mktemp -d "$lab_build/guest.XXXXXX")
+    lab_fill_guest "$root" "$@"
     if [[ $machine == systemd ]]; then
         base=$lab_loader
-        cp -r "$lab_source/lib/machine" "$root/lab/"
         cp -r "$lab_layers/product/lab/clients" "$root/lab/"
         mkdir -p "$root/lab/packages/vornovs"
         cp "$lab_packages_folder"/{*.deb,Packages} "$root/lab/packages/vornovs/"

@@ -12,5 +12,7 @@ lab_library=$(dirname "${BASH_SOURCE[0]}")
 . "$lab_library/disk.sh"
 # shellcheck source=lab/lib/host/guest.sh
 . "$lab_library/guest.sh"
+# shellcheck source=lab/lib/host/namespaces.sh
+. "$lab_library/namespaces.sh"
 # shellcheck source=lab/lib/host/cases.sh
 . "$lab_library/cases.sh"

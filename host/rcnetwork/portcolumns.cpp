@@ -1,7 +1,10 @@
 #include "portcolumns.h"
 
+#include "support/interfacevalues.h"
+
 #include <algorithm>
 #include <array>
+#include <limits>
 #include <sstream>
 #include <string_view>
 #include <utility>
@@ -13,6 +16,8 @@ constexpr char kOther[] = "other_config:";
 constexpr char kOtherToo[] = "other-config:";
 constexpr std::array<std::string_view, 3> kModes{"active-backup", "balance-slb", "balance-tcp"};
 constexpr std::array<std::string_view, 3> kLacp{"active", "passive", "off"};
+constexpr std::array<std::string_view, 2> kDelays{"bond_updelay", "bond_downdelay"};
+constexpr std::array<std::string_view, 2> kTruths{"true", "false"};
 
 bool StartsWith(const std::string& text, const char* beginning)
 {
@@ -43,12 +48,28 @@ bool IsOneOf(const std::array<std::string_view, N>& words, const std::string& wo
     return std::find(words.begin(), words.end(), word) != words.end();
 }
 
+/** @return  why the switch would not take the option; empty when it does. */
+std::string Refusal(const std::string& name, const std::string& value)
+{
+    constexpr unsigned kMost = std::numeric_limits<int>::max();
+    const std::string option = name + "=" + value;
+    if (IsOneOf(kDelays, name)) {
+        return ToNumber(value, 0, kMost) ? "" : option + " is no number of milliseconds";
+    }
+    if (name == "bond_fake_iface") {
+        return IsOneOf(kTruths, value) ? "" : option + " is neither true nor false";
+    }
+    const bool known = name == "bond_mode" || name == "lacp" ||
+                       (StartsWith(name, kOther) && name.size() > sizeof kOther - 1);
+    return known ? "" : "the switch's bonds have no option \"" + name + "\"";
+}
+
 /** Quoted whole, so that the tool takes it for one value. */
 std::string Quoted(const std::string& value)
 {
-    const bool plain =
-        value.find_first_not_of("abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ"
-                                "0123456789_-") == std::string::npos;
+    const bool plain = !value.empty() && value.find_first_not_of(
+                                             "abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ"
+                                             "0123456789_-") == std::string::npos;
     if (plain) {
         return value;
     }
@@ -60,6 +81,12 @@ std::string Quoted(const std::string& value)
     return text + "\"";
 }
 
+/** A column as the tool wants it. */
+std::string Written(const std::string& name)
+{
+    return StartsWith(name, kOther) ? kOther + Quoted(name.substr(sizeof kOther - 1)) : name;
+}
+
 } // namespace
 
 PortColumns::PortColumns(const InterfaceFile& file, const FormerBond* former)
@@ -67,14 +94,26 @@ PortColumns::PortColumns(const InterfaceFile& file, const FormerBond* former)
     m_hasOptions = !file.bondOptions.empty();
     if (former != nullptr) {
         m_values = former->columns;
+        std::erase_if(m_values, [](const auto& column) {
+            return !Refusal(column.first, column.second).empty();
+        });
     }
     for (const auto& [name, value] : file.bondOptions) {
         const bool other = StartsWith(name, kOtherToo);
-        m_values[other ? kOther + name.substr(sizeof kOtherToo - 1) : name] = value;
+        Take(other ? kOther + name.substr(sizeof kOtherToo - 1) : name, value);
     }
     // The kernel's bond carries traffic to a partner that does not speak the protocol, too.
     if (SpeaksLacp()) {
         m_values.try_emplace(std::string(kOther) + "lacp-fallback-ab", "true");
+    }
+}
+
+void PortColumns::Take(const std::string& name, const std::string& value)
+{
+    if (std::string refusal = Refusal(name, value); !refusal.empty()) {
+        m_refusals.push_back(std::move(refusal));
+    } else {
+        m_values[name] = value;
     }
 }
 
@@ -122,7 +161,7 @@ std::string PortColumns::Changes(const SwitchPort* live, bool wanted) const
     std::string changes;
     for (const auto& [name, value] : m_values) {
         if (live == nullptr || LiveValue(*live, name) != value) {
-            changes += " " + name + "=" + Quoted(value);
+            changes += " " + Written(name) + "=" + Quoted(value);
         }
     }
     const bool same = live != nullptr && live->externalIds.contains(kOptionsKey) &&
@@ -148,7 +187,7 @@ std::vector<std::string> PortColumns::Removals(const std::string& port, const Sw
         std::string removal = StartsWith(name, kOther) ? "remove Port " : "clear Port ";
         removal += port;
         removal += StartsWith(name, kOther) ? " other_config " : " ";
-        removal += StartsWith(name, kOther) ? name.substr(sizeof kOther - 1) : name;
+        removal += StartsWith(name, kOther) ? Quoted(name.substr(sizeof kOther - 1)) : name;
         removals.push_back(std::move(removal));
     }
     return removals;

@@ -22,6 +22,12 @@ public:
     /** @return  why the switch could not run the bond with these options; empty when it can. */
     std::string Objection() const;
 
+    /**
+     * One thing that the switch does not know would keep it from all that it is told with it.
+     * @return  what is wrong with each option that is therefore left out
+     */
+    const std::vector<std::string>& Refusals() const { return m_refusals; }
+
     /** @return  " COLUMN=VALUE..." of what differs, with what is remembered; or nothing. */
     std::string Changes(const SwitchPort* live, bool wanted) const;
 
@@ -34,8 +40,10 @@ public:
 private:
     std::string Get(const std::string& name) const;
     std::string Keys() const;
+    void Take(const std::string& name, const std::string& value);
 
     SwitchValues m_values; ///< By column, or "other_config:KEY".
+    std::vector<std::string> m_refusals;
     bool m_hasOptions = false;
 };
 

@@ -88,6 +88,9 @@ bool SetSwitchBond(const std::string& bridge)
     if (const std::string objection = columns.Objection(); !objection.empty()) {
         return Refuse("ifcfg-" + bridge + ": " + objection + "; the bond is left as it is");
     }
+    for (const std::string& refusal : columns.Refusals()) {
+        Say({Severity::kWarning, std::string("ifcfg-").append(bridge).append(": ") + refusal});
+    }
     Stage stage{StageKind::kSwitch, "set bond", {}};
     if (const std::string changes = columns.Changes(&port, true); !changes.empty()) {
         stage.lines.push_back("set Port " + port.name + changes);

@@ -62,6 +62,8 @@ struct Steps {
     std::map<std::string, InterfaceRecord> records; ///< What is made once they are done.
 };
 
+class PortColumns;
+
 /** Plans one unit. */
 class UnitPlanner {
 public:
@@ -92,6 +94,7 @@ private:
     void LeaveBridge(const SwitchBridge& bridge, const Unit& owner);
     void JoinPort();
     void JoinBond();
+    void RemarkOn(const PortColumns& columns);
     void AdjustMembers(const SwitchPort& live, const std::vector<std::string>& members);
     void ForgetGateways(const std::string& bridge);
     const FormerBond* Remembered() const;

@@ -174,6 +174,7 @@ void UnitPlanner::JoinBond()
     const SwitchPort* live =
         m_unit.switchBridge == nullptr ? nullptr : m_unit.switchBridge->FindPort(port);
     const PortColumns columns(*m_unit.file, Remembered());
+    RemarkOn(columns);
     if (live == nullptr) {
         m_steps.join.push_back(
             members.size() > 1
@@ -201,6 +202,19 @@ void UnitPlanner::JoinBond()
     }
     if (columns.SpeaksLacp() && (live == nullptr || !live->negotiated) && WireHasCarrier()) {
         m_steps.negotiate.push_back("switch " + m_unit.bridge + " " + port);
+    }
+}
+
+void UnitPlanner::RemarkOn(const PortColumns& columns)
+{
+    const std::string file = "ifcfg-" + m_unit.file->name + ": ";
+    for (const std::string& refusal : columns.Refusals()) {
+        m_remarks.push_back({Severity::kWarning, file + refusal});
+    }
+    // The library takes all options out of a file before it takes the bond apart.
+    if (const std::string objection = columns.Objection();
+        !objection.empty() && !m_unit.file->bondOptions.empty()) {
+        m_remarks.push_back({Severity::kWarning, file + objection + "; the bond keeps its own"});
     }
 }
 

@@ -67,6 +67,39 @@ TEST(PortColumns, QuoteWhatTheToolWouldTakeForTheEndOfAValue)
               " external_ids:vornovs-options=\"bond_mode,other_config:a\"");
 }
 
+TEST(PortColumns, QuoteAKeyThatTheToolWouldTakeForTheEndOfOne)
+{
+    SwitchPort live = LivePort();
+    live.otherConfig["x:y"] = "1";
+    live.externalIds["vornovs-options"] = "bond_mode,other_config:x:y";
+    const PortColumns columns(FileWith("bond_mode=balance-slb other_config:a[b]=c"), nullptr);
+
+    EXPECT_EQ(columns.Changes(nullptr, true),
+              " bond_mode=balance-slb other_config:\"a[b]\"=c"
+              " external_ids:vornovs-options=\"bond_mode,other_config:a[b]\"");
+    EXPECT_THAT(columns.Removals("bond0", &live, true),
+                ElementsAre("remove Port bond0 other_config \"x:y\""));
+}
+
+TEST(PortColumns, LeaveOutWhatTheSwitchWouldNotTake)
+{
+    const PortColumns columns(
+        FileWith("bond_mode=balance-slb bond_updelay=soon bond_downdelay=200 miimon=100"
+                 " bond_fake_iface=yes other_config:=1 bond_updelay=-1"),
+        nullptr);
+
+    EXPECT_EQ(columns.Objection(), "");
+    EXPECT_THAT(columns.Refusals(),
+                ElementsAre("bond_updelay=soon is no number of milliseconds",
+                            "the switch's bonds have no option \"miimon\"",
+                            "bond_fake_iface=yes is neither true nor false",
+                            "the switch's bonds have no option \"other_config:\"",
+                            "bond_updelay=-1 is no number of milliseconds"));
+    EXPECT_EQ(columns.Changes(nullptr, true),
+              " bond_downdelay=200 bond_mode=balance-slb"
+              " external_ids:vornovs-options=\"bond_downdelay,bond_mode\"");
+}
+
 TEST(PortColumns, ChangeNothingWhenItIsSo)
 {
     SwitchPort live = LivePort();

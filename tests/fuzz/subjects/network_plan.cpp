@@ -13,6 +13,7 @@
 
 #include <algorithm>
 #include <array>
+#include <climits>
 #include <set>
 
 #include <linux/if_addr.h>
@@ -119,6 +120,25 @@ void CheckBatch(const std::string& line)
     Expect(vornhost::Contains(kObjects, words[0]), "a command is about something else: " + line);
 }
 
+/** What the switch does not know in a port's row would keep it from all that it is told with it. */
+void CheckPortColumn(const std::string& word, const std::string& line)
+{
+    constexpr std::array<std::string_view, 2> kMaps{"other_config:", "external_ids:"};
+    constexpr std::array<std::string_view, 3> kTexts{"bond_mode", "lacp", "bond_fake_iface"};
+    constexpr std::array<std::string_view, 3> kNumbers{"bond_updelay", "bond_downdelay", "tag"};
+    const auto equals = word.rfind('=');
+    const std::string column = word.substr(0, equals);
+    const bool isMap = std::any_of(kMaps.begin(), kMaps.end(), [&](std::string_view map) {
+        return column.starts_with(map) && column.size() > map.size();
+    });
+    const bool isNumber = vornhost::Contains(kNumbers, column);
+    Expect(equals != std::string::npos && (isMap || isNumber || vornhost::Contains(kTexts, column)),
+           "a port has no such column: " + line);
+    Expect(!isNumber ||
+               vornhost::ToNumber(word.substr(equals + 1), 0, column == "tag" ? 4095 : INT_MAX),
+           "a column is no such number: " + line);
+}
+
 /** Lines of "ovs-vsctl", of which each is one command, or of a bond the three that make it. */
 void CheckSwitch(const std::string& line, const Names& names)
 {
@@ -137,6 +157,9 @@ void CheckSwitch(const std::string& line, const Names& names)
            "the switch has no such command: " + line);
     const bool onRow = words[0] == "set" || words[0] == "clear" || words[0] == "remove";
     Expect(!onRow || words.size() > 3, "a row is given nothing: " + line);
+    for (std::size_t at = 3; words[0] == "set" && words[1] == "Port" && at < words.size(); ++at) {
+        CheckPortColumn(words[at], line);
+    }
     ExpectKnown(names, words[onRow ? 2 : 1], line);
     Expect(std::find(words.begin(), words.end(), "--") == words.end(),
            "one command is two: " + line);

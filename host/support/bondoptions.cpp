@@ -1,11 +1,15 @@
 #include "bondoptions.h"
 
+#include "interfacevalues.h"
+
 #include <algorithm>
 #include <array>
 #include <charconv>
 #include <fstream>
 #include <iterator>
+#include <limits>
 #include <sstream>
+#include <sys/socket.h>
 
 namespace vornhost {
 namespace {
@@ -13,19 +17,31 @@ namespace {
 constexpr char kMode[] = "mode";
 constexpr char kArpTargets[] = "arp_ip_target";
 
+/** What an option takes: one of names, which count from 0, a number, addresses, or any text. */
+struct Values {
+    std::string_view names;
+    std::uint32_t most = 0; ///< The highest number.
+    int family = AF_UNSPEC; ///< Of addresses with commas between them.
+};
+
 /** What decides how an option is read and where it counts. */
 struct Option {
     std::string_view name;
     std::string_view initial; ///< What a new bond has.
-    std::string_view named;   ///< Names of the values 0, 1...; or none.
-    std::string_view modes;   ///< Where it counts; none: everywhere.
-    bool twin = false;        ///< The switch has the like.
-    bool refused = false;     ///< The kernel refuses it where it does not count.
+    Values takes;
+    std::string_view modes; ///< Where it counts; none: everywhere.
+    bool twin = false;      ///< The switch has the like.
+    bool refused = false;   ///< The kernel refuses it where it does not count.
 };
 
-constexpr std::string_view kModeNames =
-    "balance-rr active-backup balance-xor broadcast 802.3ad balance-tlb balance-alb";
-constexpr std::string_view kNumbers{};
+constexpr Values kModeNames{
+    "balance-rr active-backup balance-xor broadcast 802.3ad balance-tlb balance-alb"};
+constexpr Values kText{};
+constexpr Values kByte{"", std::numeric_limits<std::uint8_t>::max()};
+constexpr Values kShort{"", std::numeric_limits<std::uint16_t>::max()};
+constexpr Values kNumber{"", std::numeric_limits<std::uint32_t>::max()};
+constexpr Values kAddresses{"", 0, AF_INET};
+constexpr Values kIpv6Addresses{"", 0, AF_INET6};
 constexpr std::string_view kAllModes{};
 constexpr std::string_view kWithPrimary = "active-backup balance-tlb balance-alb";
 constexpr std::string_view kWithLacp = "802.3ad";
@@ -33,46 +49,45 @@ constexpr std::string_view kWithHash = "balance-xor 802.3ad balance-tlb";
 constexpr std::string_view kWithArp = "balance-rr active-backup balance-xor broadcast";
 constexpr std::string_view kLearning = "balance-tlb balance-alb";
 constexpr std::string_view kRoundRobin = "balance-rr";
-constexpr std::string_view kNoYes = "off on";
-constexpr std::string_view kMacPolicies = "none active follow";
-constexpr std::string_view kValidations =
-    "none active backup all filter filter_active filter_backup";
-constexpr std::string_view kAnyAll = "any all";
-constexpr std::string_view kSelections = "stable bandwidth count";
-constexpr std::string_view kRates = "slow fast";
-constexpr std::string_view kReselections = "always better failure";
-constexpr std::string_view kHashes = "layer2 layer3+4 layer2+3 encap2+3 encap3+4 vlan+srcmac";
+constexpr Values kNoYes{"off on"};
+constexpr Values kMacPolicies{"none active follow"};
+constexpr Values kValidations{"none active backup all filter filter_active filter_backup"};
+constexpr Values kAnyAll{"any all"};
+constexpr Values kSelections{"stable bandwidth count"};
+constexpr Values kRates{"slow fast"};
+constexpr Values kReselections{"always better failure"};
+constexpr Values kHashes{"layer2 layer3+4 layer2+3 encap2+3 encap3+4 vlan+srcmac"};
 
 constexpr std::array kOptions{
     Option{"mode", "balance-rr", kModeNames, kAllModes, true},
-    Option{"ad_actor_sys_prio", "65535", kNumbers, kWithLacp, true, true},
-    Option{"ad_actor_system", "00:00:00:00:00:00", kNumbers, kWithLacp, true, true},
+    Option{"ad_actor_sys_prio", "65535", kShort, kWithLacp, true, true},
+    Option{"ad_actor_system", "00:00:00:00:00:00", kText, kWithLacp, true, true},
     Option{"ad_select", "stable", kSelections, kWithLacp},
-    Option{"ad_user_port_key", "0", kNumbers, kWithLacp, false, true},
-    Option{"all_slaves_active", "0", kNumbers, kAllModes},
+    Option{"ad_user_port_key", "0", kShort, kWithLacp, false, true},
+    Option{"all_slaves_active", "0", kByte, kAllModes},
     Option{"arp_all_targets", "any", kAnyAll, kWithArp},
-    Option{"arp_interval", "0", kNumbers, kWithArp, false, true},
-    Option{"arp_ip_target", "", kNumbers, kWithArp},
-    Option{"arp_missed_max", "2", kNumbers, kWithArp},
+    Option{"arp_interval", "0", kNumber, kWithArp, false, true},
+    Option{"arp_ip_target", "", kAddresses, kWithArp},
+    Option{"arp_missed_max", "2", kByte, kWithArp},
     Option{"arp_validate", "none", kValidations, kWithArp, false, true},
-    Option{"downdelay", "0", kNumbers, kAllModes, true},
+    Option{"downdelay", "0", kNumber, kAllModes, true},
     Option{"fail_over_mac", "none", kMacPolicies, kAllModes},
     Option{"lacp_active", "on", kNoYes, kWithLacp, false, true},
     Option{"lacp_rate", "slow", kRates, kWithLacp, true, true},
-    Option{"lp_interval", "1", kNumbers, kAllModes},
-    Option{"miimon", "0", kNumbers, kAllModes, true},
-    Option{"min_links", "0", kNumbers, kAllModes},
-    Option{"ns_ip6_target", "", kNumbers, kWithArp},
-    Option{"num_grat_arp", "1", kNumbers, kAllModes},
-    Option{"num_unsol_na", "1", kNumbers, kAllModes},
-    Option{"packets_per_slave", "1", kNumbers, kRoundRobin, false, true},
-    Option{"peer_notif_delay", "0", kNumbers, kAllModes},
-    Option{"primary", "", kNumbers, kWithPrimary, true, true},
+    Option{"lp_interval", "1", kNumber, kAllModes},
+    Option{"miimon", "0", kNumber, kAllModes, true},
+    Option{"min_links", "0", kNumber, kAllModes},
+    Option{"ns_ip6_target", "", kIpv6Addresses, kWithArp},
+    Option{"num_grat_arp", "1", kByte, kAllModes},
+    Option{"num_unsol_na", "1", kByte, kAllModes},
+    Option{"packets_per_slave", "1", kNumber, kRoundRobin, false, true},
+    Option{"peer_notif_delay", "0", kNumber, kAllModes},
+    Option{"primary", "", kText, kWithPrimary, true, true},
     Option{"primary_reselect", "always", kReselections, kWithPrimary},
-    Option{"resend_igmp", "1", kNumbers, kAllModes},
-    Option{"tlb_dynamic_lb", "1", kNumbers, kLearning, false, true},
-    Option{"updelay", "0", kNumbers, kAllModes, true},
-    Option{"use_carrier", "1", kNumbers, kAllModes, true},
+    Option{"resend_igmp", "1", kNumber, kAllModes},
+    Option{"tlb_dynamic_lb", "1", kByte, kLearning, false, true},
+    Option{"updelay", "0", kNumber, kAllModes, true},
+    Option{"use_carrier", "1", kByte, kAllModes, true},
     Option{"xmit_hash_policy", "layer2", kHashes, kWithHash},
 };
 
@@ -98,15 +113,9 @@ std::string Assignment(std::string name, const std::string& value)
     return name.append(value);
 }
 
-std::vector<std::string> Words(std::string_view text)
-{
-    std::istringstream stream{std::string(text)};
-    return {std::istream_iterator<std::string>(stream), std::istream_iterator<std::string>()};
-}
-
 bool CountsIn(const Option& option, const std::string& mode)
 {
-    const auto modes = Words(option.modes);
+    const auto modes = Words(std::string(option.modes));
     return modes.empty() || std::find(modes.begin(), modes.end(), mode) != modes.end();
 }
 
@@ -114,12 +123,22 @@ bool CountsIn(const Option& option, const std::string& mode)
 std::string NamedValue(const std::string& option, const std::string& value)
 {
     const Option* const known = FindOption(option);
-    const auto names = Words(known == nullptr ? "" : known->named);
+    const auto names = Words(known == nullptr ? "" : std::string(known->takes.names));
     std::size_t number = 0;
     const char* const end = value.data() + value.size();
     const auto [stop, error] = std::from_chars(value.data(), end, number);
     const bool isNumber = error == std::errc() && stop == end;
     return isNumber && number < names.size() ? names[number] : value;
+}
+
+bool AreAddresses(int family, const std::string& list)
+{
+    std::istringstream stream(list);
+    bool all = !list.empty();
+    for (std::string address; std::getline(stream, address, ',');) {
+        all = all && !NormalAddress(family, address).empty();
+    }
+    return all;
 }
 
 /** Without the sign by which the kernel is told to add an address to its list. */
@@ -146,7 +165,7 @@ std::string LiveFolder(const std::string& bond)
 std::string LiveValue(const Option& option, const std::string& line)
 {
     const auto words = Words(line);
-    if (words.empty() || !option.named.empty()) {
+    if (words.empty() || !option.takes.names.empty()) {
         return words.empty() ? "" : words[0];
     }
     std::string list;
@@ -164,10 +183,33 @@ bool IsInitial(const std::string& name, const std::string& value)
 
 } // namespace
 
+std::string BondOptionProblem(const std::string& name, const std::string& value)
+{
+    const Option* const option = FindOption(name);
+    if (option == nullptr) {
+        return {};
+    }
+    const Values& takes = option->takes;
+    const auto names = Words(std::string(takes.names));
+    const bool isName =
+        std::find(names.begin(), names.end(), NamedValue(name, value)) != names.end();
+    if (!names.empty() && !isName) {
+        return "is none of " + Joined(names, ", ");
+    }
+    if (takes.most != 0 && !ToNumber(value, 0, takes.most)) {
+        return "is not a number from 0 to " + std::to_string(takes.most);
+    }
+    if (takes.family != AF_UNSPEC && !AreAddresses(takes.family, WithoutSigns(value))) {
+        return std::string("is no list of IPv") + (takes.family == AF_INET ? "4" : "6") +
+               " addresses";
+    }
+    return {};
+}
+
 BondOptions BondOptions::Parse(std::string_view text)
 {
     BondOptions options;
-    for (const std::string& word : Words(text)) {
+    for (const std::string& word : Words(std::string(text))) {
         const auto equals = word.find('=');
         if (equals == 0 || equals == std::string::npos) {
             continue;

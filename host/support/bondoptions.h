@@ -60,6 +60,12 @@ struct BondOptions {
 };
 
 /**
+ * @return  what is wrong with the value, which the kernel's tools would not even read; empty when
+ *          nothing is or when the option is not known here.
+ */
+std::string BondOptionProblem(const std::string& name, const std::string& value);
+
+/**
  * The interfaces that are in a live bond, in the order in which they came.
  * @return  nothing when the kernel has no bond of that name or does not list all of them.
  */

@@ -1,5 +1,6 @@
 #include "interfacefile.h"
 
+#include "bondoptions.h"
 #include "interfacename.h"
 #include "interfaceparser.h"
 #include "interfacevalues.h"
@@ -144,9 +145,15 @@ void InterfaceParser::ReadBondOptions()
         const auto equals = option.find('=');
         if (equals == std::string::npos || equals == 0 || HasControlCharacter(option)) {
             Refuse("BONDING_OPTS", "\"" + option + "\" is not NAME=VALUE");
-        } else if (equals + 1 < option.size()) {
-            m_parsed.file.bondOptions.emplace_back(option.substr(0, equals),
-                                                   option.substr(equals + 1));
+            continue;
+        }
+        const std::string name = option.substr(0, equals);
+        const std::string value = option.substr(equals + 1);
+        const std::string problem = value.empty() ? "" : BondOptionProblem(name, value);
+        if (!problem.empty()) {
+            Refuse("BONDING_OPTS", std::string("\"").append(option).append("\" ") + problem);
+        } else if (!value.empty()) {
+            m_parsed.file.bondOptions.emplace_back(name, value);
         }
     }
 }

@@ -254,6 +254,20 @@ TEST(ParseInterfaceFile, PassesOverABondOptionWithoutAValue)
                 ElementsAre(std::pair("mode", "active-backup"), std::pair("miimon", "100")));
 }
 
+TEST(ParseInterfaceFile, LeavesOutABondOptionThatNoToolWouldRead)
+{
+    const auto parsed = ParseInterfaceFile(
+        "bond0", "DEVICE=bond0\nBONDING_OPTS=\"mode=1 miimon=soon new_option=x updelay=100\"\n");
+
+    EXPECT_THAT(Texts(parsed),
+                ElementsAre("error: ifcfg-bond0: "
+                            "BONDING_OPTS=mode=1 miimon=soon new_option=x updelay=100: "
+                            "\"miimon=soon\" is not a number from 0 to 4294967295"));
+    EXPECT_THAT(parsed.file.bondOptions,
+                ElementsAre(std::pair("mode", "1"), std::pair("new_option", "x"),
+                            std::pair("updelay", "100")));
+}
+
 TEST(ParseInterfaceFile, ReadsABondOfTheSwitchOfAnyName)
 {
     for (const char* name : {"ovs_bond0", "uplink"}) {
@@ -369,6 +383,9 @@ INSTANTIATE_TEST_SUITE_P(
                 "ETHTOOL_OPTS=-f eth0 firmware: not settings of a link"},
         Refused{"BondOption", "BONDING_OPTS=\"mode=1 miimon=1\x1b\"\n",
                 "BONDING_OPTS=mode=1 miimon=1\x1b: \"miimon=1\x1b\" is not NAME=VALUE"},
+        Refused{"BondMode", "BONDING_OPTS=\"mode=7\"\n",
+                "BONDING_OPTS=mode=7: \"mode=7\" is none of balance-rr, active-backup,"
+                " balance-xor, broadcast, 802.3ad, balance-tlb, balance-alb"},
         Refused{"VlanParent", "PHYSDEV=\"eth1 up\"\nVLAN_ID=5\n",
                 "PHYSDEV=eth1 up: no interface name"},
         Refused{"Slave", "SLAVE_LIST=\"eth1 --x\"\n",

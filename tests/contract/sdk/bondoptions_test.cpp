@@ -52,6 +52,38 @@ TEST(BondOptionsParse, KeepsWhatItDoesNotKnowAndPassesOverWhatIsNoOption)
     EXPECT_EQ(BondOptions::Parse("miimon=100 miimon=50"), Options({{"miimon", "50"}}));
 }
 
+TEST(BondOptionProblem, IsWhatTheKernelsToolsWouldNotRead)
+{
+    EXPECT_EQ(vornhost::BondOptionProblem("miimon", "soon"),
+              "is not a number from 0 to 4294967295");
+    EXPECT_EQ(vornhost::BondOptionProblem("use_carrier", "256"), "is not a number from 0 to 255");
+    EXPECT_EQ(vornhost::BondOptionProblem("ad_actor_sys_prio", "65536"),
+              "is not a number from 0 to 65535");
+    EXPECT_EQ(vornhost::BondOptionProblem("mode", "7"),
+              "is none of balance-rr, active-backup, balance-xor, broadcast, 802.3ad, balance-tlb,"
+              " balance-alb");
+    EXPECT_EQ(vornhost::BondOptionProblem("lacp_rate", "Fast"), "is none of slow, fast");
+    EXPECT_EQ(vornhost::BondOptionProblem("arp_ip_target", "192.0.2.1,x"),
+              "is no list of IPv4 addresses");
+    EXPECT_EQ(vornhost::BondOptionProblem("ns_ip6_target", "192.0.2.1"),
+              "is no list of IPv6 addresses");
+}
+
+TEST(BondOptionProblem, IsNoneOfAValueThatTheyTakeOrOfAnOptionThatIsNotKnown)
+{
+    for (const auto& [name, value] : Values{{"miimon", "4294967295"},
+                                            {"mode", "6"},
+                                            {"lacp_rate", "fast"},
+                                            {"arp_ip_target", "+192.0.2.1,192.0.2.2"},
+                                            {"ns_ip6_target", "2001:db8::1"},
+                                            {"ad_actor_system", "02:00:00:00:00:01"},
+                                            {"primary", "eth1"},
+                                            {"bond_updelay", "any"},
+                                            {"new_option", "any"}}) {
+        EXPECT_EQ(vornhost::BondOptionProblem(name, value), "") << name;
+    }
+}
+
 TEST(BondOptionsParse, CollectsTheAddressesThatAreAskedFor)
 {
     EXPECT_EQ(BondOptions::Parse("arp_ip_target=+192.0.2.1,+192.0.2.2 arp_ip_target=192.0.2.3"),

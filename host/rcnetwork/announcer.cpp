@@ -4,9 +4,7 @@
 #include "announce.h"
 #include "report.h"
 
-#include <cerrno>
 #include <chrono>
-#include <cstring>
 #include <thread>
 
 namespace vornhost {
@@ -19,10 +17,6 @@ constexpr std::chrono::seconds kLongestPause{8};
 
 void KeepAnnouncing(const std::string& interface)
 {
-    if (!Announce(interface)) {
-        Say({Severity::kWarning, "cannot announce " + interface + ": " + std::strerror(errno)});
-        return;
-    }
     if (!StartAlone("vornovs-announce@" + interface + ".service", {kAnnounceVerb, interface})) {
         Say({Severity::kWarning, "nobody will announce " + interface + " again"});
     }

@@ -12,7 +12,7 @@ namespace vornhost {
 /** The hidden verb under which it goes on. */
 constexpr char kAnnounceVerb[] = "announce";
 
-/** Announces the interface now, and has somebody go on with it. What fails is logged. */
+/** Has somebody announce the interface for a while, without waiting. What fails is logged. */
 void KeepAnnouncing(const std::string& interface);
 
 /** Announces the interface now and then, for 15 seconds or as long as it is there. */

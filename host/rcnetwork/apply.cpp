@@ -14,8 +14,10 @@
 #include <algorithm>
 #include <array>
 #include <cerrno>
+#include <cstdlib>
 #include <cstring>
 #include <fstream>
+#include <set>
 #include <sstream>
 #include <string_view>
 #include <thread>
@@ -65,10 +67,47 @@ std::string WithNumbers(const std::string& line)
     return text;
 }
 
+/** @return  the number of the line at which a batch of "ip" ended, counted from 1; 0: not known. */
+std::size_t FailedLine(const std::string& errors, std::size_t lines)
+{
+    constexpr std::string_view kSays = "Command failed -:";
+    const auto at = errors.rfind(kSays);
+    if (at == std::string::npos) {
+        return 0;
+    }
+    const std::size_t number = std::strtoul(errors.c_str() + at + kSays.size(), nullptr, 10);
+    return number <= lines ? number : 0;
+}
+
+/** Whether a line sets a property of a device that is there, without which it carries traffic. */
+bool IsProperty(const std::string& line)
+{
+    const auto words = Words(line);
+    if (words.size() < 6 || words[0] != "link" || words[1] != "set") {
+        return false;
+    }
+    return words[4] == "mtu" || words[4] == "addrgenmode" ||
+           (words.size() > 6 && words[4] == "type" && words[5] == "bond" && words[6] != "mode");
+}
+
+/** The interfaces whose leases a client goes on with; the words are "start NAME of NAME,NAME". */
+std::vector<std::string> Formers(const std::vector<std::string>& words)
+{
+    std::istringstream names(words.at(3));
+    std::vector<std::string> formers;
+    for (std::string name; std::getline(names, name, ',');) {
+        formers.push_back(name);
+    }
+    return formers;
+}
+
 class Applier {
 public:
     Applier(const Plan& plan, std::vector<Remark>& remarks) : m_plan(plan), m_remarks(remarks) {}
     bool Run(const Stage& stage);
+
+    /** Carries out what the stage adds, if it can do without what was to be done before. */
+    void Add(const Stage& stage);
 
 private:
     bool Fail(const std::string& text);
@@ -78,7 +117,7 @@ private:
     bool RunSwitch(const Stage& stage);
     bool RunBatch(const Stage& stage);
     void LoadBonding(const Stage& stage) const;
-    void RunAdditions(const Stage& stage) const;
+    void RunAdditions(const std::vector<std::string>& lines) const;
     bool WaitForBridges(const Stage& stage);
     bool WriteSettings(const Stage& stage);
     void AnnounceAll(const Stage& stage);
@@ -87,11 +126,13 @@ private:
     void TellResolver(const Stage& stage);
     bool ManageClients(const Stage& stage);
     bool ManageClient(const std::string& line);
+    void StartClients(const Stage& stage);
     void WaitForAll(const Stage& stage);
     bool ForgetGateways(const Stage& stage);
 
     const Plan& m_plan;
     std::vector<Remark>& m_remarks;
+    std::set<std::string> m_notEnded; ///< Clients that were to end.
 };
 
 bool Applier::Fail(const std::string& text)
@@ -151,26 +192,39 @@ void Applier::LoadBonding(const Stage& stage) const
     }
 }
 
+/** A property that the kernel refuses is said and passed over, as settings are. */
 bool Applier::RunBatch(const Stage& stage)
 {
     LoadBonding(stage);
-    std::string input;
-    for (const std::string& line : stage.lines) {
-        input += WithNumbers(line) + "\n";
+    std::vector<std::string> rest = stage.lines;
+    while (!rest.empty()) {
+        std::string input;
+        for (const std::string& line : rest) {
+            input += WithNumbers(line) + "\n";
+        }
+        ProcessResult result;
+        if (Program({kIpTool, "-batch", "-"}, kToolDeadline, input, result)) {
+            return true;
+        }
+        const std::size_t failed = FailedLine(result.errors, rest.size());
+        // Of an option that it does not know it lists all that it knows.
+        (void)Fail(failed == 0 ? stage.title + ": ip failed: " + OneLine(result.errors)
+                               : stage.title + ": ip failed at \"" + rest[failed - 1] +
+                                     "\": " + result.errors.substr(0, result.errors.find('\n')));
+        if (failed == 0 || !IsProperty(rest[failed - 1])) {
+            RunAdditions(rest);
+            return false;
+        }
+        rest.erase(rest.begin(), rest.begin() + static_cast<std::ptrdiff_t>(failed));
     }
-    ProcessResult result;
-    if (Program({kIpTool, "-batch", "-"}, kToolDeadline, input, result)) {
-        return true;
-    }
-    RunAdditions(stage);
-    return Fail(stage.title + ": ip failed: " + OneLine(result.errors));
+    return true;
 }
 
 /** After a line that failed nothing may be taken away any more, but all else is still made. */
-void Applier::RunAdditions(const Stage& stage) const
+void Applier::RunAdditions(const std::vector<std::string>& lines) const
 {
     std::string input;
-    for (const std::string& line : stage.lines) {
+    for (const std::string& line : lines) {
         const auto words = Words(line);
         const bool removes = words.size() > 1 && (words[1] == "del" || words.back() == "down");
         input += removes ? "" : WithNumbers(line) + "\n";
@@ -280,13 +334,8 @@ bool Applier::ManageClient(const std::string& line)
     } else if (words.at(0) == "drop") {
         done = DropClient(words.at(1), error);
     } else {
-        std::istringstream names(words.at(3));
-        std::vector<std::string> formers;
-        for (std::string name; std::getline(names, name, ',');) {
-            formers.push_back(name);
-        }
         const ClientOptions options = ParseClientText(line.substr(line.find(": ") + 2));
-        done = StartClient(words.at(1), formers, options, error);
+        done = StartClient(words.at(1), Formers(words), options, error);
     }
     return done ||
            Fail("DHCP client of " + words.at(1) + ": cannot " + words.at(0) + " it: " + error);
@@ -300,6 +349,23 @@ bool Applier::ManageClients(const Stage& stage)
         done = ManageClient(line) && done;
     }
     return done;
+}
+
+/** Ends none, and starts those that do not go on where one is that was to end. */
+void Applier::StartClients(const Stage& stage)
+{
+    for (const std::string& line : stage.lines) {
+        const auto words = Words(line.substr(0, line.find(": ")));
+        if (words.at(0) != "start") {
+            m_notEnded.insert(words.at(1));
+            continue;
+        }
+        const auto formers = Formers(words);
+        if (std::none_of(formers.begin(), formers.end(),
+                         [&](const std::string& name) { return m_notEnded.contains(name); })) {
+            (void)ManageClient(line);
+        }
+    }
 }
 
 /** What does not come is said; the traffic then waits until it does. */
@@ -343,6 +409,7 @@ bool Applier::Run(const Stage& stage)
         AnnounceAll(stage);
         return true;
     case StageKind::kAnnouncer:
+        AnnounceAll(stage);
         std::for_each(stage.lines.begin(), stage.lines.end(), KeepAnnouncing);
         return true;
     case StageKind::kRouters:
@@ -365,20 +432,71 @@ bool Applier::Run(const Stage& stage)
     return ForgetGateways(stage);
 }
 
-} // namespace
-
-bool ApplyPlan(const Plan& plan, std::vector<Remark>& remarks)
+void Applier::Add(const Stage& stage)
 {
-    Applier applier(plan, remarks);
+    switch (stage.kind) {
+    case StageKind::kBatch:
+        RunAdditions(stage.lines);
+        break;
+    case StageKind::kClients:
+        StartClients(stage);
+        break;
+    case StageKind::kSettings:
+    case StageKind::kAnnounce:
+    case StageKind::kAnnouncer:
+    case StageKind::kCards:
+    case StageKind::kReady:
+    case StageKind::kResolver:
+        (void)Run(stage);
+        break;
+    case StageKind::kServices:
+    case StageKind::kSwitch:
+    case StageKind::kWait:
+    case StageKind::kRouters:
+    case StageKind::kGateways:
+        break;
+    }
+}
+
+/** @return  the stage that failed; null when none did. */
+const Stage* RunStages(Applier& applier, const Plan& plan)
+{
     for (const Stage& stage : plan.stages) {
         if (!applier.Run(stage)) {
-            return false;
+            return &stage;
         }
         if (stage.kind == StageKind::kServices) {
             break; // what the switch knows from before decides about the rest
         }
     }
-    return true;
+    return nullptr;
+}
+
+bool AsksTheSwitch(const Stage& stage)
+{
+    return stage.kind == StageKind::kSwitch || stage.kind == StageKind::kWait;
+}
+
+} // namespace
+
+bool ApplyPlan(const Plan& plan, std::vector<Remark>& remarks)
+{
+    Applier applier(plan, remarks);
+    return RunStages(applier, plan) == nullptr;
+}
+
+bool ApplyWhatCanBe(const Plan& plan, std::vector<Remark>& remarks)
+{
+    Applier applier(plan, remarks);
+    const Stage* const failed = RunStages(applier, plan);
+    if (failed == nullptr || failed->kind != StageKind::kBatch) {
+        return failed == nullptr;
+    }
+    const Stage* const end = plan.stages.data() + plan.stages.size();
+    for (const Stage* stage = failed + 1; stage != end && !AsksTheSwitch(*stage); ++stage) {
+        applier.Add(*stage);
+    }
+    return false;
 }
 
 bool ApplyStage(const Stage& stage, std::vector<Remark>& remarks)

@@ -19,6 +19,13 @@ namespace vornhost {
  */
 bool ApplyPlan(const Plan& plan, std::vector<Remark>& remarks);
 
+/**
+ * Does the same for a plan of which a part fails however often it is tried: an address, route or
+ * device that the kernel refuses does not keep the rest from the network. After it nothing is taken
+ * away any more, and nothing is asked of the switch.
+ */
+bool ApplyWhatCanBe(const Plan& plan, std::vector<Remark>& remarks);
+
 /** Carries out one stage by itself, waiting for the switch. */
 bool ApplyStage(const Stage& stage, std::vector<Remark>& remarks);
 

@@ -30,10 +30,9 @@ std::set<std::string> NamesToDecide(const Inputs& inputs)
 bool IsExcused(const Inputs& inputs, const Kinship& kinship, const std::string& name)
 {
     const Link* link = inputs.live.FindLink(name);
-    const bool made =
-        link != nullptr && (link->kind == "bond" || link->kind == "vlan" || link->kind == "bridge");
-    return made || inputs.request.known.contains(name) || !kinship.HeirOf(name).empty() ||
-           !kinship.MasterOf(name).empty() || !kinship.HostOf(name).empty();
+    return (link != nullptr && IsOfMadeKind(*link)) || inputs.request.known.contains(name) ||
+           !kinship.HeirOf(name).empty() || !kinship.MasterOf(name).empty() ||
+           !kinship.HostOf(name).empty();
 }
 
 /** In the order in which they came up, so that routes are made in the order in which they stood. */

@@ -80,6 +80,11 @@ std::string LiveState::NameOf(int index) const
     return link == nullptr ? std::string() : link->name;
 }
 
+bool IsOfMadeKind(const Link& link)
+{
+    return link.kind == "bond" || link.kind == "vlan" || link.kind == "bridge";
+}
+
 std::vector<std::string> LiveState::WithVlans(const Link& link) const
 {
     std::vector<std::string> names{link.name};

@@ -51,6 +51,9 @@ struct LiveState {
     std::string Setting(const std::string& interface, const std::string& name) const;
 };
 
+/** @return  whether an interface is a bond, VLAN or bridge of the kernel, as are made here. */
+bool IsOfMadeKind(const Link& link);
+
 /** Reads the kernel's links, addresses, routes and neighbours. @return  nullopt on failure. */
 std::optional<LiveState> ReadLiveState();
 

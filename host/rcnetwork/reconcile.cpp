@@ -50,7 +50,7 @@ private:
     void SayOnce(const std::vector<Remark>& remarks);
     std::optional<Inputs> Read();
     void StartServices();
-    bool Attempt();
+    bool Attempt(bool (*apply)(const Plan&, std::vector<Remark>&));
     void UpdateHandover(Inputs& inputs);
     void SettleHandover(const Inputs& inputs);
     void RememberNames(const Inputs& inputs);
@@ -100,9 +100,7 @@ void Reconciler::RememberNames(const Inputs& inputs)
     for (const std::string& name : m_request.names) {
         const Kinship kinship(inputs);
         const Link* link = inputs.live.FindLink(name);
-        const bool made = link != nullptr &&
-                          (link->kind == "bond" || link->kind == "vlan" || link->kind == "bridge");
-        if (made || !kinship.LiveMembersOf(name).empty() ||
+        if ((link != nullptr && IsOfMadeKind(*link)) || !kinship.LiveMembersOf(name).empty() ||
             inputs.runState.interfaces.contains(name)) {
             m_request.known.insert(name);
         }
@@ -162,7 +160,7 @@ void Reconciler::Save(const RunState& former, const RunState& state)
 }
 
 /** One round. @return  whether nothing was left to do. */
-bool Reconciler::Attempt()
+bool Reconciler::Attempt(bool (*apply)(const Plan&, std::vector<Remark>&))
 {
     const auto inputs = Read();
     if (!inputs) {
@@ -178,7 +176,7 @@ bool Reconciler::Attempt()
     }
     Save(inputs->runState, plan.recordBefore);
     std::vector<Remark> remarks;
-    if (ApplyPlan(plan, remarks)) {
+    if (apply(plan, remarks)) {
         Save(plan.recordBefore, WithWhatIsTold(plan));
     }
     SayOnce(remarks);
@@ -214,7 +212,7 @@ void Reconciler::StayWithoutSwitch()
                                         "; its addresses stay on the plain interface"}});
     }
     if (!m_request.withoutSwitch.empty()) {
-        (void)Attempt();
+        (void)Attempt(ApplyWhatCanBe);
         m_failed = true;
     }
 }
@@ -260,7 +258,8 @@ bool Reconciler::Run()
     }
     StartServices();
     for (int i = 0; i < kTries && m_canGoOn; ++i) {
-        if (Attempt()) {
+        // What fails again would fail each time; it keeps nothing else waiting.
+        if (Attempt(i + 1 < kTries ? ApplyPlan : ApplyWhatCanBe)) {
             return !m_failed;
         }
     }

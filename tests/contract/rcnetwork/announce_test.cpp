@@ -3,7 +3,7 @@
  */
 #include "host.h"
 #include "rcnetwork/announce.h"
-#include "rcnetwork/announcer.h"
+#include "rcnetwork/apply.h"
 #include "support/descriptor.h"
 #include "systemd/fakesystemd.h"
 
@@ -153,9 +153,12 @@ TEST_F(AnnounceTest, GoesOnInAUnitOfItsOwnWhereSystemdRuns)
     harness::FakeSystemd systemd;
     systemd.AddUnit("vornovs-announce@.service");
 
-    vornhost::KeepAnnouncing("eth0");
+    std::vector<vornhost::Remark> remarks;
+    EXPECT_TRUE(
+        vornhost::ApplyStage({vornhost::StageKind::kAnnouncer, "again", {"eth0"}}, remarks));
 
     EXPECT_THAT(Arrived(), Contains(kArpOfEth0));
+    EXPECT_THAT(remarks, testing::IsEmpty());
     EXPECT_THAT(systemd.Jobs(), testing::ElementsAre("StartUnit vornovs-announce@eth0.service"));
 }
 

@@ -124,6 +124,21 @@ std::string On(std::string text, const std::string& from, const std::string& to)
     return text;
 }
 
+TEST_F(DhcpHost, AnAddressThatTheKernelRefusesKeepsNobodyElseFromTheNetwork)
+{
+    File("eth0", kDhcp);
+    File("eth1", "DEVICE=eth1\nIPADDR=198.51.100.1\nPREFIX=24\nIPV6ADDR=ff02::5/64\n");
+
+    const Outcome outcome = RcNetwork({"start"});
+
+    EXPECT_EQ(outcome.exitCode, 1);
+    EXPECT_THAT(outcome.errors, HasSubstr("could not be done: addr add ff02::5/64 dev eth1"));
+    EXPECT_TRUE(WaitUntil([] { return HasAddresses("eth0"); }));
+    EXPECT_THAT(Network(), HasSubstr("eth1 198.51.100.1/24"));
+    EXPECT_EQ(RcNetwork({"start"}).exitCode, 1);
+    EXPECT_TRUE(HasAddresses("eth0"));
+}
+
 TEST_F(DhcpHost, TheLeaseGoesWhereTheAddressesGo)
 {
     File("eth0", kDhcp);

@@ -138,7 +138,8 @@ void SourceFinder::Look(const std::string& base)
     const bool replaced = m_unit.kind == UnitKind::kSwitchBond && base == m_unit.name;
     const bool device = link != nullptr && link->kind == kVlanKind && base != m_unit.name &&
                         !Contains(m_kinship.MembersOf(m_unit.name), base);
-    if (base != m_unit.bridge) {
+    const std::string bridge = m_kinship.BridgeFor(base);
+    if (base != m_unit.bridge && base != bridge) {
         Add(link, legacy || (!replaced && !device));
     }
     for (const Link& each : m_inputs.live.links) {
@@ -147,7 +148,6 @@ void SourceFinder::Look(const std::string& base)
             Add(&each, false);
         }
     }
-    const std::string bridge = m_kinship.BridgeFor(base);
     if (base == m_unit.name) {
         Add(m_unit.bridgeLink, m_unit.BridgeStays());
         return;
@@ -246,9 +246,14 @@ void SourceFinder::Run()
     NameCarrier();
     if (IsOnWrongParent()) {
         m_unit.rebuilt = true;
-        if (m_unit.carrierLink == m_unit.port) {
+        const Link* carrier = m_unit.carrierLink;
+        const bool isOnIt = carrier != nullptr && carrier->parent == m_unit.port->index;
+        if (isOnIt) {
+            m_unit.sources.push_back({carrier, false}); // it would go with what it is on
+        }
+        m_unit.sources.push_back({m_unit.port, false});
+        if (isOnIt || carrier == m_unit.port) {
             m_unit.carrierLink = nullptr;
-            m_unit.sources.push_back({m_unit.port, false});
         }
     }
     Look(m_unit.name);

@@ -29,6 +29,9 @@ UnitPlanner::UnitPlanner(const Inputs& inputs, const Kinship& kinship, const Uni
     : m_inputs(inputs), m_kinship(kinship), m_unit(unit), m_steps(steps), m_remarks(remarks)
 {
     m_former = FormerRecord(unit.name);
+    // A card may have come under the name of a device that was made once.
+    const Link* link = inputs.live.FindLink(unit.name);
+    m_former.made = m_former.made && (link == nullptr || IsOfMadeKind(*link));
     AbsorbRecords();
     m_record = m_former;
 }

@@ -45,6 +45,7 @@ package_test_packages=(
     bsdextrautils
     lintian
     man-db
+    qemu-system-x86
     zsh
 )
 

@@ -67,10 +67,9 @@ std::string Refusal(const std::string& name, const std::string& value)
 /** Quoted whole, so that the tool takes it for one value. */
 std::string Quoted(const std::string& value)
 {
-    const bool plain = !value.empty() && value.find_first_not_of(
-                                             "abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ"
-                                             "0123456789_-") == std::string::npos;
-    if (plain) {
+    constexpr std::string_view kPlain =
+        "abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ0123456789_-";
+    if (!value.empty() && value.find_first_not_of(kPlain) == std::string::npos) {
         return value;
     }
     std::string text = "\"";

@@ -42,7 +42,11 @@ servers_asked()
 # IAID ADDRESS NAME DUID. Before the first one there is no list, which is as good as an empty one.
 servers_leases()
 {
-    { grep -E '^[0-9]+ [^ ]+ [0-9a-f.:]+ ' "$lab_leases" 2>/dev/null || true; } |
+    if [ ! -e "$lab_leases" ]; then
+        return
+    fi
+    # Finding none is no failure, another one is.
+    { grep -E '^[0-9]+ [^ ]+ [0-9a-f.:]+ ' "$lab_leases" || [ $? -eq 1 ]; } |
         cut -d ' ' -f 2- | sort
 }
 

@@ -89,7 +89,7 @@ lab_stay()
     trap "rm -rf '$folder'" EXIT
     if [[ $1 == namespaces ]]; then
         lab_make_namespaces_tree "$folder/tree" "$2" "$3"
-        (lab_start_namespaces 0 "$folder/tree" lab.here "$folder/results.tar") || true
+        (lab_start_namespaces 0 "$folder/tree" lab.here "$folder/results.tar")
         return
     fi
     lab_make_guest_image "$folder/image" "$1" "$2" "$3" "$4"
